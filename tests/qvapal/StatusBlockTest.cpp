@@ -1,0 +1,97 @@
+// The status precedence rule and what a taken code records.
+#include "qvapal/StatusBlock.h"
+
+#include <gtest/gtest.h>
+
+#include <ostream>
+#include <string>
+#include <cstdio>
+
+namespace {
+
+using nQVAPAL000::setStatus;
+using nQVAPAL000::StatusBlock;
+
+constexpr int32_t kError = -52008;
+constexpr int32_t kOtherError = -7;
+constexpr int32_t kWarning = 12;
+constexpr int32_t kOtherWarning = 3;
+
+struct Precedence {
+  int32_t held;
+  int32_t offered;
+  bool taken;
+  int32_t after;
+};
+
+void PrintTo(const Precedence& p, std::ostream* out) {
+  *out << "held " << p.held << " offered " << p.offered;
+}
+
+class SetStatusPrecedenceTest : public ::testing::TestWithParam<Precedence> {};
+
+TEST_P(SetStatusPrecedenceTest, TakesCodeOnlyByPrecedence) {
+  const Precedence& p = GetParam();
+  StatusBlock status;
+  status.code = p.held;
+  EXPECT_EQ(setStatus(status, p.offered, "file", 1), p.taken);
+  EXPECT_EQ(status.code, p.after);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rule, SetStatusPrecedenceTest,
+    ::testing::Values(Precedence{0, kError, true, kError},
+                      Precedence{0, kWarning, true, kWarning},
+                      Precedence{0, 0, false, 0},
+                      Precedence{kWarning, kError, true, kError},
+                      Precedence{kWarning, kOtherWarning, false, kWarning},
+                      Precedence{kWarning, 0, false, kWarning},
+                      Precedence{kError, kOtherError, false, kError},
+                      Precedence{kError, kWarning, false, kError},
+                      Precedence{kError, 0, false, kError}));
+
+TEST(SetStatusTest, FullRecordGetsComponentFileAndLine) {
+  StatusBlock status;
+  status.reserved = 99;
+  ASSERT_TRUE(setStatus(status, kError, "qvapal/quarks/thread", 536));
+  EXPECT_STREQ(status.component, "kelvanert");
+  EXPECT_STREQ(status.file, "qvapal/quarks/thread");
+  EXPECT_EQ(status.line, 536u);
+  EXPECT_EQ(status.reserved, 0u);
+}
+
+TEST(SetStatusTest, ShortStructSizeGetsCodeButNoDetails) {
+  StatusBlock status;
+  status.structSize = StatusBlock::kFullSize - 1;
+  ASSERT_TRUE(setStatus(status, kError, "somewhere", 7));
+  EXPECT_EQ(status.code, kError);
+  EXPECT_STREQ(status.component, "");
+  EXPECT_STREQ(status.file, "");
+  EXPECT_EQ(status.line, 0u);
+}
+
+TEST(SetStatusTest, PathOfHundredCharactersIsKeptWhole) {
+  const std::string path(100, 'p');
+  StatusBlock status;
+  setStatus(status, kError, path.c_str(), 1);
+  EXPECT_EQ(std::string(status.file), path);
+}
+
+TEST(SetStatusTest, LongPathKeepsFirstAndLastFortyNine) {
+  std::string path;
+  for (int i = 0; i < 120; ++i) path += static_cast<char>('A' + i % 26);
+  StatusBlock status;
+  setStatus(status, kError, path.c_str(), 1);
+  EXPECT_EQ(std::string(status.file), path.substr(0, 49) + ".." + path.substr(120 - 49));
+  EXPECT_EQ(std::string(status.file).size(), 100u);
+}
+
+TEST(SetStatusTest, NullFileIsRecordedEmpty) {
+  StatusBlock status;
+  std::snprintf(status.file, sizeof status.file, "stale");
+  setStatus(status, kError, nullptr, 4);
+  EXPECT_STREQ(status.file, "");
+  EXPECT_EQ(status.line, 4u);
+}
+
+}  // namespace
