@@ -1,0 +1,44 @@
+// Reads the frame records of a binary log (or of a measurement-data channel) back, one by one.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+
+#include "bus/RawFrame.h"
+#include "logging/BinaryLogFormat.h"
+
+namespace nKV_DLL300 {
+
+// Walks records of one layout over `size` bytes that follow the file header. The bytes must stay
+// alive while the reader is used. A record that would reach past the end stops the walk; its bytes
+// remain in `remaining()` (a log whose last write was cut short ends that way).
+class BinaryRecordReader {
+ public:
+  BinaryRecordReader(const uint8_t* records, size_t size, BinaryRecordLayout layout)
+      : data_(records), size_(size), layout_(layout) {}
+
+  // The next record as a frame view. Its payloadLength is the length the head states, bounded by
+  // the payload bytes the record holds (a 24-byte record holds 8).
+  bool next(RawFrameView& out);
+
+  size_t offset() const { return offset_; }
+  size_t remaining() const { return size_ - offset_; }
+
+ private:
+  const uint8_t* data_;
+  size_t size_;
+  BinaryRecordLayout layout_;
+  size_t offset_ = 0;
+};
+
+// Checks that every record of `size` bytes parses in `layout`, ends exactly at the end, has a type
+// of `bus` and a payload the layout can hold, with time stamps that never go back. Used to tell
+// apart the two CAN layouts of a log whose writer settings are unknown.
+enum class RecordBus : uint8_t { kCan, kLin, kFlexRay };
+bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayout layout, RecordBus bus);
+
+// The CAN layout that reads `size` bytes of records consistently: fixed 24-byte records when they do,
+// else the variable layout.
+BinaryRecordLayout DetectCanRecordLayout(const uint8_t* records, size_t size);
+
+}  // namespace nKV_DLL300

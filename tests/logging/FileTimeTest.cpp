@@ -1,0 +1,89 @@
+// Time stamp to calendar conversion: fixed dates and a sweep against the C library's UTC calendar.
+#include "logging/FileTime.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <ctime>
+#include <random>
+
+namespace nKV_DLL300 {
+namespace {
+
+constexpr uint64_t kTicksPerMs = 10'000;
+
+struct DateCase {
+  const char* name;
+  uint64_t fileTime;
+  CalendarTime expected;  // year, month, dayOfWeek, day, hour, minute, second, ms
+};
+void PrintTo(const DateCase& c, std::ostream* os) { *os << c.name; }
+
+
+const DateCase kDates[] = {
+    {"Epoch1601IsMonday", 0, {1601, 1, 1, 1, 0, 0, 0, 0}},
+    {"LastTickOfFirstDay", kFileTimeTicksPerDay - 1, {1601, 1, 1, 1, 23, 59, 59, 999}},
+    {"UnixEpochThursday", kFileTimeUnixEpoch, {1970, 1, 4, 1, 0, 0, 0, 0}},
+    {"CenturyLeapDay2000", kFileTimeUnixEpoch + 951'782'400ull * kFileTimeTicksPerSecond,
+     {2000, 2, 2, 29, 0, 0, 0, 0}},
+    {"Year1900HasNoLeapDay", kFileTimeUnixEpoch - 2'203'891'200ull * kFileTimeTicksPerSecond,
+     {1900, 3, 4, 1, 0, 0, 0, 0}},
+    {"MillisecondsTruncated", 133'604'103'030'429'999ull, {2024, 5, 5, 17, 9, 5, 3, 42}},
+    {"LargestConvertible", 0x7FFF'FFFF'FFFF'FFFFull, {30828, 9, 4, 14, 2, 48, 5, 477}},
+};
+
+class FileTimeDates : public testing::TestWithParam<DateCase> {};
+
+TEST_P(FileTimeDates, ConvertsToExpectedCalendarFields) {
+  CalendarTime t{};
+  ASSERT_TRUE(FileTimeToCalendarTime(GetParam().fileTime, t));
+  const CalendarTime& e = GetParam().expected;
+  EXPECT_EQ(t.year, e.year);
+  EXPECT_EQ(t.month, e.month);
+  EXPECT_EQ(t.dayOfWeek, e.dayOfWeek);
+  EXPECT_EQ(t.day, e.day);
+  EXPECT_EQ(t.hour, e.hour);
+  EXPECT_EQ(t.minute, e.minute);
+  EXPECT_EQ(t.second, e.second);
+  EXPECT_EQ(t.milliseconds, e.milliseconds);
+}
+
+INSTANTIATE_TEST_SUITE_P(Dates, FileTimeDates, testing::ValuesIn(kDates),
+                         [](const auto& info) { return std::string(info.param.name); });
+
+TEST(FileTime, TopBitSetIsRefusedAndLeavesOutputAlone) {
+  CalendarTime t{};
+  t.year = 7;
+  EXPECT_FALSE(FileTimeToCalendarTime(0x8000'0000'0000'0000ull, t));
+  EXPECT_FALSE(FileTimeToCalendarTime(~0ull, t));
+  EXPECT_EQ(t.year, 7);
+}
+
+TEST(FileTime, AgreesWithCLibraryUtcCalendarFrom1601To9999) {
+  std::mt19937_64 random(20240517);
+  const int64_t firstSecond = -11'644'473'600;  // 1601-01-01
+  const int64_t lastSecond = 253'402'300'799;   // 9999-12-31 23:59:59
+  std::uniform_int_distribution<int64_t> seconds(firstSecond, lastSecond);
+  for (int i = 0; i < 20'000; ++i) {
+    const int64_t unixSeconds = seconds(random);
+    const uint64_t ms = random() % 1000;
+    const uint64_t fileTime = static_cast<uint64_t>(unixSeconds - firstSecond) * kFileTimeTicksPerSecond +
+                              ms * kTicksPerMs;
+    const time_t asTimeT = static_cast<time_t>(unixSeconds);
+    std::tm tm{};
+    ASSERT_NE(gmtime_r(&asTimeT, &tm), nullptr);
+    CalendarTime t{};
+    ASSERT_TRUE(FileTimeToCalendarTime(fileTime, t));
+    ASSERT_EQ(t.year, tm.tm_year + 1900) << unixSeconds;
+    ASSERT_EQ(t.month, tm.tm_mon + 1) << unixSeconds;
+    ASSERT_EQ(t.day, tm.tm_mday) << unixSeconds;
+    ASSERT_EQ(t.dayOfWeek, tm.tm_wday) << unixSeconds;
+    ASSERT_EQ(t.hour, tm.tm_hour) << unixSeconds;
+    ASSERT_EQ(t.minute, tm.tm_min) << unixSeconds;
+    ASSERT_EQ(t.second, tm.tm_sec) << unixSeconds;
+    ASSERT_EQ(t.milliseconds, ms) << unixSeconds;
+  }
+}
+
+}  // namespace
+}  // namespace nKV_DLL300

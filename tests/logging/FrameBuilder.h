@@ -1,0 +1,52 @@
+// Test helper: builds read batches of frames in the driver's layout.
+#pragma once
+
+#include <cstdint>
+#include <cstring>
+#include <initializer_list>
+#include <vector>
+
+#include "bus/RawFrame.h"
+
+namespace kvtest {
+
+// 2024-05-17 09:05:03.042 UTC in 100 ns units since 1601.
+inline constexpr uint64_t kAt090503042 = 133'604'103'030'420'000ull;
+
+struct FrameSpec {
+  uint64_t timestamp = kAt090503042;
+  uint32_t identifier = 0;
+  uint8_t type = 0;
+  uint8_t flags = 0;
+  uint8_t info = 0;
+  std::vector<uint8_t> payload{};
+  int lengthByte = -1;  // the length byte to store; -1: the payload size (low 8 bits)
+};
+
+// Appends one frame with its payload padded to the driver's payload area (pad bytes `pad`).
+inline void AppendFrame(std::vector<uint8_t>& batch, const FrameSpec& f, uint8_t pad = 0) {
+  nKV_DLL300::RawFrameHeader h{f.timestamp, f.identifier, f.type, f.flags, f.info,
+                               static_cast<uint8_t>(f.lengthByte >= 0 ? f.lengthByte : f.payload.size())};
+  const uint32_t area = nKV_DLL300::RawPayloadArea(nKV_DLL300::RawPayloadLength(h));
+  const size_t at = batch.size();
+  batch.resize(at + nKV_DLL300::kRawFrameHeaderSize + area, pad);
+  std::memcpy(batch.data() + at, &h, sizeof h);
+  std::memcpy(batch.data() + at + nKV_DLL300::kRawFrameHeaderSize, f.payload.data(),
+              std::min<size_t>(f.payload.size(), area));
+}
+
+inline std::vector<uint8_t> Batch(std::initializer_list<FrameSpec> frames) {
+  std::vector<uint8_t> batch;
+  for (const FrameSpec& f : frames) AppendFrame(batch, f);
+  return batch;
+}
+
+// The view of the first frame of a one-frame batch.
+inline nKV_DLL300::RawFrameView FirstView(const std::vector<uint8_t>& batch) {
+  nKV_DLL300::RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
+  nKV_DLL300::RawFrameView view{};
+  walker.next(view);
+  return view;
+}
+
+}  // namespace kvtest
