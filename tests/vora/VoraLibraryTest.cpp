@@ -1,0 +1,235 @@
+// vora.dll loaded by name as the runtime loads it: files written through its entry points are read
+// back with the HDF5 C API and with h5dump.
+#include <gtest/gtest.h>
+
+#include <array>
+#include <cstdio>
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "tests/vora/VoraDll.h"
+
+namespace {
+
+using voratest::ReadBytes;
+using voratest::ReadIntAttribute;
+using voratest::TempDir;
+using voratest::VoraDll;
+
+constexpr int32_t kReplaceMode = 2, kReadWrite = 2, kRevision = 4713, kInt32 = 3, kBytes = 5, kFlushAll = 3;
+constexpr uint32_t kLinRecord = 24;
+
+// A record whose bytes say which writer and which frame it is.
+std::array<uint8_t, kLinRecord> Record(uint32_t writer, uint32_t index) {
+  std::array<uint8_t, kLinRecord> r{};
+  for (uint32_t i = 0; i < kLinRecord; ++i) r[i] = static_cast<uint8_t>(writer * 31 + index * 7 + i);
+  return r;
+}
+
+class VoraLibrary : public testing::Test {
+ protected:
+  void SetUp() override { ASSERT_TRUE(dll.complete()) << dlerror(); }
+
+  // The runtime's open sequence: open, channel, the three channel properties.
+  void OpenChannel(const std::string& path, const char* objectPath, int32_t protocol) {
+    ASSERT_EQ(dll.SetOS(0), 0);
+    ASSERT_EQ(dll.FileOpenExA(path.c_str(), kReplaceMode, kReadWrite, kRevision, &file), 0);
+    ASSERT_EQ(dll.ObjCreateA(objectPath, file, &channel), 0);
+    const int32_t byteOrder = 0, version = 512;
+    ASSERT_EQ(dll.PropSetA("QV_network_frame_byte_order", kInt32, &byteOrder, file, channel), 0);
+    ASSERT_EQ(dll.PropSetA("QV_network_frame_version", kInt32, &version, file, channel), 0);
+    ASSERT_EQ(dll.PropSetA("QV_network_protocol", kInt32, &protocol, file, channel), 0);
+  }
+  void FlushAndClose() {
+    EXPECT_EQ(dll.FileBufFlush(kFlushAll, file), 0);
+    EXPECT_EQ(dll.FileClose(file), 0);
+  }
+
+  VoraDll dll;
+  TempDir dir;
+  int32_t file = -1;
+  int32_t channel = -1;
+};
+
+TEST_F(VoraLibrary, ChannelHoldsEveryRecordAndThePropertiesAsAttributes) {
+  const std::string path = dir / "run.vora";
+  OpenChannel(path, "/'Bus'/'LIN1'", 2);
+  std::vector<uint8_t> expected;
+  for (uint32_t i = 0; i < 5000; ++i) {  // more than the library buffers at once
+    const auto r = Record(0, i);
+    ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
+    expected.insert(expected.end(), r.begin(), r.end());
+  }
+  FlushAndClose();
+
+  EXPECT_EQ(ReadBytes(path, "/Bus/LIN1"), expected);
+  EXPECT_EQ(ReadIntAttribute(path, "/Bus/LIN1", "QV_network_frame_byte_order"), 0);
+  EXPECT_EQ(ReadIntAttribute(path, "/Bus/LIN1", "QV_network_frame_version"), 512);
+  EXPECT_EQ(ReadIntAttribute(path, "/Bus/LIN1", "QV_network_protocol"), 2);
+}
+
+TEST_F(VoraLibrary, ReplaceModeDropsTheEarlierFileContents) {
+  const std::string path = dir / "run.vora";
+  OpenChannel(path, "/'Old'/'CAN1'", 0);
+  const auto r = Record(1, 1);
+  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
+  FlushAndClose();
+
+  OpenChannel(path, "/'New'/'CAN1'", 0);
+  FlushAndClose();
+
+  EXPECT_EQ(ReadBytes(path, "/Old/CAN1"), std::nullopt);
+  EXPECT_EQ(ReadBytes(path, "/New/CAN1"), std::vector<uint8_t>{});
+}
+
+TEST_F(VoraLibrary, OpenExistingAppendsToTheChannelAndSameObjectKeepsItsHandle) {
+  const std::string path = dir / "run.vora";
+  OpenChannel(path, "/'G'/'C'", 1);
+  const auto first = Record(2, 0), second = Record(2, 1);
+  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, first.data(), file, channel), 0);
+  int32_t again = -1;
+  ASSERT_EQ(dll.ObjCreateA("/'G'/'C'", file, &again), 0);
+  EXPECT_EQ(again, channel);
+  FlushAndClose();
+
+  ASSERT_EQ(dll.FileOpenExA(path.c_str(), 0, kReadWrite, kRevision, &file), 0);
+  ASSERT_EQ(dll.ObjCreateA("/'G'/'C'", file, &channel), 0);
+  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, second.data(), file, channel), 0);
+  FlushAndClose();
+
+  std::vector<uint8_t> expected(first.begin(), first.end());
+  expected.insert(expected.end(), second.begin(), second.end());
+  EXPECT_EQ(ReadBytes(path, "/G/C"), expected);
+}
+
+TEST_F(VoraLibrary, RefusedOpensLeaveTheFileHandleUnset) {
+  setenv("KELVANERT_DRIVE_C", dir.path.c_str(), 1);
+  const std::string path = dir / "x.vora";
+  const std::string missingDirectory = dir / "missing/x.vora";
+  const struct {
+    const char* path;
+    int32_t mode, access, revision, expected;
+  } cases[] = {
+      {path.c_str(), 2, 2, 4712, kVorErrRevision},
+      {"", 2, 2, 4713, kVorErrFile},
+      {missingDirectory.c_str(), 2, 2, 4713, kVorErrFile},
+      {"D:\\x.vora", 2, 2, 4713, kVorErrFile},
+      {"C:\\..\\x.vora", 2, 2, 4713, kVorErrFile},
+      {path.c_str(), 7, 2, 4713, kVorErrArgument},
+      {path.c_str(), 2, 1, 4713, kVorErrArgument},
+      {path.c_str(), 0, 2, 4713, kVorErrFile},  // open existing: there is none
+  };
+  for (const auto& c : cases) {
+    int32_t handle = -1;
+    EXPECT_EQ(dll.FileOpenExA(c.path, c.mode, c.access, c.revision, &handle), c.expected) << c.path;
+    EXPECT_EQ(handle, -1) << c.path;
+  }
+  EXPECT_EQ(dll.FileOpenExA(nullptr, 2, 2, 4713, &file), kVorErrArgument);
+  EXPECT_FALSE(std::filesystem::exists(dir.path.parent_path() / "x.vora"));
+}
+
+TEST_F(VoraLibrary, CallsWithBadHandlesTypesOrPathsChangeNothing) {
+  const std::string path = dir / "run.vora";
+  OpenChannel(path, "/'G'/'C'", 0);
+  int32_t group = -1, object = -1;
+  ASSERT_EQ(dll.ObjCreateA("/'G'", file, &group), 0);
+  const auto r = Record(3, 0);
+  const int32_t value = 5;
+  EXPECT_EQ(dll.ObjCreateA("G/C", file, &object), kVorErrPath);
+  EXPECT_EQ(object, -1);
+  EXPECT_EQ(dll.ObjCreateA("/'G'/'D'", file + 1000, &object), kVorErrHandle);
+  EXPECT_EQ(dll.ObjRawSet(kInt32, kLinRecord, r.data(), file, channel), kVorErrDataType);
+  EXPECT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, group), kVorErrHandle);
+  EXPECT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, 77), kVorErrHandle);
+  EXPECT_EQ(dll.ObjRawSet(kBytes, kLinRecord, nullptr, file, channel), kVorErrArgument);
+  EXPECT_EQ(dll.PropSetA("p", 9, &value, file, channel), kVorErrDataType);
+  EXPECT_EQ(dll.PropSetA(nullptr, kInt32, &value, file, channel), kVorErrArgument);
+  EXPECT_EQ(dll.FileBufFlush(0, file), kVorErrArgument);
+  FlushAndClose();
+  EXPECT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), kVorErrHandle);
+  EXPECT_EQ(dll.FileClose(file), kVorErrHandle);
+  EXPECT_EQ(ReadBytes(path, "/G/C"), std::vector<uint8_t>{});
+}
+
+TEST_F(VoraLibrary, NamesWithQuotesSlashesOrNothingAreStoredEncoded) {
+  const std::string path = dir / "run.vora";
+  OpenChannel(path, "/'it's/50%'/''", 0);
+  FlushAndClose();
+  EXPECT_EQ(ReadBytes(path, "/it's%2F50%25/%"), std::vector<uint8_t>{});
+  EXPECT_EQ(ReadIntAttribute(path, "/it's%2F50%25/%", "QV_network_frame_version"), 512);
+}
+
+TEST_F(VoraLibrary, ControllerPathIsWrittenInsideTheDriveDirectory) {
+  setenv("KELVANERT_DRIVE_C", dir.path.c_str(), 1);
+  std::filesystem::create_directories(dir.path / "QV-RT" / "kelvane");
+  OpenChannel("c:\\QV-RT\\kelvane\\run.vora", "/''/''", 0);
+  FlushAndClose();
+  EXPECT_TRUE(ReadBytes(dir / "QV-RT/kelvane/run.vora", "/%/%").has_value());
+}
+
+TEST_F(VoraLibrary, SessionsOnSeveralThreadsWriteTheirOwnFiles) {
+  constexpr uint32_t kWriters = 4, kRecords = 20000;
+  ASSERT_EQ(dll.SetOS(0), 0);
+  std::vector<std::thread> writers;
+  for (uint32_t w = 0; w < kWriters; ++w) {
+    writers.emplace_back([&, w] {
+      const std::string path = dir / ("s" + std::to_string(w) + ".vora");
+      int32_t f = -1, c = -1;
+      if (dll.FileOpenExA(path.c_str(), 2, 2, 4713, &f) != 0) return;
+      dll.ObjCreateA("/'G'/'C'", f, &c);
+      for (uint32_t i = 0; i < kRecords; ++i) {
+        const auto r = Record(w, i);
+        dll.ObjRawSet(kBytes, kLinRecord, r.data(), f, c);
+      }
+      dll.FileBufFlush(3, f);
+      dll.FileClose(f);
+    });
+  }
+  for (auto& t : writers) t.join();
+  for (uint32_t w = 0; w < kWriters; ++w) {
+    const auto bytes = ReadBytes(dir / ("s" + std::to_string(w) + ".vora"), "/G/C");
+    ASSERT_TRUE(bytes.has_value());
+    ASSERT_EQ(bytes->size(), kRecords * kLinRecord);
+    for (uint32_t i = 0; i < kRecords; i += 997) {
+      const auto r = Record(w, i);
+      ASSERT_TRUE(std::equal(r.begin(), r.end(), bytes->begin() + i * kLinRecord)) << w << " " << i;
+    }
+  }
+}
+
+TEST_F(VoraLibrary, UnloadingWithAFileOpenWritesAndClosesIt) {
+  const std::string path = dir / "run.vora";
+  OpenChannel(path, "/'G'/'C'", 0);
+  const auto r = Record(4, 4);
+  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
+  dll.Unload();
+  EXPECT_EQ(ReadBytes(path, "/G/C"), std::vector<uint8_t>(r.begin(), r.end()));
+}
+
+TEST_F(VoraLibrary, H5dumpReadsGroupsChannelsAndProperties) {
+  if (!std::filesystem::exists(H5DUMP_PATH)) GTEST_SKIP() << "h5dump is not installed";
+  const std::string path = dir / "run.vora";
+  OpenChannel(path, "/'Bus'/'CAN1'", 0);
+  const auto r = Record(5, 0);
+  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
+  FlushAndClose();
+
+  const std::string command = std::string(H5DUMP_PATH) + " '" + path + "' 2>&1";
+  FILE* pipe = popen(command.c_str(), "r");
+  ASSERT_NE(pipe, nullptr);
+  std::string out;
+  char buffer[4096];
+  for (size_t n; (n = fread(buffer, 1, sizeof buffer, pipe)) > 0;) out.append(buffer, n);
+  EXPECT_EQ(pclose(pipe), 0) << out;
+  EXPECT_NE(out.find("GROUP \"Bus\""), std::string::npos) << out;
+  EXPECT_NE(out.find("DATASET \"CAN1\""), std::string::npos) << out;
+  EXPECT_NE(out.find("H5T_STD_U8LE"), std::string::npos) << out;
+  EXPECT_NE(out.find("DATASPACE  SIMPLE { ( 24 ) / ( H5S_UNLIMITED ) }"), std::string::npos) << out;
+  EXPECT_NE(out.find("ATTRIBUTE \"QV_network_frame_version\""), std::string::npos) << out;
+  EXPECT_NE(out.find("(0): 512"), std::string::npos) << out;
+}
+
+}  // namespace
