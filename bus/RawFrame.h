@@ -43,9 +43,12 @@ inline constexpr uint32_t RawPayloadLength(const RawFrameHeader& h) {
 }
 
 // Size of the padded payload area: 8 when empty, else the length rounded up to a multiple of 8.
+// Rounded without an 11-bit mask: lengths 2041 to 2047 take 2048 bytes, never 0, so a payload
+// never reaches past its own frame.
 inline constexpr uint32_t RawPayloadArea(uint32_t length) {
-  return length == 0 ? 8u : ((length + 7u) & 0x7F8u);
+  return length == 0 ? 8u : ((length + 7u) & ~7u);
 }
+static_assert(RawPayloadArea(0) == 8 && RawPayloadArea(9) == 16 && RawPayloadArea(2047) == 2048);
 
 inline constexpr uint32_t RawFrameSize(const RawFrameHeader& h) {
   return kRawFrameHeaderSize + RawPayloadArea(RawPayloadLength(h));

@@ -1,0 +1,32 @@
+// Counting CAN frames into the CAN bus statistics, and preparing them to be sent.
+#pragma once
+
+#include <cstdint>
+
+#include "bus/BusStatistics.h"
+#include "bus/CanFrameTimes.h"
+#include "bus/RawFrame.h"
+
+namespace nKV_DLL300 {
+
+inline constexpr uint32_t kCanExtendedIdentifier = 0x20000000;
+inline constexpr uint32_t kCanStateId = 0x00130010;  // 4-byte state word
+
+// A frame taken into the identifier table: remote (0x01) and bus-error (0x02) frames count as such,
+// J1939 frames (0xC0) count nowhere, every other type is a standard or extended data frame whose
+// durations go into the bus time. inWindow: the statistics window is still open, so the frame also
+// counts into the PerSecond field.
+void countFrame(CanBusStatistics& statistics, CanFrameTimes& times, const RawFrameHeader& frame,
+                bool inWindow);
+
+// Before a send, over the elapsed milliseconds since the last one: busLoad (and peakBusLoad when it
+// is exceeded) from the bus time, and the four window counts turned into frames per second.
+void prepareToSend(CanBusStatistics& statistics, const CanFrameTimes& times, uint64_t elapsedMs);
+
+// The driver's CAN state word (read with kCanStateId) and its fault code.
+void decodeState(CanBusStatistics& statistics, uint32_t state, uint32_t faultCode);
+
+// When the window has passed: bus time, busLoad and the four PerSecond fields start from 0.
+void endWindow(CanBusStatistics& statistics, CanFrameTimes& times);
+
+}  // namespace nKV_DLL300
