@@ -1,0 +1,75 @@
+// Drive mapping: drive letter check, separator change and a lexical walk that cannot climb out.
+#include "platform/Drive.h"
+
+#include <cerrno>
+#include <cstdlib>
+#include <vector>
+
+namespace platform {
+
+namespace {
+
+bool isSeparator(char c) { return c == '\\' || c == '/'; }
+
+bool hasDriveLetter(std::string_view path) {
+  return path.size() >= 2 && path[1] == ':' &&
+         ((path[0] >= 'A' && path[0] <= 'Z') || (path[0] >= 'a' && path[0] <= 'z'));
+}
+
+// Splits on separators and resolves "." and ".."; false when ".." climbs above the root.
+bool resolveComponents(std::string_view rest, std::vector<std::string_view>& parts) {
+  size_t begin = 0;
+  while (begin <= rest.size()) {
+    size_t end = begin;
+    while (end < rest.size() && !isSeparator(rest[end])) ++end;
+    const std::string_view part = rest.substr(begin, end - begin);
+    if (part == "..") {
+      if (parts.empty()) return false;
+      parts.pop_back();
+    } else if (!part.empty() && part != ".") {
+      parts.push_back(part);
+    }
+    begin = end + 1;
+  }
+  return true;
+}
+
+}  // namespace
+
+std::string DriveDirectory() {
+  if (const char* drive = std::getenv("KELVANERT_DRIVE_C"); drive != nullptr && *drive != '\0') {
+    return drive;
+  }
+  const char* home = std::getenv("HOME");
+  const std::string base = (home != nullptr && *home != '\0') ? home : ".";
+  return base + "/.kelvanert/drive_c";
+}
+
+std::optional<std::string> MapRuntimePath(std::string_view runtimePath) {
+  if (runtimePath.find('\0') != std::string_view::npos) return std::nullopt;
+  std::string_view rest = runtimePath;
+  if (hasDriveLetter(rest)) {
+    if (rest[0] != 'C' && rest[0] != 'c') return std::nullopt;
+    rest.remove_prefix(2);
+  }
+  std::vector<std::string_view> parts;
+  if (!resolveComponents(rest, parts)) return std::nullopt;
+  std::string native = DriveDirectory();
+  while (native.size() > 1 && native.back() == '/') native.pop_back();
+  for (std::string_view part : parts) {
+    native += '/';
+    native += part;
+  }
+  return native;
+}
+
+std::FILE* OpenFile(const std::string& runtimePath, const char* mode) {
+  const std::optional<std::string> native = MapRuntimePath(runtimePath);
+  if (!native) {
+    errno = ENOENT;
+    return nullptr;
+  }
+  return std::fopen(native->c_str(), mode);
+}
+
+}  // namespace platform

@@ -1,0 +1,24 @@
+// The controller's drive C: as a directory of this machine; runtime paths become native ones here.
+#pragma once
+
+#include <cstdio>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace platform {
+
+// The native directory standing for "C:": $KELVANERT_DRIVE_C, else $HOME/.kelvanert/drive_c
+// (else ./.kelvanert/drive_c without a home). Read anew on every call, so tests may set it.
+std::string DriveDirectory();
+
+// Maps a runtime path ("C:\QV-RT\...", drive letter in any case, backslash or slash separators)
+// to a native path inside DriveDirectory(). A path without a drive, or "C:" followed by no
+// separator, is taken from the root of the drive. Empty result for another drive letter, an
+// embedded NUL, or ".." that would climb above the drive's root. "." and ".." are resolved.
+std::optional<std::string> MapRuntimePath(std::string_view runtimePath);
+
+// fopen of a runtime path. Returns null with errno ENOENT when the path cannot be mapped.
+std::FILE* OpenFile(const std::string& runtimePath, const char* mode);
+
+}  // namespace platform

@@ -1,0 +1,122 @@
+// Path joining and trimming, validation, local conversions and bounded copies.
+#include "paths/cPath.h"
+
+#include <gtest/gtest.h>
+
+#include <ostream>
+#include <vector>
+
+#include "errors/RaiseSites.h"
+#include "errors/cExceptionBase.h"
+
+namespace {
+
+using kxpath::cPath;
+using nENSPAN000::cExceptionBase;
+using nENSPAN000::ErrorKind;
+using nENSPAN000::packLocation;
+
+struct Join {
+  std::string current;
+  std::string component;
+  std::string result;
+};
+
+void PrintTo(const Join& j, std::ostream* out) { *out << j.current << " + " << j.component; }
+
+class JoinTest : public ::testing::TestWithParam<Join> {};
+
+TEST_P(JoinTest, TrimsAndJoinsWithBackslash) {
+  cPath path(GetParam().current);
+  path.append(GetParam().component);
+  EXPECT_EQ(path.getUtf8(), GetParam().result);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rules, JoinTest,
+    ::testing::Values(Join{"C:\\QV-RT\\", "  tarvix\\\\", "C:\\QV-RT\\tarvix"},
+                      Join{"", "log", "log"}, Join{"C:\\QV-RT", "\\", "C:\\QV-RT\\"},
+                      Join{"a", "\\b", "a\\\\b"}, Join{" a \t", "b \r\n", "a\\b"},
+                      Join{"a", std::string("b\0", 2), "a\\b"}, Join{"a", "x/../y", "a\\x/../y"},
+                      Join{"a", "\xc3\xa0 ", "a\\\xc3\xa0"}, Join{"a", " \xc2\xa0", "a\\\xc2\xa0"},
+                      Join{"a\v\f", "b", "a\\b"}));
+
+uint32_t locationOf(ErrorKind kind, uint32_t line) { return packLocation(kind, 22, 1, line); }
+
+TEST(cPathTest, InvalidComponentThrowsLine426AndLeavesPath) {
+  for (const std::string& bad : {std::string("\xc0\x80"), std::string("\xed\xa0\x80")}) {
+    cPath path("C:\\QV-RT");
+    try {
+      path.append(bad);
+      FAIL();
+    } catch (const cExceptionBase& e) {
+      EXPECT_EQ(e.errorCode(), 1);
+      EXPECT_EQ(e.locationWord(), locationOf(ErrorKind::UsageError, 426));
+    }
+    EXPECT_EQ(path.getUtf8(), "C:\\QV-RT");
+  }
+}
+
+TEST(cPathTest, AppendLocalStoresUtf8AndGetLocalGivesBytesBack) {
+  cPath path("C:\\logs");
+  path.appendLocal("M\xfc" "ller.txt");
+  EXPECT_EQ(path.getUtf8(), "C:\\logs\\M\xc3\xbcller.txt");
+  EXPECT_EQ(path.getLocal(), "C:\\logs\\M\xfc" "ller.txt");
+}
+
+TEST(cPathTest, AppendLocalTrimsLeadingBlanksKeepsInnerTrailing) {
+  cPath path("C:\\logs");
+  path.appendLocal("  name  .txt");
+  EXPECT_EQ(path.getUtf8(), "C:\\logs\\name  .txt");
+}
+
+TEST(cPathTest, AppendLocalWithInvalidByteThrowsTranslatedConversionError) {
+  cPath path("C:\\logs");
+  try {
+    path.appendLocal("x\x81");
+    FAIL();
+  } catch (const cExceptionBase& e) {
+    EXPECT_EQ(e.errorCode(), -52027);
+    EXPECT_EQ(e.locationWord(), locationOf(ErrorKind::StatusCode, 59));
+  }
+  EXPECT_EQ(path.getUtf8(), "C:\\logs");
+}
+
+TEST(cPathTest, CopyUtf8IntoExactBufferSucceedsOneLessFails) {
+  const cPath path("C:\\QV-RT");
+  std::vector<char> exact(path.getUtf8().size() + 1, 'x');
+  path.copyUtf8(exact.data(), static_cast<uint32_t>(exact.size()));
+  EXPECT_STREQ(exact.data(), "C:\\QV-RT");
+  try {
+    path.copyUtf8(exact.data(), static_cast<uint32_t>(exact.size() - 1));
+    FAIL();
+  } catch (const cExceptionBase& e) {
+    EXPECT_EQ(e.errorCode(), nENSPAN000::kDriverBufferTooSmall);
+    EXPECT_EQ(e.locationWord(), locationOf(ErrorKind::DriverStatus, 76));
+  }
+}
+
+TEST(cPathTest, CopyToMissingBufferThrowsLine71) {
+  const cPath path("C:\\QV-RT");
+  try {
+    path.copyLocal(nullptr, 10);
+    FAIL();
+  } catch (const cExceptionBase& e) {
+    EXPECT_EQ(e.errorCode(), nENSPAN000::kDriverBufferMissing);
+    EXPECT_EQ(e.locationWord(), locationOf(ErrorKind::DriverStatus, 71));
+  }
+}
+
+TEST(cPathTest, CopyWithSizeZeroIsTooSmallEvenForNullBuffer) {
+  const cPath path;
+  EXPECT_THROW(path.copyUtf8(nullptr, 0), cExceptionBase);
+}
+
+TEST(cPathTest, CopyLocalWritesCodePageBytes) {
+  const cPath path("\xc3\xa9t\xc3\xa9");
+  char buffer[4];
+  path.copyLocal(buffer, sizeof buffer);
+  EXPECT_STREQ(buffer, "\xe9t\xe9");
+}
+
+}  // namespace

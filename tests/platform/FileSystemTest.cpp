@@ -1,0 +1,60 @@
+// mkdir and attributes on runtime paths with the original errno numbers.
+#include "platform/FileSystem.h"
+
+#include <gtest/gtest.h>
+
+#include "tests/platform/TempDrive.h"
+
+namespace {
+
+constexpr int kExists = 17;
+constexpr int kNoEntry = 2;
+
+TEST(MakeDirectoryTest, CreatesThenReportsExistingWithSeventeen) {
+  TempDrive drive;
+  EXPECT_EQ(platform::MakeDirectory("C:\\QV-RT"), 0);
+  EXPECT_TRUE(drive.isDirectory("QV-RT"));
+  EXPECT_EQ(platform::MakeDirectory("C:\\QV-RT"), kExists);
+}
+
+TEST(MakeDirectoryTest, MissingParentGivesTwo) {
+  TempDrive drive;
+  EXPECT_EQ(platform::MakeDirectory("C:\\missing\\child"), kNoEntry);
+}
+
+TEST(MakeDirectoryTest, FileWhereParentShouldBeGivesTwo) {
+  TempDrive drive;
+  drive.writeFile("file");
+  EXPECT_EQ(platform::MakeDirectory("C:\\file\\sub"), kNoEntry);
+}
+
+TEST(MakeDirectoryTest, RefusedPathGivesTwoAndCreatesNothingOutside) {
+  TempDrive drive;
+  EXPECT_EQ(platform::MakeDirectory("C:\\..\\kv-escaped"), kNoEntry);
+  EXPECT_FALSE(std::filesystem::exists(drive.root.parent_path() / "kv-escaped"));
+}
+
+TEST(MakeDirectoryTest, MissingDriveDirectoryIsCreatedOnDemand) {
+  TempDrive drive;
+  const std::filesystem::path nested = drive.root / "deeper" / "drive_c";
+  setenv("KELVANERT_DRIVE_C", nested.c_str(), 1);
+  EXPECT_EQ(platform::MakeDirectory("C:\\QV-RT"), 0);
+  EXPECT_TRUE(std::filesystem::is_directory(nested / "QV-RT"));
+}
+
+TEST(GetFileAttributesTest, TellsDirectoryFileAndMissing) {
+  TempDrive drive;
+  drive.writeFile("dir/file.txt");
+  EXPECT_EQ(platform::GetFileAttributes("C:\\dir"), platform::kFileAttributeDirectory);
+  EXPECT_EQ(platform::GetFileAttributes("C:\\dir\\file.txt"), platform::kFileAttributeNormal);
+  EXPECT_EQ(platform::GetFileAttributes("C:\\nothing"), platform::kInvalidFileAttributes);
+  EXPECT_EQ(platform::GetFileAttributes("D:\\dir"), platform::kInvalidFileAttributes);
+}
+
+TEST(ErrorTextTest, DescribesKnownAndUnknownNumbers) {
+  EXPECT_FALSE(platform::ErrorText(kExists).empty());
+  EXPECT_NE(platform::ErrorText(kExists), platform::ErrorText(kNoEntry));
+  EXPECT_FALSE(platform::ErrorText(99999).empty());
+}
+
+}  // namespace
