@@ -1,0 +1,136 @@
+// The host side of the link over POSIX sockets (host tools live outside the module).
+#include "host/HostClient.h"
+
+#include <arpa/inet.h>
+#include <netdb.h>
+#include <netinet/in.h>
+#include <netinet/tcp.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+
+namespace kvhost {
+
+namespace {
+
+int MillisecondsLeft(std::chrono::steady_clock::time_point deadline) {
+  auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
+      deadline - std::chrono::steady_clock::now());
+  return left.count() <= 0 ? 0 : static_cast<int>(left.count());
+}
+
+}  // namespace
+
+HostClient::~HostClient() { Close(); }
+
+HostClient::HostClient(HostClient&& other) noexcept { *this = std::move(other); }
+
+HostClient& HostClient::operator=(HostClient&& other) noexcept {
+  if (this != &other) {
+    Close();
+    socket_ = other.socket_;
+    closed_ = other.closed_;
+    buffer_ = std::move(other.buffer_);
+    error_ = std::move(other.error_);
+    other.socket_ = -1;
+  }
+  return *this;
+}
+
+bool HostClient::Connect(const std::string& host, uint16_t port) {
+  return ConnectSocket(host, port, 0);
+}
+
+bool HostClient::ConnectWithReceiveBuffer(const std::string& host, uint16_t port, int32_t bytes) {
+  return ConnectSocket(host, port, bytes);
+}
+
+bool HostClient::ConnectSocket(const std::string& host, uint16_t port, int32_t receiveBuffer) {
+  Close();
+  closed_ = false;
+  buffer_.clear();
+  sockaddr_in address{};
+  address.sin_family = AF_INET;
+  address.sin_port = htons(port);
+  std::string numeric = host == "localhost" ? "127.0.0.1" : host;
+  if (inet_pton(AF_INET, numeric.c_str(), &address.sin_addr) != 1) {
+    error_ = "not an IPv4 address: " + host;
+    return false;
+  }
+  socket_ = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+  if (socket_ < 0) {
+    error_ = std::strerror(errno);
+    return false;
+  }
+  int on = 1;
+  setsockopt(socket_, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
+  if (receiveBuffer > 0) setsockopt(socket_, SOL_SOCKET, SO_RCVBUF, &receiveBuffer, sizeof receiveBuffer);
+  if (connect(socket_, reinterpret_cast<sockaddr*>(&address), sizeof address) != 0) {
+    error_ = std::strerror(errno);
+    Close();
+    return false;
+  }
+  return true;
+}
+
+bool HostClient::Send(std::string_view text) {
+  if (socket_ < 0) return false;
+  ssize_t sent = send(socket_, text.data(), text.size(), MSG_NOSIGNAL);
+  if (sent != static_cast<ssize_t>(text.size())) {
+    error_ = sent < 0 ? std::strerror(errno) : "partial send";
+    return false;
+  }
+  return true;
+}
+
+bool HostClient::FillBuffer(std::chrono::steady_clock::time_point deadline) {
+  if (socket_ < 0 || closed_) return false;
+  pollfd fd{socket_, POLLIN, 0};
+  int ready = poll(&fd, 1, MillisecondsLeft(deadline));
+  if (ready <= 0) return false;
+  uint8_t chunk[65536];
+  ssize_t received = recv(socket_, chunk, sizeof chunk, 0);
+  if (received <= 0) {
+    closed_ = true;
+    return false;
+  }
+  buffer_.insert(buffer_.end(), chunk, chunk + received);
+  return true;
+}
+
+std::optional<HostMessage> HostClient::Receive(std::chrono::milliseconds timeout) {
+  auto deadline = std::chrono::steady_clock::now() + timeout;
+  for (;;) {
+    if (auto header = DecodeHeader(buffer_.data(), buffer_.size())) {
+      size_t total = kHeaderSize + header->payloadLength;
+      if (buffer_.size() >= total) {
+        HostMessage message;
+        message.header = *header;
+        message.headerBytes.assign(buffer_.begin(), buffer_.begin() + kHeaderSize);
+        message.payload.assign(buffer_.begin() + kHeaderSize, buffer_.begin() + total);
+        buffer_.erase(buffer_.begin(), buffer_.begin() + total);
+        return message;
+      }
+    }
+    if (!FillBuffer(deadline)) return std::nullopt;
+  }
+}
+
+bool HostClient::WaitForClose(std::chrono::milliseconds timeout) {
+  auto deadline = std::chrono::steady_clock::now() + timeout;
+  while (!closed_) {
+    if (!FillBuffer(deadline) && !closed_) return false;
+    buffer_.clear();
+  }
+  return true;
+}
+
+void HostClient::Close() {
+  if (socket_ >= 0) close(socket_);
+  socket_ = -1;
+}
+
+}  // namespace kvhost

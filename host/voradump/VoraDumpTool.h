@@ -1,0 +1,31 @@
+// vora-dump: lists a measurement-data file and decodes its channels to text log lines.
+#pragma once
+
+#include <cstdio>
+#include <string>
+
+#include "host/voradump/RecordDecoder.h"
+
+namespace voradump {
+
+struct DumpSelection {
+  bool decode = false;
+  std::string group;    // empty: every group
+  std::string channel;  // empty: every channel
+  bool hasGroup = false;
+  bool hasChannel = false;
+  DecodeOptions options;
+};
+
+// Lists the file's groups, channels and properties, or (with `decode`) writes the text log of every
+// selected channel to `out`; problems go to `err`. Returns the process exit code: 0 done, 1 the file
+// or a channel could not be read or written.
+int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out, std::FILE* err);
+
+// The command line of vora-dump. Returns the exit code (2 for a usage error).
+int RunVoraDump(int argc, char** argv);
+
+// A name in double quotes, bytes that are not printable written as \xNN.
+std::string Quoted(const std::string& name);
+
+}  // namespace voradump

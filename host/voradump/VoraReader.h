@@ -1,0 +1,56 @@
+// Reads measurement-data files (HDF5 as vora.dll writes them): groups, channels, properties, bytes.
+#pragma once
+
+#include <hdf5.h>
+
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace voradump {
+
+struct Property {
+  std::string name;
+  std::optional<int64_t> integer;  // set for integer properties
+  std::string text;                // the value as text, for display
+};
+
+struct Channel {
+  std::string group;    // decoded names, as the writer gave them
+  std::string name;
+  std::string hdf5Path; // the dataset's path in the file
+  uint64_t bytes = 0;
+  std::vector<Property> properties;
+
+  std::optional<int64_t> IntegerProperty(const std::string& propertyName) const;
+};
+
+struct Group {
+  std::string name;  // decoded
+  std::vector<Property> properties;
+  std::vector<Channel> channels;
+};
+
+// A measurement-data file opened for reading. Not thread-safe (HDF5 is not).
+class VoraReader {
+ public:
+  // Null with `error` set when the file cannot be opened as HDF5.
+  static std::unique_ptr<VoraReader> Open(const std::string& path, std::string& error);
+  ~VoraReader();
+  VoraReader(const VoraReader&) = delete;
+  VoraReader& operator=(const VoraReader&) = delete;
+
+  // Every group below the root with its channels (one-dimensional byte datasets), in name order.
+  // Other objects (written by other tools) are skipped.
+  std::vector<Group> Groups() const;
+  // The raw bytes of a channel; false when they cannot be read.
+  bool ReadBytes(const Channel& channel, std::vector<uint8_t>& out) const;
+
+ private:
+  explicit VoraReader(hid_t file) : file_(file) {}
+  hid_t file_;
+};
+
+}  // namespace voradump

@@ -1,0 +1,40 @@
+// The table of command handlers, indexed by command identifier.
+#include "protocol/CommandHandlers.h"
+
+#include <array>
+
+#include "protocol/HardwareInfo.h"
+#include "protocol/MessageTable.h"
+#include "service/HostLink.h"
+
+namespace nKV_DLL300 {
+
+namespace {
+
+// A recognised command whose handler is not in place yet: taken, nothing sent.
+int32_t Unanswered(HostConnection&) { return 0; }
+
+// Keeps the connection alive; never answered.
+int32_t Heartbeat(HostConnection& connection) {
+  RestartHeartbeat(connection);
+  return 0;
+}
+
+std::array<CommandHandler, kCommandCount> MakeHandlers() {
+  std::array<CommandHandler, kCommandCount> handlers{};
+  handlers.fill(&Unanswered);
+  handlers[kCommandHeartbeat] = &Heartbeat;
+  handlers[kCommandGetHardwareInfo] = &SendHardwareInfo;
+  return handlers;
+}
+
+const std::array<CommandHandler, kCommandCount> kHandlers = MakeHandlers();
+
+}  // namespace
+
+CommandHandler CommandHandlerFor(int32_t id) {
+  if (id <= kCommandUnknown || id >= kCommandCount) return &Unanswered;
+  return kHandlers[static_cast<size_t>(id)];
+}
+
+}  // namespace nKV_DLL300

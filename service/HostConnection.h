@@ -1,0 +1,68 @@
+// One connected host: its socket, tables, settings, sequence number, heartbeat and session.
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <mutex>
+#include <vector>
+
+#include "bus/CBusSystem.h"
+#include "platform/net/Socket.h"
+#include "protocol/HardwareRecord.h"
+#include "protocol/MessageTable.h"
+#include "protocol/SessionSettings.h"
+#include "service/ServiceStatistics.h"
+#include "timing/Stopwatch.h"
+
+namespace nKV_DLL300 {
+
+// What a new connection takes over from the service at accept.
+struct ConnectionSetup {
+  uint32_t driverVersion[kDriverVersionCount] = {};
+  std::vector<HardwareRecord> hardwareTable;  // the connection's own copy
+  ServiceStatistics* statistics = nullptr;    // not owned; may be null
+};
+
+// Created by the service thread at accept and destroyed when its slot is freed, after its
+// session has been stopped and deleted. The service thread runs every handler; the session's
+// poll thread and log writers also send through it (SendReply serialises them) and read its
+// settings.
+class HostConnection {
+ public:
+  HostConnection(platform::net::SocketHandle socket, ConnectionSetup setup);
+  ~HostConnection();
+  HostConnection(const HostConnection&) = delete;
+  HostConnection& operator=(const HostConnection&) = delete;
+
+  SessionSettings settings;  // see SessionSettings for its guards
+  const MessageTable commandTable;
+  const MessageTable propertyTable;
+  std::atomic<uint32_t> busType{0};  // 0 none, 1 CAN, 2 LIN, 3 FlexRay
+  uint32_t driverVersion[kDriverVersionCount] = {};  // set at construction, read-only after
+  std::atomic<int32_t> lastTcpError{0};  // result of the last send on this connection
+  Stopwatch heartbeatWatch;               // service thread only
+  std::unique_ptr<CBusSystem> session;    // service thread only
+  std::atomic<bool> closeRequested{false};
+  const std::vector<HardwareRecord> hardwareTable;  // own copy, read-only
+  const uint16_t hardwareCount;
+  ServiceStatistics* const statistics;  // not owned; may be null
+
+  // The socket while the connection holds one; kInvalidSocket after CloseConnection.
+  // Service thread only (SendReply reads it under its lock).
+  platform::net::SocketHandle socket() const { return socket_; }
+  // True once a send failed so badly that the stream cannot go on; the loop then ends the
+  // connection. Any thread.
+  bool linkBroken() const { return linkBroken_.load(); }
+
+ private:
+  friend class LinkAccess;
+
+  std::mutex sendMutex_;
+  platform::net::SocketHandle socket_;  // changed under sendMutex_ by the service thread only
+  uint32_t sequenceNumber_ = 0;         // guarded by sendMutex_
+  std::vector<uint8_t> pendingOutput_;  // guarded by sendMutex_: unsent rest of one message
+  std::atomic<bool> linkBroken_{false};
+};
+
+}  // namespace nKV_DLL300

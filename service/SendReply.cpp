@@ -1,0 +1,130 @@
+// The send procedure: header and payload go out together under the connection's send lock.
+#include "service/SendReply.h"
+
+#include <cstring>
+
+#include "platform/net/SocketError.h"
+#include "service/LinkAccess.h"
+#include "service/MessageHeader.h"
+#include "timing/Time.h"
+
+namespace nKV_DLL300 {
+
+namespace net = platform::net;
+
+namespace {
+
+constexpr uint32_t kSendWaitMs = 1000;
+
+// Milliseconds left until `deadline` (a NowIn(kMilliseconds) reading).
+uint32_t RemainingMs(uint64_t deadline) {
+  uint64_t now = NowIn(kMilliseconds);
+  return now >= deadline ? 0 : static_cast<uint32_t>(deadline - now);
+}
+
+uint32_t PayloadLength(const void* payload, uint8_t type, uint32_t length) {
+  if (IsBinaryMessageType(type) && length != 0) return payload == nullptr ? 0 : length;
+  return payload == nullptr ? 0 : static_cast<uint32_t>(std::strlen(static_cast<const char*>(payload)));
+}
+
+MessageHeaderFields HeaderFor(HostConnection& connection, const CBusSystem* session, uint8_t type,
+                              uint32_t payloadLength) {
+  MessageHeaderFields fields;
+  fields.sequenceNumber = LinkAccess::sequenceNumber(connection);
+  fields.type = type;
+  fields.payloadLength = payloadLength;
+  uint32_t busType = connection.busType.load();
+  if (session != nullptr && busType >= 1 && busType <= 3) {
+    fields.idCount = session->idCount.load();
+    fields.lastStatus = session->lastStatus.load();
+  }
+  for (size_t i = 0; i < 4; ++i) {
+    fields.versionBytes[i] = static_cast<uint8_t>(connection.driverVersion[i]);
+  }
+  return fields;
+}
+
+// The stream cannot go on (the system refused a send): shut it down so the service thread sees
+// the connection end in its next pass. The descriptor stays open until then, so its number
+// cannot be handed to another host while a slot or thread still uses it.
+int32_t BreakLink(HostConnection& connection) {
+  net::ShutdownBoth(LinkAccess::socket(connection));
+  LinkAccess::pendingOutput(connection).clear();
+  LinkAccess::linkBroken(connection).store(true);
+  return kSendFailed;
+}
+
+// Sends what is left of an earlier message until `deadline`; true when nothing is left.
+// Send lock held.
+bool FlushPendingLocked(HostConnection& connection, uint64_t deadline) {
+  std::vector<uint8_t>& pending = LinkAccess::pendingOutput(connection);
+  net::SocketHandle socket = LinkAccess::socket(connection);
+  while (!pending.empty()) {
+    if (net::WaitWritable(socket, RemainingMs(deadline)) <= 0) return false;
+    net::ConstBuffer rest{pending.data(), pending.size()};
+    int64_t sent = net::SendBuffers(socket, &rest, 1);
+    if (sent < 0) {
+      int32_t error = net::LastSocketError();
+      bool noRoom = error == net::kErrorWouldBlock || error == net::kErrorTimedOut;
+      if (noRoom && RemainingMs(deadline) > 0) continue;
+      if (noRoom) return false;
+      BreakLink(connection);
+      return false;
+    }
+    pending.erase(pending.begin(), pending.begin() + sent);
+  }
+  return true;
+}
+
+// One message, whole or not at all. Send lock held.
+int32_t SendMessageLocked(HostConnection& connection, const net::ConstBuffer (&parts)[2]) {
+  net::SocketHandle socket = LinkAccess::socket(connection);
+  if (socket == net::kInvalidSocket || LinkAccess::linkBroken(connection).load()) {
+    return kSendFailed;
+  }
+  uint64_t deadline = NowIn(kMilliseconds) + kSendWaitMs;
+  if (!FlushPendingLocked(connection, deadline)) return kSendFailed;
+  if (net::WaitWritable(socket, RemainingMs(deadline)) <= 0) return kSendFailed;
+  int64_t sent = net::SendBuffers(socket, parts, 2);
+  if (sent < 0) {
+    int32_t error = net::LastSocketError();
+    if (error == net::kErrorTimedOut) return net::kErrorTimedOut;
+    if (error == net::kErrorWouldBlock) return kSendFailed;  // no room after all: nothing sent
+    return BreakLink(connection);
+  }
+  // Keep the rest so the stream stays whole; it goes out before the next message.
+  std::vector<uint8_t>& pending = LinkAccess::pendingOutput(connection);
+  size_t offset = static_cast<size_t>(sent);
+  for (const net::ConstBuffer& part : parts) {
+    const auto* bytes = static_cast<const uint8_t*>(part.data);
+    if (offset < part.size) pending.insert(pending.end(), bytes + offset, bytes + part.size);
+    offset = offset > part.size ? offset - part.size : 0;
+  }
+  return 0;
+}
+
+}  // namespace
+
+void SendReply(HostConnection& connection, const void* payload, const CBusSystem* session,
+               uint8_t type, uint32_t length) {
+  uint32_t payloadLength = PayloadLength(payload, type, length);
+  int32_t result;
+  {
+    std::lock_guard<std::mutex> lock(LinkAccess::sendMutex(connection));
+    MessageHeader header = EncodeMessageHeader(HeaderFor(connection, session, type, payloadLength));
+    ++LinkAccess::sequenceNumber(connection);  // once per message, sent or not; wraps to 0
+    const net::ConstBuffer parts[2] = {{header.data(), header.size()}, {payload, payloadLength}};
+    result = SendMessageLocked(connection, parts);
+    connection.lastTcpError.store(result);
+  }
+  if (result != 0 && connection.statistics != nullptr) connection.statistics->failedSends++;
+}
+
+void FlushPendingOutput(HostConnection& connection) {
+  std::unique_lock<std::mutex> lock(LinkAccess::sendMutex(connection), std::try_to_lock);
+  if (!lock.owns_lock() || LinkAccess::socket(connection) == net::kInvalidSocket) return;
+  if (LinkAccess::linkBroken(connection).load()) return;
+  FlushPendingLocked(connection, NowIn(kMilliseconds));
+}
+
+}  // namespace nKV_DLL300

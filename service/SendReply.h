@@ -1,0 +1,37 @@
+// Sending one headed message to a host, from the service thread or a session's threads.
+#pragma once
+
+#include <cstdint>
+
+#include "bus/CBusSystem.h"
+#include "service/HostConnection.h"
+
+namespace nKV_DLL300 {
+
+// Result codes of a send.
+constexpr int32_t kSendFailed = -3;
+
+// Sends the header and `payload` as one message; the result goes to connection.lastTcpError.
+// For binary types (0, 1, 2, 6, 7) the payload length is `length` when it is not 0; for every
+// other type, and for length 0, it is the length of the NUL-terminated text `payload` (the NUL
+// is not sent). A null payload sends the header alone. Header bytes 12 to 19 carry `session`'s
+// values when it is given and the connection's busType is 1 to 3.
+//
+// Any thread. Messages of one connection never interleave and the sequence number rises by one
+// per message, sent or not. A message is either queued whole or dropped whole: when the host
+// does not read, a send waits at most 1 s for room, then fails with -3 and the connection stays.
+// A message the system took only in part is finished before the next one.
+void SendReply(HostConnection& connection, const void* payload, const CBusSystem* session,
+               uint8_t type, uint32_t length);
+
+// SendReply of a NUL-terminated text.
+inline void SendText(HostConnection& connection, const char* text, const CBusSystem* session,
+                     uint8_t type) {
+  SendReply(connection, text, session, type, 0);
+}
+
+// Tries to pass the unsent rest of a partly taken message to the system without waiting.
+// The service thread calls it in every pass; it never blocks on a send in another thread.
+void FlushPendingOutput(HostConnection& connection);
+
+}  // namespace nKV_DLL300

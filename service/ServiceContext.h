@@ -1,0 +1,81 @@
+// The one service of the module: listener, service thread, driver values, eight host slots.
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "platform/net/Socket.h"
+#include "protocol/DriverSystem.h"
+#include "protocol/HardwareRecord.h"
+#include "qvapal/tThreadController.h"
+#include "service/HostConnection.h"
+#include "service/ServiceStatistics.h"
+
+namespace nKV_DLL300 {
+
+class CPollTCPThread;
+
+constexpr size_t kConnectionSlots = 8;
+constexpr uint32_t kModuleStartDelayMs = 10000;
+
+// How a service starts. The module always uses the defaults with the linked driver; tests
+// shorten the delay and let the system choose the port.
+struct ServiceOptions {
+  uint32_t startDelayMs = kModuleStartDelayMs;
+  // Replaces the configuration file when set (its text is read like the file's value).
+  std::optional<std::string> portText;
+  DriverSystem* driver = nullptr;  // required; not owned, must outlive the service
+  // Send buffer of accepted sockets in bytes; 0 keeps the system's default.
+  int32_t socketSendBufferBytes = 0;
+};
+
+// One slot of the connection table: free (invalid socket, no connection) or occupied.
+struct ConnectionSlot {
+  platform::net::SocketHandle socket = platform::net::kInvalidSocket;
+  std::unique_ptr<HostConnection> connection;
+};
+
+// Construction starts the service thread. After construction every field below is the service
+// thread's, except where a comment says otherwise.
+class ServiceContext {
+ public:
+  explicit ServiceContext(ServiceOptions options);
+  // Shuts down in order (see Shutdown).
+  ~ServiceContext();
+  ServiceContext(const ServiceContext&) = delete;
+  ServiceContext& operator=(const ServiceContext&) = delete;
+
+  // Ends the service for unloading: stops the loop, waits for the service thread, stops every
+  // session, closes the connections and the listener. Idempotent; any thread but the service
+  // thread.
+  void Shutdown();
+
+  // The port the listener is bound to, or -1 before it listens (or after a failed set-up).
+  // Any thread.
+  int32_t listeningPort() const { return boundPort.load(); }
+  // Any thread.
+  const ServiceStatistics& statistics() const { return stats; }
+
+  std::atomic<platform::net::SocketHandle> listenSocket{platform::net::kInvalidSocket};
+  std::unique_ptr<nQVAPAL000::tThreadController> threadController;  // constructing thread
+  std::unique_ptr<CPollTCPThread> serviceThread;                     // constructing thread
+  std::atomic<bool> running{true};                                   // any thread
+  uint32_t driverVersion[kDriverVersionCount] = {};
+  std::vector<HardwareRecord> hardwareTable;  // rebuilt at every accept; copied to each host
+  std::array<ConnectionSlot, kConnectionSlots> connections;
+  const ServiceOptions options;
+  ServiceStatistics stats;                  // atomics, any thread
+  std::atomic<int32_t> boundPort{-1};       // any thread
+  std::atomic<bool> shutDown_{false};       // any thread: Shutdown ran
+};
+
+// The start-up and loop of the service thread: wait, configuration, listener, version values,
+// then passes of the connection loop every 10 ms while running.
+void RunService(ServiceContext& context);
+
+}  // namespace nKV_DLL300

@@ -1,0 +1,127 @@
+// The in-process service fixture shared by every over-TCP test.
+#include "tests/support/ServiceFixture.h"
+
+#include <cstdlib>
+#include <fstream>
+#include <random>
+#include <sstream>
+#include <thread>
+
+#include "tests/support/FakeDriverSystem.h"
+
+namespace kvtest {
+
+namespace fs = std::filesystem;
+
+bool WaitUntil(const std::function<bool()>& condition, std::chrono::milliseconds timeout) {
+  auto deadline = std::chrono::steady_clock::now() + timeout;
+  while (!condition()) {
+    if (std::chrono::steady_clock::now() >= deadline) return condition();
+    std::this_thread::sleep_for(2ms);  // polling interval of the condition, not a wait for it
+  }
+  return true;
+}
+
+TemporaryDrive::TemporaryDrive() {
+  std::random_device random;
+  for (;;) {
+    path_ = fs::temp_directory_path() / ("kelvanert-drive-" + std::to_string(random()));
+    if (fs::create_directory(path_)) break;
+  }
+  setenv("KELVANERT_DRIVE_C", path_.c_str(), 1);
+}
+
+TemporaryDrive::~TemporaryDrive() {
+  std::error_code ignored;
+  fs::remove_all(path_, ignored);
+}
+
+fs::path TemporaryDrive::Native(const std::string& belowDrive) const {
+  std::string relative = belowDrive;
+  for (char& c : relative) {
+    if (c == '\\') c = '/';
+  }
+  return path_ / relative;
+}
+
+std::optional<std::string> TemporaryDrive::ReadFile(const std::string& belowDrive) const {
+  std::ifstream file(Native(belowDrive), std::ios::binary);
+  if (!file) return std::nullopt;
+  std::ostringstream contents;
+  contents << file.rdbuf();
+  return contents.str();
+}
+
+void TemporaryDrive::WriteFile(const std::string& belowDrive, const std::string& contents) const {
+  fs::path native = Native(belowDrive);
+  fs::create_directories(native.parent_path());
+  std::ofstream(native, std::ios::binary) << contents;
+}
+
+void ServiceFixture::SetUp() { StartService(); }
+
+void ServiceFixture::TearDown() { StopService(); }
+
+nKV_DLL300::ServiceOptions ServiceFixture::Options() {
+  nKV_DLL300::ServiceOptions options;
+  options.startDelayMs = 0;
+  options.portText = "0";
+  return options;
+}
+
+nKV_DLL300::DriverSystem& ServiceFixture::Driver() {
+#ifdef KV_TEST_WITH_TARVIX
+  return nKV_DLL300::TarvixDriverSystem();
+#else
+  if (!fallbackDriver_) {
+    fallbackDriver_ = std::make_unique<FakeDriverSystem>(FakeDriverSystem::DefaultHardware());
+  }
+  return *fallbackDriver_;
+#endif
+}
+
+void ServiceFixture::StartService() {
+  StopService();
+  nKV_DLL300::ServiceOptions options = Options();
+  if (options.driver == nullptr) options.driver = &Driver();
+  service_ = std::make_unique<nKV_DLL300::ServiceContext>(options);
+  ASSERT_TRUE(WaitUntil([&] { return service_->listeningPort() >= 0; }))
+      << "the service did not start listening";
+  port_ = static_cast<uint16_t>(service_->listeningPort());
+}
+
+void ServiceFixture::StopService() {
+  if (service_) service_->Shutdown();
+  service_.reset();
+}
+
+kvhost::HostClient ServiceFixture::ConnectQuietly() {
+  kvhost::HostClient host;
+  EXPECT_TRUE(host.Connect("127.0.0.1", port_)) << host.error();
+  return host;
+}
+
+kvhost::HostClient ServiceFixture::ConnectHost() {
+  kvhost::HostClient host = ConnectQuietly();
+  auto greeting = host.Receive(kReplyDeadline);
+  EXPECT_TRUE(greeting.has_value()) << "no greeting";
+  if (greeting) {
+    EXPECT_EQ(greeting->text(), "<Connected to Kelvane>\n");
+  }
+  return host;
+}
+
+std::optional<kvhost::HostMessage> ServiceFixture::Exchange(kvhost::HostClient& host,
+                                                            const std::string& text) {
+  EXPECT_TRUE(host.Send(text)) << host.error();
+  return host.Receive(kReplyDeadline);
+}
+
+void ServiceFixture::SendAndWaitDispatched(kvhost::HostClient& host, const std::string& text) {
+  uint32_t before = service_->statistics().messagesReceived.load();
+  ASSERT_TRUE(host.Send(text)) << host.error();
+  ASSERT_TRUE(WaitUntil([&] { return service_->statistics().messagesReceived.load() > before; }))
+      << "the service did not take the message " << text;
+}
+
+}  // namespace kvtest
