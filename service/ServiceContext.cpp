@@ -48,6 +48,7 @@ void SetUp(ServiceContext& context) {
   context.listenSocket.store(listener);
   (void)readDriverVersion(*context.options.driver, context.driverVersion);
   if (listener != net::kInvalidSocket) context.boundPort.store(net::LocalPort(listener));
+  context.setUpComplete.store(true);
 }
 
 }  // namespace

@@ -60,6 +60,9 @@ class ServiceContext {
   int32_t listeningPort() const { return boundPort.load(); }
   // Any thread.
   const ServiceStatistics& statistics() const { return stats; }
+  // True once the configuration was read and the listener set up (successfully or not).
+  // Any thread.
+  bool isSetUp() const { return setUpComplete.load(); }
 
   std::atomic<platform::net::SocketHandle> listenSocket{platform::net::kInvalidSocket};
   std::unique_ptr<nQVAPAL000::tThreadController> threadController;  // constructing thread
@@ -71,6 +74,7 @@ class ServiceContext {
   const ServiceOptions options;
   ServiceStatistics stats;                  // atomics, any thread
   std::atomic<int32_t> boundPort{-1};       // any thread
+  std::atomic<bool> setUpComplete{false};   // any thread: configuration and listener done
   std::atomic<bool> shutDown_{false};       // any thread: Shutdown ran
 };
 

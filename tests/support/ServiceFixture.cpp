@@ -80,11 +80,15 @@ nKV_DLL300::DriverSystem& ServiceFixture::Driver() {
 #endif
 }
 
-void ServiceFixture::StartService() {
+void ServiceFixture::StartService(bool requireListening) {
   StopService();
   nKV_DLL300::ServiceOptions options = Options();
   if (options.driver == nullptr) options.driver = &Driver();
   service_ = std::make_unique<nKV_DLL300::ServiceContext>(options);
+  if (!requireListening) {
+    ASSERT_TRUE(WaitUntil([&] { return service_->isSetUp(); })) << "the service did not set up";
+    return;
+  }
   ASSERT_TRUE(WaitUntil([&] { return service_->listeningPort() >= 0; }))
       << "the service did not start listening";
   port_ = static_cast<uint16_t>(service_->listeningPort());

@@ -55,7 +55,10 @@ class ServiceFixture : public ::testing::Test {
   // with the default hardware.
   virtual nKV_DLL300::DriverSystem& Driver();
 
-  void StartService();
+  // Starts the service and waits until it listens, or with kSetUpOnly until its set-up ended
+  // (the default port may be taken by another program).
+  static constexpr bool kSetUpOnly = false;
+  void StartService(bool requireListening = true);
   void StopService();
   nKV_DLL300::ServiceContext& service() { return *service_; }
   uint16_t port() const { return port_; }

@@ -1,0 +1,87 @@
+// The heartbeat rule and sends on a connection without a socket, without any network.
+#include "service/HostLink.h"
+
+#include <gtest/gtest.h>
+
+#include "service/SendReply.h"
+
+namespace nKV_DLL300 {
+namespace {
+
+constexpr uint64_t kElevenSecondsPs = 11'000'000'000'000ull;
+
+class FakeSession : public CBusSystem {
+ public:
+  FakeSession(HostConnection* owner, int* stops, bool* destroyed)
+      : CBusSystem(owner), stops_(stops), destroyed_(destroyed) {}
+  ~FakeSession() override { *destroyed_ = true; }
+  int32_t pollOnce() override { return 0; }
+  int32_t stop() override {
+    ++*stops_;
+    return 0;
+  }
+  void startPollThread() override {}
+  int32_t clearDriverSession() override { return 0; }
+  int32_t pollLoop() override { return 0; }
+  void reportBusState(uint64_t) override {}
+
+ private:
+  int* stops_;
+  bool* destroyed_;
+};
+
+
+TEST(HostLinkTest, LapsedHeartbeatStopsTheSessionBeforeClosing) {
+  ServiceStatistics statistics;
+  HostConnection connection(platform::net::kInvalidSocket, ConnectionSetup{{}, {}, &statistics});
+  int stops = 0;
+  bool destroyed = false;
+  connection.session = std::make_unique<FakeSession>(&connection, &stops, &destroyed);
+  connection.heartbeatWatch.accumulatedPs = kElevenSecondsPs;
+
+  EXPECT_EQ(CheckHeartbeat(connection), kHeartbeatTimeout);
+  EXPECT_EQ(stops, 1);
+  EXPECT_TRUE(destroyed);
+  EXPECT_EQ(connection.session, nullptr);
+  EXPECT_TRUE(connection.closeRequested.load());
+  EXPECT_FALSE(connection.heartbeatWatch.isRunning);
+  EXPECT_EQ(connection.heartbeatWatch.ElapsedMilliseconds(), 0u);
+  EXPECT_EQ(statistics.heartbeatTimeouts.load(), 1u);
+}
+
+TEST(HostLinkTest, RecentHeartbeatLeavesTheConnectionAlone) {
+  HostConnection connection(platform::net::kInvalidSocket, ConnectionSetup{});
+  connection.heartbeatWatch.accumulatedPs = kElevenSecondsPs;
+  RestartHeartbeat(connection);
+  EXPECT_EQ(CheckHeartbeat(connection), 0);
+  EXPECT_FALSE(connection.closeRequested.load());
+  EXPECT_TRUE(connection.heartbeatWatch.isRunning);
+}
+
+TEST(HostLinkTest, SendWithoutSocketFailsAndStillCountsTheMessage) {
+  ServiceStatistics statistics;
+  HostConnection connection(platform::net::kInvalidSocket, ConnectionSetup{{}, {}, &statistics});
+  SendText(connection, "<ACK: x>\n", nullptr, 3);
+  EXPECT_EQ(connection.lastTcpError.load(), kSendFailed);
+  EXPECT_EQ(statistics.failedSends.load(), 1u);
+}
+
+TEST(HostLinkTest, NewConnectionStartsFromTheDefaults) {
+  ConnectionSetup setup;
+  setup.hardwareTable.resize(3);
+  for (uint32_t i = 0; i < kDriverVersionCount; ++i) setup.driverVersion[i] = i + 1;
+  HostConnection connection(platform::net::kInvalidSocket, std::move(setup));
+  EXPECT_EQ(connection.hardwareCount, 3);
+  EXPECT_EQ(connection.driverVersion[4], 5u);
+  EXPECT_EQ(connection.busType.load(), 0u);
+  EXPECT_EQ(connection.settings.txTimeData.load(), 1000u);
+  EXPECT_EQ(connection.settings.keySlot.load(), 0xFFFFFFFFu);
+  EXPECT_EQ(connection.settings.runMode.Get(), "SUBORDINATE");
+  EXPECT_EQ(connection.commandTable.Find("CMD_HEARTBEAT"), 6);
+  EXPECT_EQ(connection.propertyTable.Find("SET_PROP_SESSION_NODE_NAME"), 35);
+  EXPECT_EQ(connection.propertyTable.Find("SET_PROP_SESSION_NODE_NAMEX"), 0);
+  EXPECT_TRUE(connection.heartbeatWatch.isRunning);
+}
+
+}  // namespace
+}  // namespace nKV_DLL300
