@@ -20,6 +20,7 @@ struct CanIdentifierRules {
   static constexpr bool kFiltersBusErrors = true;
   static constexpr uint8_t kBusErrorType = 0x02;
 
+  static constexpr int kKeyBits = 40;
   struct KeyState {};  // the key depends on the frame alone
 
   static uint64_t key(const RawFrameView& frame, KeyState&) {

@@ -24,6 +24,7 @@ struct FlexRayIdentifierRules {
   static constexpr uint8_t kFlagChannelA = 0x10;
   static constexpr uint8_t kFlagChannelB = 0x20;
 
+  static constexpr int kKeyBits = 33;
   struct KeyState {
     uint8_t previousChannel = 0;
   };

@@ -40,6 +40,9 @@ struct TableSettings {
 // Rules is CanIdentifierRules, LinIdentifierRules or FlexRayIdentifierRules.
 template <class Rules>
 class IdentifierTable {
+  static_assert(Rules::kKeyBits <= IdentifierIndex::kKeyBits);
+  static_assert(kIdentifierTableLimit <= IdentifierIndex::kMaxEntries);
+
  public:
   using Entry = typename Rules::Entry;
 

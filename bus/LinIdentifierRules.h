@@ -21,6 +21,7 @@ struct LinIdentifierRules {
   static constexpr bool kFiltersBusErrors = true;
   static constexpr uint8_t kBusErrorType = 0x41;
 
+  static constexpr int kKeyBits = 32;
   struct KeyState {};
 
   static uint64_t key(const RawFrameView& frame, KeyState&) { return frame.header.identifier; }
