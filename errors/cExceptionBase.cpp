@@ -1,11 +1,11 @@
 // The code exception's location word, its text, and the translation of foreign exceptions.
 #include "errors/cExceptionBase.h"
 
-#include <cstdio>
 #include <new>
 
 #include "errors/Exception.h"
 #include "errors/RaiseSites.h"
+#include "qvapal/TraceOutput.h"
 
 namespace nENSPAN000 {
 
@@ -38,7 +38,7 @@ void cExceptionBase::fillLocation(ErrorKind kind, uint32_t module, uint32_t file
 }
 
 const char* cExceptionBase::what() const noexcept {
-  std::snprintf(text, sizeof text, "0x%08X", static_cast<uint32_t>(code));
+  nQVAPAL000::traceFormat(text, sizeof text, "0x%08X", static_cast<uint32_t>(code));
   return text;
 }
 
