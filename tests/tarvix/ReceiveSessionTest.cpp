@@ -1,0 +1,218 @@
+// Receive sessions on CAN buses: default traffic, frame layout, time stamps, bus time, arbitration,
+// wrong bit rate, read time-out and the bounded queue.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <chrono>
+
+#include "driver/FrameTypes.h"
+#include "driver/Properties.h"
+#include "driver/States.h"
+#include "tests/tarvix/TarvixTestSupport.h"
+
+namespace tarvix::test {
+namespace {
+
+using driver::kExtendedIdFlag;
+
+constexpr uint64_t kUnixEpochAsFileTime = 116444736000000000ULL;
+constexpr uint8_t kErrorsOn[2] = {1, 0};
+
+class ReceiveSessionTest : public TarvixTest {
+ protected:
+  void Load(const std::string& json) {
+    std::string error;
+    ASSERT_TRUE(LoadConfiguration(json, ".", &error)) << error;
+  }
+};
+
+uint64_t NowAsFileTime() {
+  const auto ns = std::chrono::duration_cast<std::chrono::nanoseconds>(
+                      std::chrono::system_clock::now().time_since_epoch()).count();
+  return kUnixEpochAsFileTime + static_cast<uint64_t>(ns / 100);
+}
+
+TEST_F(ReceiveSessionTest, SubordinateSessionSeesTheBodyBusTraffic) {
+  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN2@qv_corle_tarvix");
+  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
+  const auto frames = ReadUntil(s, [](const auto& f) {
+    return CountId(f, 0, driver::kFrameCanBusError) >= 1 && CountId(f, 0x100, 0) >= 3;
+  });
+  const auto find = [&](uint32_t id, uint8_t type) {
+    return *std::find_if(frames.begin(), frames.end(),
+                         [&](const Frame& f) { return f.identifier == id && f.type == type; });
+  };
+  ASSERT_GE(CountId(frames, 0x100, 0), 3u);
+  ASSERT_GE(CountId(frames, 0, driver::kFrameCanBusError), 1u);
+  EXPECT_EQ(find(0x1A0, 0).payload, (std::vector<uint8_t>{0xAA, 0xBB, 0xCC}));
+  EXPECT_EQ(find(0x321, driver::kFrameCanRemote).length, 0u);
+  EXPECT_EQ(find(0x18FEF100 | kExtendedIdFlag, 0).payload,
+            (std::vector<uint8_t>{0x00, 0x11, 0x22, 0x33, 0x44, 0x55, 0x66, 0x77}));
+  std::vector<uint8_t> counters;
+  for (const Frame& f : frames) {
+    if (f.identifier != 0x100) continue;
+    EXPECT_EQ(std::vector<uint8_t>(f.payload.begin() + 1, f.payload.end()),
+              (std::vector<uint8_t>{1, 2, 3, 4, 5, 6, 7}));
+    counters.push_back(f.payload[0]);
+  }
+  for (size_t i = 1; i < counters.size(); ++i) EXPECT_EQ(uint8_t(counters[i - 1] + 1), counters[i]);
+}
+
+TEST_F(ReceiveSessionTest, TimeStampsAreWallClockTimesInOrder) {
+  const uint64_t before = NowAsFileTime();
+  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
+  const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 10; });
+  const uint64_t after = NowAsFileTime();
+  ASSERT_GE(frames.size(), 10u);
+  const uint64_t tolerance = 10000000;  // 1 s: two clocks are compared
+  for (size_t i = 0; i < frames.size(); ++i) {
+    EXPECT_GE(frames[i].timestamp + tolerance, before);
+    EXPECT_LE(frames[i].timestamp, after + tolerance);
+    if (i > 0) {
+      EXPECT_GT(frames[i].timestamp, frames[i - 1].timestamp) << "one bus carries one frame at a time";
+    }
+  }
+}
+
+TEST_F(ReceiveSessionTest, ReadWithZeroTimeoutOnQuietBusReturnsAtOnce) {
+  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN3");
+  uint8_t buffer[64];
+  uint32_t bytes = 99;
+  EXPECT_EQ(kxReadFrame(s, buffer, sizeof buffer, 0.0, &bytes), driver::kReadTimeout);
+  EXPECT_EQ(bytes, 0u);
+  EXPECT_EQ(kxReadFrame(s, buffer, sizeof buffer, 0.01, &bytes), driver::kReadTimeout);
+  EXPECT_EQ(kxReadFrame(s, nullptr, sizeof buffer, 0.0, &bytes), driver::kBufferMissing);
+  EXPECT_EQ(kxReadFrame(0x04FFFFFF, buffer, sizeof buffer, 0.0, &bytes), driver::kInvalidReference);
+}
+
+TEST_F(ReceiveSessionTest, SmallBufferGetsWholeFramesOnly) {
+  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN5");
+  std::vector<uint8_t> buffer(100000);
+  const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 0x200, driver::kFrameCanFdBrsData) > 0; });
+  uint32_t bytes = 0;
+  // 64-byte FD frames take 80 bytes; 40 bytes of room take none of them.
+  kxStatus st = driver::kReadTimeout;
+  const auto deadline = std::chrono::steady_clock::now() + kDeadline;
+  while (st != driver::kBufferTooSmall && std::chrono::steady_clock::now() < deadline) {
+    st = kxReadFrame(s, buffer.data(), 40, 0.0, &bytes);
+    if (st == 0) {
+      EXPECT_EQ(bytes % 8, 0u);
+    }
+  }
+  EXPECT_EQ(st, driver::kBufferTooSmall);
+  EXPECT_EQ(bytes, 0u);
+}
+
+TEST_F(ReceiveSessionTest, FdBusCarriesItsFourFrames) {
+  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN6");
+  const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 0x080, 0) >= 2; });
+  const auto first = [&](uint32_t id, uint8_t type) {
+    auto it = std::find_if(frames.begin(), frames.end(), [&](const Frame& f) { return f.identifier == id && f.type == type; });
+    EXPECT_NE(it, frames.end()) << std::hex << id;
+    return it == frames.end() ? Frame{} : *it;
+  };
+  const Frame brs = first(0x200, driver::kFrameCanFdBrsData);
+  ASSERT_EQ(brs.length, 64u);
+  for (uint32_t i = 0; i < 64; ++i) EXPECT_EQ(brs.payload[i], i);
+  const Frame fd = first(0x201, driver::kFrameCanFdData);
+  ASSERT_EQ(fd.length, 12u);
+  EXPECT_EQ(fd.payload[0], 0xA0);
+  EXPECT_EQ(fd.payload[11], 0xAB);
+  const Frame ext = first(0x1ABCDE00 | kExtendedIdFlag, driver::kFrameCanFdBrsData);
+  ASSERT_EQ(ext.length, 16u);
+  EXPECT_EQ(ext.payload[15], 0xFF);
+  EXPECT_EQ(first(0x080, 0).length, 8u);
+}
+
+TEST_F(ReceiveSessionTest, SaturatedBusCarriesWhatBitLengthsAllowAndNoMore) {
+  Load(R"({"buses":[{"name":"sat","bitRate":500000,
+            "traffic":[{"id":"0x123","length":8,"periodMs":0,"payload":"55 55 55 55 55 55 55 55"}]}],
+          "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"sat"}]}]})");
+  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
+  const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 200; });
+  ASSERT_GE(frames.size(), 200u);
+  // A standard frame with 8 bytes takes 111 bits without stuff bits, 130 with the most; at
+  // 500 kbit/s one bit is 20 units of 100 ns.
+  const uint64_t gap = frames[1].timestamp - frames[0].timestamp;
+  EXPECT_GE(gap, 111u * 20);
+  EXPECT_LE(gap, 130u * 20);
+  for (size_t i = 1; i < frames.size(); ++i) {
+    EXPECT_EQ(frames[i].timestamp - frames[i - 1].timestamp, gap) << "back to back, never closer";
+  }
+}
+
+TEST_F(ReceiveSessionTest, CompetingFramesGoOutByIdentifierPriority) {
+  Load(R"({"buses":[{"name":"b","bitRate":500000,"traffic":[
+            {"id":"0x300","length":1,"periodMs":1000},
+            {"id":"0x1FFFFFFF","extended":true,"length":1,"periodMs":1000},
+            {"id":"0x100","kind":"remote","periodMs":1000},
+            {"id":"0x100","length":1,"periodMs":1000},
+            {"id":"0x0FF","length":1,"periodMs":1000}]}],
+          "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"b"}]}]})");
+  // Frames due at the same moment: the first round shows the arbitration order.
+  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
+  const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 10; });
+  ASSERT_GE(frames.size(), 10u);
+  // The session may have joined in the middle of a round: find the round's first frame.
+  size_t start = 0;
+  while (frames[start].identifier != 0x0FF) ++start;
+  ASSERT_LE(start + 5, frames.size());
+  EXPECT_EQ(frames[start + 1].identifier, 0x100u);
+  EXPECT_EQ(frames[start + 1].type, driver::kFrameCanData) << "a data frame beats a remote frame";
+  EXPECT_EQ(frames[start + 2].type, driver::kFrameCanRemote);
+  EXPECT_EQ(frames[start + 3].identifier, 0x300u);
+  EXPECT_EQ(frames[start + 4].identifier, 0x1FFFFFFF | kExtendedIdFlag);
+}
+
+TEST_F(ReceiveSessionTest, WrongBitRateSeesBusErrorFramesInsteadOfTraffic) {
+  const kxRef s = Open(driver::kDatabaseCan, "CAN1");
+  ASSERT_EQ(kxStop(s, driver::kScopeInterfaceOnly), 0);
+  ASSERT_EQ(Set<uint64_t>(s, driver::kPropBaudRate, 250000), 0);
+  ASSERT_EQ(kxStart(s, driver::kScopeNormal), 0);
+  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
+  const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 20; });
+  ASSERT_GE(frames.size(), 20u);
+  for (const Frame& f : frames) {
+    EXPECT_EQ(f.type, driver::kFrameCanBusError);
+    EXPECT_EQ(f.identifier, 0u);
+    EXPECT_EQ(f.length, 0u);
+  }
+  uint32_t state = 0;
+  uint32_t fault = 1;
+  ASSERT_EQ(kxReadState(s, driver::kStateCan, 4, &state, &fault), 0);
+  EXPECT_GT(state >> 24, 0u) << "receive errors are counted";
+  EXPECT_EQ(fault, 0u);
+}
+
+TEST_F(ReceiveSessionTest, ClassicSessionOnFdBusSeesFdFramesAsErrors) {
+  const kxRef s = Open(driver::kDatabaseCan, "CAN5");
+  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
+  const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 0x080, 0) >= 2; });
+  EXPECT_EQ(CountId(frames, 0x200, driver::kFrameCanFdBrsData), 0u);
+  EXPECT_GT(CountId(frames, 0, driver::kFrameCanBusError), 0u);
+}
+
+TEST_F(ReceiveSessionTest, OverflowDropsTheOldestFramesAndWarnsOnce) {
+  Load(R"({"receiveQueueFrames":8,
+          "buses":[{"name":"sat","bitRate":500000,"traffic":[{"id":"0x123","length":1,"periodMs":0,"payload":"ctr"}]}],
+          "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"sat"}]}]})");
+  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
+  std::vector<uint8_t> buffer(4096);
+  uint32_t bytes = 0;
+  kxStatus st = 0;
+  const auto deadline = std::chrono::steady_clock::now() + kDeadline;
+  do {
+    std::this_thread::sleep_for(std::chrono::milliseconds(5));  // lets more than 8 frames pass
+    st = kxReadFrame(s, buffer.data(), static_cast<uint32_t>(buffer.size()), 0.0, &bytes);
+  } while (st != driver::kWarnReceiveQueueOverflow && std::chrono::steady_clock::now() < deadline);
+  ASSERT_EQ(st, driver::kWarnReceiveQueueOverflow);
+  EXPECT_GT(st, 0) << "a warning: the frames read are good";
+  const auto frames = Decode(buffer.data(), bytes);
+  ASSERT_EQ(frames.size(), 8u);
+  for (size_t i = 1; i < frames.size(); ++i) {
+    EXPECT_EQ(uint8_t(frames[i - 1].payload[0] + 1), frames[i].payload[0]) << "the newest frames remain";
+  }
+}
+
+}  // namespace
+}  // namespace tarvix::test
