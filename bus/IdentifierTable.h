@@ -38,6 +38,15 @@ struct TableSettings {
 // identifiers (CAN types, FlexRay channels) keep the order in which the entries were made.
 //
 // Rules is CanIdentifierRules, LinIdentifierRules or FlexRayIdentifierRules.
+//
+// A poll loop uses it like this (CAN shown):
+//   auto table = CanIdentifierTable::Create(settings.dataLogIdsMax, tableResource);
+//   if (!table) { recordStatus(kStatusPayloadNotStored); idle until stopped; }
+//   per batch:  recordStatus(table->updateIdentifierTable(buffer, bytesRead, {logTx, logErr},
+//                   [&](const RawFrameView& f) { if (txTimeStatistic > 0) countFrame(...); }));
+//               idCount = table->idCount();
+//   per period: bool reset = resetRequested.exchange(false);  if (reset) statistics = {};
+//               table->sendIdentifierRecords(reset, sendThroughSendReply); idCount = ...;
 template <class Rules>
 class IdentifierTable {
   static_assert(Rules::kKeyBits <= IdentifierIndex::kKeyBits);
