@@ -18,7 +18,7 @@ constexpr std::string_view kPropertyPrefix = "SET_PROP";
 constexpr std::string_view kTxPropertyPrefix = "SET_TX_PROP";
 constexpr char kUnknownCommandText[] = "<ERROR: unknown command>\n";
 constexpr char kUnknownPropertyText[] = "<ERROR: unknown SETPROP command>\n";
-constexpr uint32_t kBusTypeCan = 1;
+constexpr uint32_t kCanBus = 1;  // busType of a CAN connection
 
 int32_t HandleProperty(HostConnection& connection, std::string_view text) {
   size_t equals = text.find('=');
@@ -46,7 +46,7 @@ int32_t HandleCommand(HostConnection& connection, std::string_view text) {
 int32_t HandleMessageText(HostConnection& connection, std::string_view text) {
   bool txProperty = text.starts_with(kTxPropertyPrefix);
   // Transmit properties belong to a CAN session's frame; without one they are dropped.
-  if (txProperty && (!connection.session || connection.busType.load() != kBusTypeCan)) return 0;
+  if (txProperty && (!connection.session || connection.busType.load() != kCanBus)) return 0;
   if (txProperty || text.starts_with(kPropertyPrefix)) return HandleProperty(connection, text);
   return HandleCommand(connection, text);
 }

@@ -3,22 +3,31 @@
 
 #include <array>
 
+#include "protocol/CheckedProperties.h"
 #include "protocol/MessageTable.h"
+#include "protocol/NameProperties.h"
+#include "protocol/PlainProperties.h"
+#include "protocol/SessionLockedProperties.h"
 
 namespace nKV_DLL300 {
 
 namespace {
 
-// A recognised property whose handler is not in place yet: the message is taken, nothing sent.
+// A recognised property whose handler is not in place yet (the transmit-frame properties): the
+// message is taken, nothing sent.
 void Unanswered(HostConnection&, std::string_view) {}
 
-std::array<PropertyHandler, kPropertyCount> MakeHandlers() {
-  std::array<PropertyHandler, kPropertyCount> handlers{};
+PropertyHandlerTable MakeHandlers() {
+  PropertyHandlerTable handlers{};
   handlers.fill(&Unanswered);
+  AddNamePropertyHandlers(handlers);
+  AddPlainPropertyHandlers(handlers);
+  AddCheckedPropertyHandlers(handlers);
+  AddSessionLockedPropertyHandlers(handlers);
   return handlers;
 }
 
-const std::array<PropertyHandler, kPropertyCount> kHandlers = MakeHandlers();
+const PropertyHandlerTable kHandlers = MakeHandlers();
 
 }  // namespace
 

@@ -3,27 +3,18 @@
 
 #include <cstdio>
 
+#include <exception>
+
+#include "paths/StandardPaths.h"
 #include "platform/Drive.h"
-#include "platform/FileSystem.h"
 #include "protocol/ValueReaders.h"
+#include "qvsysq/cSysqWrapper.h"
 
 namespace nKV_DLL300 {
 
 namespace {
 
 bool IsBlank(char c) { return c == ' ' || (c >= '\t' && c <= '\r'); }
-
-// Creates the service directory one level at a time; 0 or the errno of the failing level.
-int CreateServiceDirectory() {
-  std::string path = "C:";
-  for (const char* part : {"QV-RT", "tarvix", "kelvane"}) {
-    path += "\\";
-    path += part;
-    int result = platform::MakeDirectory(path);
-    if (result != 0 && result != 17) return result;  // 17: it exists already
-  }
-  return 0;
-}
 
 // The first word and a little more: enough to tell a word longer than the limit.
 std::optional<std::string> ReadFileHead(const std::string& runtimePath) {
@@ -67,12 +58,17 @@ uint16_t PortFromText(std::string_view portText) {
 }
 
 PortChoice ReadConfiguration() {
-  int error = CreateServiceDirectory();
-  if (error != 0) {
+  std::string path;
+  // The lookup creates the directory; it throws when that fails. The service must go on, so the
+  // failure is answered with the default port.
+  try {
+    kxpath::cSysqWrapper system;
+    kxpath::cPath directory = kxpath::getStandardPath(kxpath::kServiceConfigPathId, system);
+    path = directory.append(kConfigurationFileName).getLocal();
+  } catch (const std::exception& failure) {
     return {kDefaultPortText, std::string("the service directory ") + kServiceDirectory +
-                                  " cannot be created: " + platform::ErrorText(error)};
+                                  " cannot be used (" + failure.what() + ")"};
   }
-  std::string path = std::string(kServiceDirectory) + "\\" + kConfigurationFileName;
   return ChoosePortText(ReadFileHead(path));
 }
 

@@ -89,8 +89,11 @@ void FreeSlot(ServiceContext& context, ConnectionSlot& slot) {
 }
 
 int32_t ConnectionPass(ServiceContext& context) {
+  // Without a listener (failed set-up, or shut down) the wait fails at once: a silent pass.
+  net::SocketHandle listener = context.listenSocket.load();
+  if (listener == net::kInvalidSocket) return RunHeartbeatChecks(context);
   ReadSet set;
-  set.Add(context.listenSocket.load(), kNoSlot);
+  set.Add(listener, kNoSlot);
   for (size_t i = 0; i < kConnectionSlots; ++i) {
     ConnectionSlot& slot = context.connections[i];
     if (!slot.connection) continue;

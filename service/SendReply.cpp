@@ -28,14 +28,14 @@ uint32_t PayloadLength(const void* payload, uint8_t type, uint32_t length) {
 }
 
 MessageHeaderFields HeaderFor(HostConnection& connection, const CBusSystem* session, uint8_t type,
-                              uint32_t payloadLength) {
+                              uint32_t payloadLength, int32_t recordCount) {
   MessageHeaderFields fields;
   fields.sequenceNumber = LinkAccess::sequenceNumber(connection);
   fields.type = type;
   fields.payloadLength = payloadLength;
   uint32_t busType = connection.busType.load();
   if (session != nullptr && busType >= 1 && busType <= 3) {
-    fields.idCount = session->idCount.load();
+    fields.idCount = recordCount >= 0 ? static_cast<uint32_t>(recordCount) : session->idCount.load();
     fields.lastStatus = session->lastStatus.load();
   }
   for (size_t i = 0; i < 4; ++i) {
@@ -103,21 +103,33 @@ int32_t SendMessageLocked(HostConnection& connection, const net::ConstBuffer (&p
   return 0;
 }
 
-}  // namespace
-
-void SendReply(HostConnection& connection, const void* payload, const CBusSystem* session,
-               uint8_t type, uint32_t length) {
+// recordCount: what bytes 12 to 15 show instead of the session's idCount, -1 for idCount.
+void SendMessage(HostConnection& connection, const void* payload, const CBusSystem* session,
+                 uint8_t type, uint32_t length, int32_t recordCount) {
   uint32_t payloadLength = PayloadLength(payload, type, length);
   int32_t result;
   {
     std::lock_guard<std::mutex> lock(LinkAccess::sendMutex(connection));
-    MessageHeader header = EncodeMessageHeader(HeaderFor(connection, session, type, payloadLength));
+    MessageHeader header =
+        EncodeMessageHeader(HeaderFor(connection, session, type, payloadLength, recordCount));
     ++LinkAccess::sequenceNumber(connection);  // once per message, sent or not; wraps to 0
     const net::ConstBuffer parts[2] = {{header.data(), header.size()}, {payload, payloadLength}};
     result = SendMessageLocked(connection, parts);
     connection.lastTcpError.store(result);
   }
   if (result != 0 && connection.statistics != nullptr) connection.statistics->failedSends++;
+}
+
+}  // namespace
+
+void SendReply(HostConnection& connection, const void* payload, const CBusSystem* session,
+               uint8_t type, uint32_t length) {
+  SendMessage(connection, payload, session, type, length, -1);
+}
+
+void SendRecords(HostConnection& connection, const void* payload, const CBusSystem* session,
+                 uint8_t type, uint32_t length, uint16_t recordCount) {
+  SendMessage(connection, payload, session, type, length, recordCount);
 }
 
 void FlushPendingOutput(HostConnection& connection) {

@@ -24,6 +24,11 @@ constexpr int32_t kSendFailed = -3;
 void SendReply(HostConnection& connection, const void* payload, const CBusSystem* session,
                uint8_t type, uint32_t length);
 
+// SendReply of identifier records whose header (bytes 12 to 15) counts the `recordCount` records
+// this message carries: a table too large for one message goes out in several.
+void SendRecords(HostConnection& connection, const void* payload, const CBusSystem* session,
+                 uint8_t type, uint32_t length, uint16_t recordCount);
+
 // SendReply of a NUL-terminated text.
 inline void SendText(HostConnection& connection, const char* text, const CBusSystem* session,
                      uint8_t type) {

@@ -1,8 +1,7 @@
 // Start-up of the service thread, its body, and the orderly shutdown.
 #include "service/ServiceContext.h"
 
-#include <cstdio>
-
+#include "platform/Console.h"
 #include "protocol/HardwareInfo.h"
 #include "service/CPollTCPThread.h"
 #include "service/ConnectionLoop.h"
@@ -29,8 +28,7 @@ void SleepWhileRunning(const ServiceContext& context, uint64_t milliseconds) {
 }
 
 void WriteConsoleLine(const std::string& line) {
-  std::fprintf(stderr, "kelvanert: %s\n", line.c_str());
-  std::fflush(stderr);
+  platform::EtsDisplayMessage("kelvanert: %s\n", line.c_str());
 }
 
 std::string ChoosePort(const ServiceContext& context) {

@@ -1,0 +1,99 @@
+// The port name chooses the bus type; the log file name is kept inside the service directory.
+#include "protocol/NameProperties.h"
+
+#include "service/HostConnection.h"
+
+namespace nKV_DLL300 {
+
+namespace {
+
+constexpr ReplySession kNone = ReplySession::kNone;
+constexpr uint32_t kNoBus = 0;
+
+// The bus type a port name stands for by its first characters; kNoBus when none matches.
+uint32_t BusTypeOfPort(std::string_view portName) {
+  if (portName.starts_with("CAN")) return 1;
+  if (portName.starts_with("LIN")) return 2;
+  if (portName.starts_with("FlexRay")) return 3;
+  return kNoBus;
+}
+
+void PortName(HostConnection& connection, std::string_view value) {
+  uint32_t busType = BusTypeOfPort(value);
+  // busType must keep describing a live session: transmit, refusals and report headers depend on
+  // it. A name of another kind while a session runs is refused and changes nothing; a name of
+  // the same kind is stored for the next session.
+  if (connection.session && !value.empty() && busType != connection.busType.load()) {
+    SendPropertyReply(connection, "<ERROR: WRONG PORT NAME>\n", kNone);
+    return;
+  }
+  connection.settings.portName.Set(value);
+  connection.settings.interfaceName.Set(std::string(value).append(kInterfaceSuffix));
+  if (value.empty()) {
+    SendPropertyReply(connection, "<ERROR: SET_PROP_SESSION_PORTNAME: empty paramter>\n", kNone);
+  } else if (busType == kNoBus) {
+    SendPropertyReply(connection, "<ERROR: WRONG PORT NAME>\n", kNone);
+  } else {
+    connection.busType.store(busType);
+    std::string stored = connection.settings.portName.Get();
+    SendPropertyReply(connection, FillReply("<ACK: SET_PROP_SESSION_PORTNAME %s>", stored), kNone);
+  }
+}
+
+// The log file is the service directory, a separator and this name: a name holding a separator
+// of either kind, or the directory names "." and "..", would put the file somewhere else, so it
+// is no valid file name and gets the same answer as an empty one.
+bool IsValidLogFileName(std::string_view name) {
+  return !name.empty() && name.find_first_of("\\/") == std::string_view::npos && name != "." &&
+         name != "..";
+}
+
+void LogFileName(HostConnection& connection, std::string_view value) {
+  if (connection.settings.logFileEnabled.load() != 0 && connection.session) {
+    SendPropertyReply(connection, "<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n", kNone);
+    return;
+  }
+  if (IsValidLogFileName(value)) {
+    connection.settings.logFileName.Set(value);
+  } else {
+    SendPropertyReply(connection,
+                      "<ERROR: no valid file name, file name KelvaneLog will be used>\n", kNone);
+    connection.settings.logFileName.Set(kDefaultLogFileName);
+  }
+  std::string stored = connection.settings.logFileName.Get();
+  SendPropertyReply(connection, FillReply("<ACK: SET_PROP_LOGFILE_NAME %s> \n", stored), kNone);
+}
+
+// Stores the text; answers the empty-text error or the acknowledgement without a line end.
+void StoreName(HostConnection& connection, GuardedText& field, std::string_view value,
+               std::string_view emptyError, std::string_view acknowledgement) {
+  field.Set(value);
+  if (value.empty()) {
+    SendPropertyReply(connection, std::string(emptyError), kNone);
+    return;
+  }
+  SendPropertyReply(connection, FillReply(acknowledgement, field.Get()), kNone);
+}
+
+void VoraGroupName(HostConnection& connection, std::string_view value) {
+  StoreName(connection, connection.settings.voraGroupName, value,
+            "<ERROR: SET_PROP_LOGFILE_VORA_GROUP_NAME: empty paramter>\n",
+            "<ACK: SET_PROP_LOGFILE_VORA_GROUP_NAME %s>");
+}
+
+void VoraChannelName(HostConnection& connection, std::string_view value) {
+  StoreName(connection, connection.settings.voraChannelName, value,
+            "<ERROR: SET_PROP_LOGFILE_VORA_CHANNEL_NAME: empty paramter>\n",
+            "<ACK: SET_PROP_LOGFILE_VORA_CHANNEL_NAME %s>");
+}
+
+}  // namespace
+
+void AddNamePropertyHandlers(PropertyHandlerTable& table) {
+  table[kPropertySessionPortName] = &PortName;
+  table[kPropertyLogFileName] = &LogFileName;
+  table[kPropertyLogFileVoraGroupName] = &VoraGroupName;
+  table[kPropertyLogFileVoraChannelName] = &VoraChannelName;
+}
+
+}  // namespace nKV_DLL300
