@@ -110,13 +110,13 @@ bool ParseFrameToken(std::string_view token, SimFrame& f) {
 }
 
 std::string_view NextToken(std::string_view& line) {
-  const size_t start = line.find_first_not_of(" \t\r");
+  const size_t start = line.find_first_not_of(" \t\r\n");
   if (start == std::string_view::npos) {
     line = {};
     return {};
   }
   line = line.substr(start);
-  const size_t end = line.find_first_of(" \t\r");
+  const size_t end = line.find_first_of(" \t\r\n");
   std::string_view token = line.substr(0, end);
   line = end == std::string_view::npos ? std::string_view{} : line.substr(end);
   return token;
@@ -142,7 +142,7 @@ bool ReadCandumpFile(const std::string& path, std::vector<LoggedFrame>& out, std
   }
   std::string line;
   for (size_t number = 1; std::getline(in, line); ++number) {
-    if (line.find_first_not_of(" \t\r") == std::string::npos) continue;
+    if (line.find_first_not_of(" \t\r\n") == std::string::npos) continue;
     LoggedFrame f;
     if (!ParseCandumpLine(line, f)) {
       error = "candump log \"" + path + "\" line " + std::to_string(number) + ": malformed frame";

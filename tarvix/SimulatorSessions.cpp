@@ -29,6 +29,7 @@ int32_t Simulator::buildSetup(const std::string& database, const std::string& cl
   const BusConfig& bus = i.bus->config();
   if (db.fromBus) {
     const bool j1939 = db.cluster.j1939;
+    if (j1939 && i.config.protocol != driver::kProtocolCan) return driver::kProtocolMismatch;
     db.cluster = ClusterSettings{i.config.protocol, bus.bitRate, bus.dataBitRate, bus.canIoMode, j1939};
   }
   if (db.cluster.protocol != i.config.protocol) return driver::kProtocolMismatch;
