@@ -49,12 +49,29 @@ bench: deps
 	$(call flavour,build-bench,Release,)
 	@for b in build-bench/bench/*/bench_*; do [ -x "$$b" ] && echo "== $$b" && "$$b"; done; true
 
+# The drive directory of the controller and the port its configuration file names (13456
+# without a file or a usable first word).
+DRIVE_C ?= $(or $(KELVANERT_DRIVE_C),$(HOME)/.kelvanert/drive_c)
+SERVICE_DIR = $(DRIVE_C)/QV-RT/tarvix/kelvane
+
 run: build
-	@echo "The controller service is not built yet: 'make run' will start kelvanert-controller"
-	@echo "on the simulated hardware once the service exists."
+	@mkdir -p "$(SERVICE_DIR)"
+	@port=$$(awk 'BEGIN { p = 13456 } { for (i = 1; i <= NF; i++) { t = $$i; \
+	    if (length(t) <= 19 && index(t, "=") > 0) p = (substr(t, index(t, "=") + 1) + 0) % 65536; \
+	    exit } } END { print p }' "$(SERVICE_DIR)/kelvanert.ini" 2>/dev/null || echo 13456); \
+	  echo "kelvanert: service directory $(SERVICE_DIR)"; \
+	  echo "kelvanert: port $$port (listening 10 s after the start); Ctrl-C stops the controller"
+	KELVANERT_DRIVE_C="$(DRIVE_C)" ./build/bin/kelvanert-controller
+
+# The dispatcher's fuzz target for FUZZ_SECONDS (default 5 minutes), clang with libFuzzer.
+FUZZ_SECONDS ?= 300
 
 fuzz: deps
-	@echo "No fuzz targets yet."
+	cmake -S fuzz -B build-fuzz -DCMAKE_BUILD_TYPE=Debug -DCMAKE_C_COMPILER=clang -DCMAKE_CXX_COMPILER=clang++ $(CMAKE_FLAGS)
+	cmake --build build-fuzz -j $(JOBS) --target dispatcher_fuzz
+	mkdir -p build-fuzz/corpus
+	ASAN_OPTIONS=detect_leaks=1 ./build-fuzz/dispatcher_fuzz -max_total_time=$(FUZZ_SECONDS) \
+	  -max_len=1024 -timeout=10 build-fuzz/corpus fuzz/corpus
 
 clean:
 	rm -rf build build-asan build-tsan build-bench build-fuzz
