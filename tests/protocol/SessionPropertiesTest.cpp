@@ -1,0 +1,221 @@
+// Property replies while the connection holds a session: refusals by bus and the header session.
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "bus/CBusSystem.h"
+#include "host/HostClient.h"
+#include "platform/net/Socket.h"
+#include "protocol/Dispatcher.h"
+#include "service/HostConnection.h"
+#include "service/Listener.h"
+#include "tests/protocol/PropertyReplyCheck.h"
+
+namespace kvtest {
+namespace {
+
+namespace net = platform::net;
+using nKV_DLL300::CBusSystem;
+using nKV_DLL300::HostConnection;
+
+constexpr std::chrono::milliseconds kDeadline = std::chrono::seconds(10);
+constexpr uint16_t kSessionIdCount = 0x1234;
+constexpr int32_t kSessionStatus = -21;
+constexpr SessionShown kShown{kSessionIdCount, kSessionStatus};
+constexpr SessionShown kHidden{};
+
+// A session that does nothing: it only gives the header its identifier count and status.
+class IdleSession : public CBusSystem {
+ public:
+  explicit IdleSession(HostConnection* owner) : CBusSystem(owner) {}
+  int32_t pollOnce() override { return 0; }
+  int32_t stop() override { return 0; }
+  void startPollThread() override {}
+  int32_t clearDriverSession() override { return 0; }
+  int32_t pollLoop() override { return 0; }
+  void reportBusState(uint64_t) override {}
+};
+
+// A connection over loopback TCP whose handlers run on the test thread, so the test can give it
+// a session directly. The host side reads the replies.
+class SessionPropertiesTest : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    ASSERT_EQ(nKV_DLL300::OpenListener("0", listener_), 0);
+    int32_t port = net::LocalPort(listener_);
+    ASSERT_GT(port, 0);
+    ASSERT_TRUE(host_.Connect("127.0.0.1", static_cast<uint16_t>(port))) << host_.error();
+    net::SocketHandle accepted = net::Accept(listener_);
+    ASSERT_NE(accepted, net::kInvalidSocket);
+    connection_ = std::make_unique<HostConnection>(accepted, nKV_DLL300::ConnectionSetup{});
+  }
+  void TearDown() override {
+    connection_.reset();
+    if (listener_ != net::kInvalidSocket) net::Close(listener_);
+  }
+
+  void StartSession(uint32_t busType) {
+    connection_->busType.store(busType);
+    auto session = std::make_unique<IdleSession>(connection_.get());
+    session->idCount.store(kSessionIdCount);
+    session->lastStatus.store(kSessionStatus);
+    connection_->session = std::move(session);
+  }
+
+  // Handles `text` as the dispatcher does and checks the replies it sends, in order.
+  void ExpectReplies(const std::string& text, const std::vector<ExpectedReply>& replies,
+                     SessionShown shown) {
+    nKV_DLL300::HandleMessageText(*connection_, text);
+    for (const ExpectedReply& expected : replies) {
+      ExpectReply(host_.Receive(kDeadline), expected, sequence_++, shown, text);
+    }
+  }
+  // Proves that nothing was sent since the last checked reply.
+  void ExpectNothingMore() {
+    ExpectReplies("SET_PROP_FOO=1", {Error("<ERROR: unknown SETPROP command>\n")}, kHidden);
+  }
+
+  net::SocketHandle listener_ = net::kInvalidSocket;
+  kvhost::HostClient host_;
+  std::unique_ptr<HostConnection> connection_;
+  uint32_t sequence_ = 0;
+};
+
+struct LockedProperty {
+  std::string name;
+  std::string value;
+};
+
+const LockedProperty kLockedProperties[] = {
+    {"SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES", "1"}, {"SET_PROP_SESSION_TERMINATION", "1"},
+    {"SET_PROP_SESSION_RUNMODE", "NORMAL"},           {"SET_PROP_SESSION_LISTEN_ONLY", "1"},
+    {"SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES", "1"},   {"SET_PROP_SESSION_ALIAS", "SimDB"},
+    {"SET_PROP_SESSION_CLUSTER", "Body"},
+};
+
+TEST_F(SessionPropertiesTest, SessionSettingsAreRefusedNamingTheBusOfTheSession) {
+  const std::pair<uint32_t, std::string> buses[] = {{1, "CAN"}, {2, "LIN"}, {3, "FR"}};
+  for (const auto& [busType, word] : buses) {
+    StartSession(busType);
+    for (const LockedProperty& property : kLockedProperties) {
+      ExpectReplies(property.name + "=" + property.value,
+                    {Error("<ERROR: " + property.name + ": " + word + " Session yet created>\n")},
+                    kShown);
+    }
+  }
+  ExpectNothingMore();
+}
+
+TEST_F(SessionPropertiesTest, RefusedValueIsStillStoredForTheNextSession) {
+  StartSession(1);
+  ExpectReplies("SET_PROP_SESSION_TERMINATION=1",
+                {Error("<ERROR: SET_PROP_SESSION_TERMINATION: CAN Session yet created>\n")},
+                kShown);
+  ExpectReplies("SET_PROP_SESSION_RUNMODE=NORMAL",
+                {Error("<ERROR: SET_PROP_SESSION_RUNMODE: CAN Session yet created>\n")}, kShown);
+  EXPECT_EQ(connection_->settings.termination.load(), 1u);
+  EXPECT_EQ(connection_->settings.runMode.Get(), "NORMAL");
+}
+
+TEST_F(SessionPropertiesTest, RangeErrorComesBeforeTheRefusalAndShowsNoSession) {
+  StartSession(2);
+  ExpectReplies("SET_PROP_SESSION_LISTEN_ONLY=7",
+                {Error("<ERROR: SET_PROP_SESSION_LISTEN_ONLY: Value range error>\n")}, kHidden);
+  ExpectReplies("SET_PROP_SESSION_RUNMODE=MASTER",
+                {Error("<ERROR: SET_PROP_SESSION_RUNMODE: Value range error>\n")}, kHidden);
+  EXPECT_EQ(connection_->settings.listenOnly.load(), 7);
+  ExpectNothingMore();
+}
+
+TEST_F(SessionPropertiesTest, SessionOfNoKnownBusGetsNoReplyButTheValueIsStored) {
+  StartSession(0);
+  nKV_DLL300::HandleMessageText(*connection_, "SET_PROP_SESSION_CLUSTER=Body");
+  ExpectNothingMore();
+  EXPECT_EQ(connection_->settings.cluster.Get(), "Body");
+}
+
+// Replies marked "with session" carry the session's count and status in bytes 12 to 19; all
+// others carry zeros although the connection has a session.
+TEST_F(SessionPropertiesTest, HeaderShowsTheSessionOnlyInRepliesThatCarryIt) {
+  StartSession(1);
+  ExpectReplies("SET_PROP_SESSION_KEY_SLOT=3", {Ack("<ACK: SET_PROP_SESSION_KEY_SLOT 3> \n")},
+                kShown);
+  ExpectReplies("SET_PROP_SESSION_CANFD_BAUDRATE=2000000",
+                {Ack("<ACK: SET_PROP_SESSION_CANFD_BAUDRATE 2000000> \n")}, kShown);
+  ExpectReplies("SET_PROP_SESSION_ISOFD_MODE=1",
+                {Ack("<ACK: SET_PROP_SESSION_ISOFD_MODE  1> \n")}, kShown);
+  ExpectReplies("SET_PROP_SESSION_NODE_ADDRESS=5", {Ack("<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n")},
+                kShown);
+  ExpectReplies("SET_PROP_SESSION_NODE_NAME=9", {Ack("<ACK: SET_PROP_SESSION_NODE_NAME 9> \n")},
+                kShown);
+  ExpectReplies("SET_PROP_SESSION_TRANSCEIVER_TYPE=9",
+                {Error("<ERROR: SET_PROP_SESSION_TRANSCEIVER_TYPE: Value range error>\n")}, kShown);
+  ExpectReplies("SET_PROP_SESSION_SHOW_NULL_FRAMES=1",
+                {Ack("<ACK: SET_PROP_SESSION_SHOW_NULL_FRAMES 1> \n")}, kShown);
+  ExpectReplies("SET_PROP_SESSION_NO_RESPONSE_FRAMES=3",
+                {Error("<ERROR: SET_PROP_SESSION_NO_RESPONSE_FRAMES: Value range error>\n")},
+                kShown);
+  ExpectReplies("SET_PROP_SESSION_LOG_CHECKSUM=0", {Ack("<ACK: SET_PROP_SESSION_LOG_CHECKSUM 0> \n")},
+                kShown);
+  ExpectReplies("SET_PROP_SESSION_CAN_IOMODE=3",
+                {Error("<ERROR: SET_PROP_SESSION_CAN_IOMODE: Value range error>\n"),
+                 Ack("<ACK: SET_PROP_SESSION_IOMODE 3> \n")},
+                kShown);
+  ExpectReplies("SET_PROP_SESSION_APPLICATION_PROTOCOL=1",
+                {Ack("<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 1> \n")}, kShown);
+
+  ExpectReplies("SET_PROP_SESSION_BAUDRATE=500000",
+                {Ack("<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n")}, kHidden);
+  ExpectReplies("SET_PROP_TX_TIME_DATA=100", {Ack("<ACK: SETPROP_TXTIMECAN 100> \n")}, kHidden);
+  ExpectReplies("SET_PROP_DATA_LOG_IDS_MAX=10", {Ack("<ACK: SET_PROP_MEM_SIZE_ID 10> \n")},
+                kHidden);
+  ExpectReplies("SET_PROP_LOGFILE=3", {Error("<ERROR: SET_PROP_LOGFILE: Value range error>\n")},
+                kHidden);
+  ExpectReplies("SET_PROP_LOGFILE_TYPE=1", {Ack("<ACK: SET_PROP_LOGFILE_TYPE 1> \n")}, kHidden);
+  ExpectReplies("SET_PROP_TX_TIME_STATISTIC=2000",
+                {Ack("<ACK: SET_PROP_TX_TIME_STATISTIC 2000> \n")}, kHidden);
+  ExpectReplies("SET_PROP_LOGFILE_VORA_GROUP_NAME=G",
+                {Ack("<ACK: SET_PROP_LOGFILE_VORA_GROUP_NAME G>")}, kHidden);
+  ExpectReplies("SET_PROP_SESSION_PORTNAME=CAN2", {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN2>")},
+                kHidden);
+  ExpectNothingMore();
+}
+
+TEST_F(SessionPropertiesTest, LogFileNameIsRefusedOnlyWhileASessionLogs) {
+  ExpectReplies("SET_PROP_LOGFILE=1", {Ack("<ACK: SET_PROP_LOGFILE 1> \n")}, kHidden);
+  ExpectReplies("SET_PROP_LOGFILE_NAME=first", {Ack("<ACK: SET_PROP_LOGFILE_NAME first> \n")},
+                kHidden);
+  StartSession(1);
+  ExpectReplies("SET_PROP_LOGFILE_NAME=second",
+                {Error("<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n")}, kHidden);
+  ExpectReplies("SET_PROP_LOGFILE_NAME=",
+                {Error("<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n")}, kHidden);
+  EXPECT_EQ(connection_->settings.logFileName.Get(), "first");
+  ExpectReplies("SET_PROP_LOGFILE=0", {Ack("<ACK: SET_PROP_LOGFILE 0> \n")}, kHidden);
+  ExpectReplies("SET_PROP_LOGFILE_NAME=second", {Ack("<ACK: SET_PROP_LOGFILE_NAME second> \n")},
+                kHidden);
+  ExpectNothingMore();
+}
+
+// A live session keeps the bus it was made for: a port of another bus is refused and changes
+// nothing, so refusals, transmit and headers keep describing the session.
+TEST_F(SessionPropertiesTest, PortOfAnotherBusIsRefusedWhileASessionRuns) {
+  ExpectReplies("SET_PROP_SESSION_PORTNAME=CAN1", {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN1>")},
+                kHidden);
+  StartSession(1);
+  ExpectReplies("SET_PROP_SESSION_PORTNAME=LIN1", {Error("<ERROR: WRONG PORT NAME>\n")}, kHidden);
+  EXPECT_EQ(connection_->busType.load(), 1u);
+  EXPECT_EQ(connection_->settings.interfaceName.Get(), "CAN1@qv_corle_tarvix");
+  ExpectReplies("SET_PROP_SESSION_TERMINATION=1",
+                {Error("<ERROR: SET_PROP_SESSION_TERMINATION: CAN Session yet created>\n")},
+                kShown);
+  ExpectReplies("SET_PROP_SESSION_PORTNAME=CAN3", {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN3>")},
+                kHidden);
+  EXPECT_EQ(connection_->settings.interfaceName.Get(), "CAN3@qv_corle_tarvix");
+  ExpectNothingMore();
+}
+
+}  // namespace
+}  // namespace kvtest
