@@ -4,44 +4,23 @@
 #include <gtest/gtest.h>
 
 #include "service/SendReply.h"
+#include "tests/support/FakeSession.h"
 
 namespace nKV_DLL300 {
 namespace {
 
 constexpr uint64_t kElevenSecondsPs = 11'000'000'000'000ull;
 
-class FakeSession : public CBusSystem {
- public:
-  FakeSession(HostConnection* owner, int* stops, bool* destroyed)
-      : CBusSystem(owner), stops_(stops), destroyed_(destroyed) {}
-  ~FakeSession() override { *destroyed_ = true; }
-  int32_t pollOnce() override { return 0; }
-  int32_t stop() override {
-    ++*stops_;
-    return 0;
-  }
-  void startPollThread() override {}
-  int32_t clearDriverSession() override { return 0; }
-  int32_t pollLoop() override { return 0; }
-  void reportBusState(uint64_t) override {}
-
- private:
-  int* stops_;
-  bool* destroyed_;
-};
-
-
 TEST(HostLinkTest, LapsedHeartbeatStopsTheSessionBeforeClosing) {
   ServiceStatistics statistics;
   HostConnection connection(platform::net::kInvalidSocket, ConnectionSetup{{}, {}, &statistics});
-  int stops = 0;
-  bool destroyed = false;
-  connection.session = std::make_unique<FakeSession>(&connection, &stops, &destroyed);
+  kvtest::FakeSession::Calls calls;
+  connection.session = std::make_unique<kvtest::FakeSession>(&connection, calls);
   connection.heartbeatWatch.accumulatedPs = kElevenSecondsPs;
 
   EXPECT_EQ(CheckHeartbeat(connection), kHeartbeatTimeout);
-  EXPECT_EQ(stops, 1);
-  EXPECT_TRUE(destroyed);
+  EXPECT_EQ(calls.stops, 1);
+  EXPECT_TRUE(calls.destroyed);
   EXPECT_EQ(connection.session, nullptr);
   EXPECT_TRUE(connection.closeRequested.load());
   EXPECT_FALSE(connection.heartbeatWatch.isRunning);
