@@ -3,36 +3,116 @@
 
 #include <atomic>
 #include <cstdint>
+#include <memory>
+#include <memory_resource>
+
+#include "qvapal/iThread.h"
+#include "qvapal/tThreadController.h"
+#include "timing/Stopwatch.h"
 
 namespace nKV_DLL300 {
 
 class HostConnection;
 
-// Created and destroyed by the service thread; its poll thread runs between startPollThread and
-// stop. The virtual operations keep this slot order in every bus class.
+// Bus kinds, as the connection's busType numbers them.
+inline constexpr uint32_t kBusTypeNone = 0;
+inline constexpr uint32_t kBusTypeCan = 1;
+inline constexpr uint32_t kBusTypeLin = 2;
+inline constexpr uint32_t kBusTypeFlexRay = 3;
+
+// The read status that only says "no frame yet": never recorded as lastStatus.
+inline constexpr int32_t kReadNothingYet = static_cast<int32_t>(0xBFF6300A);
+// The identifier table of a poll loop could not be allocated.
+inline constexpr int32_t kStatusTableNotAllocated = -22;
+
+// Life cycle: constructed by CMD_SESSION_START (service thread) with pollActive and threadRunning
+// true; the bus's open operation creates the driver session; startPollThread starts the poll
+// thread, which calls pollOnce every 10 ms until threadRunning is cleared. stop() (service thread)
+// joins the thread before the driver session is cleared, so no read is in flight then.
+//
+// Two threads share a session: the poll thread (run, pollLoop, reportBusState) and the service
+// thread (commands, watchdog, stop, destructor). The flags, idCount and lastStatus are atomics;
+// everything else is one thread's at a time as noted. The connection outlives the session.
+//
+// The virtual operations keep this slot order in every bus class.
 class CBusSystem {
  public:
-  explicit CBusSystem(HostConnection* owner) : connection(owner) {}
+  explicit CBusSystem(HostConnection* owner, uint32_t kind = kBusTypeNone);
   CBusSystem(const CBusSystem&) = delete;
   CBusSystem& operator=(const CBusSystem&) = delete;
 
-  virtual ~CBusSystem() = default;
-  // Runs pollLoop while polling is active; returns its status, or 0 at once when paused.
-  virtual int32_t pollOnce() = 0;
-  // Stops polling, joins the poll thread, clears the driver session, closes the log file.
-  virtual int32_t stop() = 0;
+  // Slot 0. endForDestruction(); never closes the log file (stop() does).
+  virtual ~CBusSystem();
+  // Slot 1. Runs pollLoop while pollActive; returns its status, or 0 at once when paused.
+  virtual int32_t pollOnce();
+  // Slot 2. Stops polling, joins the poll thread, clears the driver session, closes the log
+  // file. Returns the clear's status, 0 when the thread had already been ended. Service thread.
+  virtual int32_t stop();
+  // Slot 3. Creates and starts the poll thread of the bus. Service thread, once.
   virtual void startPollThread() = 0;
-  virtual int32_t clearDriverSession() = 0;
+  // Slot 4. kxClear of the driver session: 0 and driverSession 0, or the failure, kept in
+  // lastStatus with driverSession unchanged. A session that holds no driver reference has
+  // nothing to close and returns 0.
+  virtual int32_t clearDriverSession();
+  // Slot 5. The read loop of the bus; poll thread.
   virtual int32_t pollLoop() = 0;
+  // Slot 6. Per-second rates, driver state and the bus-statistics message; poll thread.
   virtual void reportBusState(uint64_t elapsedMilliseconds) = 0;
+
+  // The poll thread's body: pollOnce every 10 ms while threadRunning; a non-zero status goes to
+  // lastStatus.
+  void run();
+
+  // Stores a non-zero status as lastStatus. Any thread.
+  void recordStatus(int32_t status) {
+    if (status != 0) lastStatus.store(status);
+  }
+
+  // The bus this session was created for (kBusTypeCan ...). It stays what it was even when the
+  // host names another bus with SET_PROP_SESSION_PORTNAME while the session runs: bus-specific
+  // commands and texts follow this kind, not the connection's busType.
+  const uint32_t busType;
 
   // Used entries of the identifier table: written by the poll thread, read by SendReply anywhere.
   std::atomic<uint16_t> idCount{0};
-  // Last non-zero driver status or program error code: written by both threads.
+  // Last non-zero driver status or program error code; nothing resets it. Both threads write.
   std::atomic<int32_t> lastStatus{0};
-  // The connection whose settings the session reads and to which it sends; it outlives the
-  // session. Not owned.
-  HostConnection* connection;
+  // The poll loop runs while true; cleared by CMD_SESSION_STOP and stop(). Never set again.
+  std::atomic<bool> pollActive{true};
+  // The poll thread runs while true; cleared by stop(), the destructor and a failed start.
+  std::atomic<bool> threadRunning{true};
+  // Set by CMD_SESSION_RESET; the next identifier-record send empties the table and clears it.
+  std::atomic<bool> resetRequested{false};
+  // Reference of kxCreateSession; 0 when none is held. Written by the service thread while no poll
+  // thread runs (open, stop); the poll thread only reads it.
+  uint32_t driverSession = 0;
+  // The connection whose settings the session reads and to which it sends. Not owned.
+  HostConnection* const connection;
+  // Where identifier tables are allocated; tests give a resource that refuses. Set before the
+  // poll thread starts.
+  std::pmr::memory_resource* tableResource = std::pmr::get_default_resource();
+
+ protected:
+  // Starts `body` (which points at this session) on a thread named "kelvanert"; keeps both.
+  void startPollThreadWith(std::unique_ptr<nQVAPAL000::iThread> body);
+  // If the poll thread still runs: clears both flags, waits for it, deletes it. True if it ran.
+  bool endPollThread();
+  // What a destructor does: a thread that stop() did not end is ended and its driver session
+  // cleared (result ignored). Every class that adds state the poll thread uses calls this first
+  // in its own destructor, so the thread never runs on a half-destroyed object.
+  void endForDestruction();
+
+  // Closes the log file of the session, if one is open (the log writers plug in here).
+  void closeLogFile() {}
+
+  // Poll thread only, from the start of each poll loop.
+  Stopwatch dataWatch;    // period of the identifier-record messages
+  Stopwatch stateWatch;   // period of the bus-statistics messages
+  Stopwatch windowWatch;  // counting window of the per-second rates
+
+ private:
+  std::unique_ptr<nQVAPAL000::tThreadController> pollThreadController;  // service thread
+  std::unique_ptr<nQVAPAL000::iThread> pollThread;                       // service thread
 };
 
 }  // namespace nKV_DLL300

@@ -1,0 +1,169 @@
+// The poll loop that the three bus sessions share: read, pace, fold into the identifier table, send.
+#pragma once
+
+#include <algorithm>
+#include <cstdint>
+#include <memory>
+
+#include "bus/CBusSystem.h"
+#include "bus/IdentifierTable.h"
+#include "bus/RawFrame.h"
+#include "driver/tarvix.h"
+#include "service/HostConnection.h"
+#include "service/MessageHeader.h"
+#include "service/SendReply.h"
+#include "timing/Time.h"
+
+namespace nKV_DLL300 {
+
+// How a poll loop paces its reads.
+enum class ReadPacing {
+  // After at most ten nearly full reads in a row (>= 99 000 bytes), and after every other read,
+  // the thread sleeps 1 ms (CAN, FlexRay).
+  kNearlyFullRule,
+  // The thread sleeps 1 ms after every read (LIN).
+  kAlwaysSleep,
+};
+
+// A bus session with an identifier table of `Rules`, a statistics block of `Statistics` (sent as
+// it is held) and a read buffer of kReadBufferSize bytes. It defines pollLoop; the bus class adds
+// its open operation, startPollThread, reportBusState and the bus-specific steps below. Every
+// member here is the poll thread's, except where CBusSystem says otherwise.
+template <class Rules, class Statistics, uint32_t kReadBufferSize>
+class CTableSession : public CBusSystem {
+ public:
+  using Table = IdentifierTable<Rules>;
+
+  ~CTableSession() override { endForDestruction(); }
+
+  // Slot 5: the poll loop. Allocates the table (none: -22 in lastStatus, and the loop does not
+  // run; the next pollOnce tries again, with the capacity then set), reads without blocking while
+  // pollActive, and sends the records and statistics at their periods. Returns the last read's
+  // status (0 if none was made).
+  int32_t pollLoop() override {
+    if (!beginLoop()) {
+      recordStatus(kStatusTableNotAllocated);
+      return kStatusTableNotAllocated;
+    }
+    int32_t status = 0;
+    while (pollActive.load()) status = pollPass();
+    table.reset();
+    return status;
+  }
+
+ protected:
+  CTableSession(HostConnection* owner, uint32_t kind, ReadPacing pacing)
+      : CBusSystem(owner, kind), pacing_(pacing) {}
+
+  // Bus-specific steps of the loop (called in the poll thread).
+  virtual const char* logHeaderLine() const = 0;
+  // Step 3 of the loop, after the table and before the first read.
+  virtual void prepareLoop() {}
+  // Frames in a batch of `bytes` bytes, as the log writer is told.
+  virtual uint32_t batchFrameCount(uint32_t bytes) const = 0;
+  // Hands a batch to the bus's log writer while logFileEnabled is set (the writers plug in here).
+  virtual void logBatch(const uint8_t* /*batch*/, uint32_t /*bytes*/, uint32_t /*frames*/) {}
+  // A frame taken into the table while txTimeStatistic > 0.
+  virtual void countFrame(const RawFrameView& frame, bool inWindow) = 0;
+
+  // reportBusState, step 1: a new statistics period starts now.
+  void beginReport() { stateWatch.Restart(); }
+  // The statistics block as one message of type 6.
+  void sendStatistics() {
+    SendReply(*connection, &statistics, this, kMessageStatistics, sizeof(Statistics));
+  }
+  // reportBusState, last step: true when the counting window has passed, and a new one begins.
+  // The new window starts where the report's own period started (beginReport), so each report
+  // closes exactly the period it covered; restarting it after the send instead would make the
+  // next window end a little after the next report and be counted twice.
+  bool closeWindowIfDue() {
+    if (windowWatch.ElapsedMilliseconds() <= connection->settings.txTimeStatistic.load()) {
+      return false;
+    }
+    windowWatch = stateWatch;
+    return true;
+  }
+
+  uint8_t readBuffer[kReadBufferSize];  // filled by kxReadFrame
+  Statistics statistics{};              // zeroed when a loop begins and at a reset
+  std::unique_ptr<Table> table;         // while a loop runs
+
+ private:
+  static constexpr uint32_t kNearlyFullBytes = kReadBufferSize - kReadBufferSize / 100;
+  static constexpr uint32_t kMaxBurst = 9;
+
+  bool beginLoop() {
+    table = Table::Create(connection->settings.dataLogIdsMax.load(), tableResource);
+    if (!table) return false;
+    idCount.store(0);
+    statistics = Statistics{};
+    dataWatch.Restart();
+    stateWatch.Restart();
+    windowWatch.Restart();
+    burst_ = 0;
+    prepareLoop();
+    return true;
+  }
+
+  // One read and what follows it; returns the read's status.
+  int32_t pollPass() {
+    uint32_t bytes = 0;
+    const int32_t status = kxReadFrame(driverSession, readBuffer, kReadBufferSize, 0.0, &bytes);
+    bytes = std::min(bytes, kReadBufferSize);  // never trust a count beyond the buffer
+    pace(bytes);
+    if (status != 0 && status != kReadNothingYet) recordStatus(status);
+    if (bytes > 0 && status >= 0) takeBatch(bytes);
+    SessionSettings& settings = connection->settings;
+    if (dataWatch.ElapsedMilliseconds() > settings.txTimeData.load()) sendIdentifierRecords();
+    const uint32_t statisticPeriod = settings.txTimeStatistic.load();
+    if (statisticPeriod > 0) {
+      const uint64_t elapsed = stateWatch.ElapsedMilliseconds();
+      if (elapsed > statisticPeriod) reportBusState(elapsed);
+    }
+    return status;
+  }
+
+  void pace(uint32_t bytes) {
+    if (pacing_ == ReadPacing::kNearlyFullRule && bytes >= kNearlyFullBytes && burst_ <= kMaxBurst) {
+      ++burst_;
+      return;
+    }
+    if (burst_ > kMaxBurst) burst_ = 0;
+    SleepFor(1);
+  }
+
+  void takeBatch(uint32_t bytes) {
+    SessionSettings& settings = connection->settings;
+    if (settings.logFileEnabled.load() != 0) logBatch(readBuffer, bytes, batchFrameCount(bytes));
+    const TableSettings rules{settings.logTransmittedFrames.load(),
+                              settings.logBusErrorFrames.load()};
+    const uint32_t statisticPeriod = settings.txTimeStatistic.load();
+    // A batch is read at one moment, so the window is looked at once per batch.
+    const bool inWindow = windowWatch.ElapsedMilliseconds() < statisticPeriod;
+    const int32_t status = table->updateIdentifierTable(
+        readBuffer, bytes, rules, [&](const RawFrameView& frame) {
+          if (statisticPeriod > 0) countFrame(frame, inWindow);
+        });
+    recordStatus(status);
+    idCount.store(table->idCount());
+  }
+
+  void sendIdentifierRecords() {
+    const bool reset = resetRequested.exchange(false);
+    if (reset) {
+      statistics = Statistics{};
+      idCount.store(0);
+    }
+    dataWatch.Restart();
+    (void)table->sendIdentifierRecords(
+        reset, [&](uint8_t type, const void* payload, uint32_t length, uint16_t records) {
+          SendRecords(*connection, payload, this, type, length, records);
+          return 0;  // a failed send is in lastTcpError; the other messages still go out
+        });
+  }
+
+  const ReadPacing pacing_;
+  uint32_t burst_ = 0;  // nearly full reads in a row
+};
+
+}  // namespace nKV_DLL300
