@@ -31,8 +31,10 @@ inline void AppendFrame(std::vector<uint8_t>& batch, const FrameSpec& f, uint8_t
   const size_t at = batch.size();
   batch.resize(at + nKV_DLL300::kRawFrameHeaderSize + area, pad);
   std::memcpy(batch.data() + at, &h, sizeof h);
-  std::memcpy(batch.data() + at + nKV_DLL300::kRawFrameHeaderSize, f.payload.data(),
-              std::min<size_t>(f.payload.size(), area));
+  if (!f.payload.empty()) {
+    std::memcpy(batch.data() + at + nKV_DLL300::kRawFrameHeaderSize, f.payload.data(),
+                std::min<size_t>(f.payload.size(), area));
+  }
 }
 
 inline std::vector<uint8_t> Batch(std::initializer_list<FrameSpec> frames) {

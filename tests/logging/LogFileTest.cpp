@@ -1,0 +1,231 @@
+// Log file life cycle: naming, truncation, the open failures and their reports, closing.
+#include "logging/LogFile.h"
+
+#include <sys/resource.h>
+
+#include <csignal>
+#include <filesystem>
+
+#include "logging/LogFileName.h"
+#include "logging/LogWriters.h"
+#include "tests/logging/FrameBuilder.h"
+#include "tests/logging/LogSessionHarness.h"
+
+namespace kvtest {
+namespace {
+
+namespace fs = std::filesystem;
+using namespace nKV_DLL300;
+
+constexpr std::string_view kHeader = "Timestamp\tID\tPayload\tPayload Length\tType\tName";
+
+std::vector<uint8_t> OneCanFrame(uint8_t counter) {
+  return Batch({{.identifier = 0x100, .payload = {counter, 1, 2, 3, 4, 5, 6, 7}}});
+}
+
+// Every regular file below `root`, as paths relative to it.
+std::vector<std::string> FilesBelow(const fs::path& root) {
+  std::vector<std::string> files;
+  for (const auto& entry : fs::recursive_directory_iterator(root)) {
+    if (entry.is_regular_file()) files.push_back(fs::relative(entry.path(), root).string());
+  }
+  return files;
+}
+
+TEST(LogFileExtensionTest, NamesTheThreeTypesAndRefusesOthers) {
+  EXPECT_EQ(LogFileExtension(kLogTypeText), ".txt");
+  EXPECT_EQ(LogFileExtension(kLogTypeBinary), ".zfl");
+  EXPECT_EQ(LogFileExtension(kLogTypeMeasurementData), ".vora");
+  for (uint32_t type : {3u, 255u, 0xFFFFFFFFu}) EXPECT_THROW(LogFileExtension(type), std::exception);
+}
+
+TEST(LogFileNameTest, OnlyPlainNamesAreFileNames) {
+  for (const char* name : {"run", "", "run.1", "...", " a b ", "C:x", "..a"}) {
+    EXPECT_TRUE(IsPlainFileName(name)) << name;
+  }
+  for (std::string name : {"a/b", "a\\b", ".", "..", "..\\..\\x", "/etc/passwd", std::string("a\0b", 3)}) {
+    EXPECT_FALSE(IsPlainFileName(name)) << name;
+  }
+}
+
+using LogFileTest = LogSessionTest;
+
+TEST_F(LogFileTest, EmptyNameWritesDotTxtWithTheHeaderLine) {
+  settings().logFileType.store(kLogTypeText);
+  OpenLogFile(log(), kHeader);
+  CloseLogFile(log());
+  EXPECT_EQ(ReadLog(".txt"), std::string(kHeader) + "\n");
+  EXPECT_TRUE(SentMessages().empty());
+}
+
+TEST_F(LogFileTest, EmptyRunOfABinaryLogLeavesTheTwelveByteHeader) {
+  settings().logFileType.store(kLogTypeBinary);
+  settings().logFileName.Set("empty");
+  OpenLogFile(log(), kHeader);
+  CloseLogFile(log());
+  const std::string expected(reinterpret_cast<const char*>(kBinaryLogFileHeaderBytes.data()), 12);
+  EXPECT_EQ(ReadLog("empty.zfl"), expected);
+}
+
+TEST_F(LogFileTest, SecondRunWithTheSameNameKeepsOnlyItsOwnFrames) {
+  for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
+    settings().logFileType.store(type);
+    settings().logFileName.Set("again");
+    const std::string file = "again" + LogFileExtension(type);
+    for (uint8_t run : {1, 2}) {
+      UseBus(kBusTypeCan);
+      OpenLogFile(log(), kHeader);
+      for (uint8_t i = 0; i < (run == 1 ? 5 : 2); ++i) {
+        const std::vector<uint8_t> batch = OneCanFrame(i);
+        WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
+      }
+      CloseLogFile(log());
+    }
+    const std::optional<std::string> contents = ReadLog(file);
+    ASSERT_TRUE(contents) << file;
+    if (type == kLogTypeBinary) {
+      EXPECT_EQ(contents->size(), 12u + 2 * 24u);
+    } else {
+      EXPECT_EQ(std::count(contents->begin(), contents->end(), '\n'), 3) << *contents;
+    }
+  }
+}
+
+TEST_F(LogFileTest, UnsafeNamesCreateNothingAndReportTwice) {
+  // The directory exists before, so that only the log's own file could appear.
+  settings().logFileType.store(kLogTypeText);
+  settings().logFileName.Set("ok");
+  OpenLogFile(log(), kHeader);
+  CloseLogFile(log());
+  fs::remove(ServiceDirectory() / "ok.txt");
+  const std::vector<std::string> before = FilesBelow(drive_.path());
+  for (std::string name : {"..\\..\\..\\escaped", "../../../escaped", "sub/escaped", ".", "..",
+                           "\\escaped", std::string("cut\0..\\x", 8)}) {
+    for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
+      settings().logFileName.Set(name);
+      settings().logFileType.store(type);
+      OpenLogFile(log(), kHeader);
+      CloseLogFile(log());
+      EXPECT_EQ(SentErrorTexts(), std::vector<std::string>(2, LogErrorText(kLogOpenFailed))) << name;
+      EXPECT_EQ(session().lastStatus.load(), kLogOpenFailed);
+    }
+  }
+  EXPECT_EQ(FilesBelow(drive_.path()), before);
+  EXPECT_FALSE(fs::exists(drive_.path().parent_path() / "escaped.txt"));
+}
+
+TEST_F(LogFileTest, UnknownLogTypeReportsTheNamingFailureAndOpensNothing) {
+  settings().logFileType.store(3);
+  OpenLogFile(log(), kHeader);
+  const std::vector<uint8_t> batch = OneCanFrame(0);
+  WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
+  CloseLogFile(log());
+  EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogOpenFailed)});
+}
+
+TEST_F(LogFileTest, FileThatCannotBeOpenedReportsOnceAndSkipsTheRun) {
+  // A directory where the file should be cannot be opened for writing, whoever runs the test.
+  settings().logFileName.Set("blocked");
+  for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
+    settings().logFileType.store(type);
+    fs::create_directories(ServiceDirectory() / ("blocked" + LogFileExtension(type)));
+    OpenLogFile(log(), kHeader);
+    const std::vector<uint8_t> batch = OneCanFrame(0);
+    WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
+    CloseLogFile(log());
+    EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogOpenFailed)});
+  }
+}
+
+TEST_F(LogFileTest, UnwritableServiceDirectoryReportsOnce) {
+  if (::geteuid() == 0) GTEST_SKIP() << "permissions do not bind root; see the blocked-file test";
+  settings().logFileName.Set("denied");
+  OpenLogFile(log(), kHeader);  // creates the directory
+  CloseLogFile(log());
+  fs::remove(ServiceDirectory() / "denied.txt");
+  fs::permissions(ServiceDirectory(), fs::perms::owner_read | fs::perms::owner_exec);
+  OpenLogFile(log(), kHeader);
+  CloseLogFile(log());
+  fs::permissions(ServiceDirectory(), fs::perms::owner_all);
+  EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogOpenFailed)});
+}
+
+TEST_F(LogFileTest, ServiceDirectoryThatCannotBeMadeReportsTwice) {
+  // A file stands where the directory's parent should be: the lookup fails, then the open.
+  drive_.WriteFile("QV-RT\\tarvix", "not a directory");
+  OpenLogFile(log(), kHeader);
+  CloseLogFile(log());
+  EXPECT_EQ(SentErrorTexts(), std::vector<std::string>(2, LogErrorText(kLogOpenFailed)));
+  EXPECT_EQ(session().lastStatus.load(), kLogOpenFailed);
+}
+
+TEST_F(LogFileTest, CloseWithoutAnOpenSendsNothing) {
+  CloseLogFile(log());
+  CloseLogFile(log());
+  EXPECT_TRUE(SentMessages().empty());
+}
+
+TEST_F(LogFileTest, TypeChangedDuringTheRunKeepsTheFileItsFormat) {
+  settings().logFileName.Set("steady");
+  OpenLogFile(log(), kHeader);
+  settings().logFileType.store(kLogTypeBinary);
+  const std::vector<uint8_t> batch = OneCanFrame(7);
+  WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
+  settings().logFileType.store(kLogTypeMeasurementData);
+  CloseLogFile(log());
+  const std::optional<std::string> contents = ReadLog("steady.txt");
+  ASSERT_TRUE(contents);
+  EXPECT_EQ(*contents, std::string(kHeader) + "\n09:05:03,042\t100\t07  01  02  03  04  05  06  07  \t8\tS\n");
+}
+
+// A file size limit stands for a full disk: writes beyond it fail (EFBIG), for root too.
+class FullDiskTest : public LogSessionTest {
+ protected:
+  static constexpr rlim_t kLimit = 64 * 1024;
+  void SetUp() override {
+    LogSessionTest::SetUp();
+    ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved_), 0);
+    previousHandler_ = std::signal(SIGXFSZ, SIG_IGN);
+  }
+  void TearDown() override {
+    ::setrlimit(RLIMIT_FSIZE, &saved_);
+    std::signal(SIGXFSZ, previousHandler_);
+    LogSessionTest::TearDown();
+  }
+  void LimitFileSize() {
+    rlimit limit = saved_;
+    limit.rlim_cur = kLimit;
+    ASSERT_EQ(::setrlimit(RLIMIT_FSIZE, &limit), 0);
+  }
+  rlimit saved_{};
+  void (*previousHandler_)(int) = SIG_DFL;
+};
+
+TEST_F(FullDiskTest, WritesBeyondTheLimitReportIncompleteLinesAndTheRunGoesOn) {
+  for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
+    settings().logFileType.store(type);
+    settings().logFileName.Set("full");
+    OpenLogFile(log(), kHeader);
+    LimitFileSize();
+    constexpr int kBatches = 4000;  // far more than the limit holds in either format
+    for (int i = 0; i < kBatches; ++i) {
+      const std::vector<uint8_t> batch = OneCanFrame(static_cast<uint8_t>(i));
+      WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
+    }
+    CloseLogFile(log());
+    ::setrlimit(RLIMIT_FSIZE, &saved_);
+    const std::vector<std::string> texts = SentErrorTexts();
+    ASSERT_FALSE(texts.empty());
+    for (const std::string& text : texts) EXPECT_EQ(text, LogErrorText(kLogWriteIncomplete));
+    EXPECT_EQ(session().lastStatus.load(), kLogWriteIncomplete);
+    EXPECT_LE(fs::file_size(ServiceDirectory() / ("full" + LogFileExtension(type))), kLimit);
+    // The session still logs once there is room again.
+    UseBus(kBusTypeCan);
+    OpenLogFile(log(), kHeader);
+    CloseLogFile(log());
+    EXPECT_TRUE(SentMessages().empty());
+  }
+}
+
+}  // namespace
+}  // namespace kvtest
