@@ -43,7 +43,7 @@ TEST(LogFileNameTest, OnlyPlainNamesAreFileNames) {
   for (const char* name : {"run", "", "run.1", "...", " a b ", "C:x", "..a"}) {
     EXPECT_TRUE(IsPlainFileName(name)) << name;
   }
-  for (std::string name : {"a/b", "a\\b", ".", "..", "..\\..\\x", "/etc/passwd", std::string("a\0b", 3)}) {
+  for (const std::string& name : std::vector<std::string>{"a/b", "a\\b", ".", "..", "..\\..\\x", "/etc/passwd", std::string("a\0b", 3)}) {
     EXPECT_FALSE(IsPlainFileName(name)) << name;
   }
 }
@@ -99,7 +99,7 @@ TEST_F(LogFileTest, UnsafeNamesCreateNothingAndReportTwice) {
   CloseLogFile(log());
   fs::remove(ServiceDirectory() / "ok.txt");
   const std::vector<std::string> before = FilesBelow(drive_.path());
-  for (std::string name : {"..\\..\\..\\escaped", "../../../escaped", "sub/escaped", ".", "..",
+  for (const std::string& name : std::vector<std::string>{"..\\..\\..\\escaped", "../../../escaped", "sub/escaped", ".", "..",
                            "\\escaped", std::string("cut\0..\\x", 8)}) {
     for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
       settings().logFileName.Set(name);

@@ -1,0 +1,110 @@
+// The per-bus writers: frame selection over a batch, then text lines or binary records.
+#include "logging/LogWriters.h"
+
+#include "bus/CBusSystem.h"
+#include "bus/RawFrame.h"
+#include "logging/BinaryLogFormat.h"
+#include "logging/FrameSelection.h"
+#include "logging/LogFileName.h"
+#include "logging/TextLogFormat.h"
+#include "service/HostConnection.h"
+
+namespace nKV_DLL300 {
+
+namespace {
+
+enum class LogBus : uint8_t { kCan, kLin, kFlexRay };
+
+// Settings a batch is written with; a batch is read at one moment, so they are read once for it.
+struct BatchSettings {
+  uint8_t logTransmittedFrames;
+  uint8_t logChecksum;
+};
+
+BatchSettings ReadBatchSettings(const SessionLog& log) {
+  const SessionSettings& settings = log.session().connection->settings;
+  return {settings.logTransmittedFrames.load(), settings.logChecksum.load()};
+}
+
+// Calls `write` for each of at most `frames` frames of the batch that the selection accepts.
+// Rejected frames are stepped over all the same.
+template <class Write>
+void ForEachLoggedFrame(const uint8_t* batch, uint32_t bytes, uint32_t frames, uint8_t logTransmitted,
+                        Write&& write) {
+  RawFrameWalker walker(batch, bytes);
+  RawFrameView frame;
+  for (uint32_t i = 0; i < frames && walker.next(frame); ++i) {
+    if (IsFrameLogged(frame.header, logTransmitted)) write(frame);
+  }
+}
+
+size_t FormatLine(LogBus bus, char* out, const RawFrameView& frame, uint8_t logChecksum) {
+  switch (bus) {
+    case LogBus::kCan: return FormatCanTextLine(out, SessionLog::kLineBufferSize, frame);
+    case LogBus::kLin:
+      return FormatLinTextLine(out, SessionLog::kLineBufferSize, frame, logChecksum);
+    case LogBus::kFlexRay: return FormatFlexRayTextLine(out, SessionLog::kLineBufferSize, frame);
+  }
+  return 0;
+}
+
+void WriteTextLines(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+  const BatchSettings settings = ReadBatchSettings(log);
+  char* line = log.lineBuffer();
+  ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames, [&](const RawFrameView& frame) {
+    const size_t length = FormatLine(bus, line, frame, settings.logChecksum);
+    if (!log.write(line, length)) log.fail(kLogWriteIncomplete);
+  });
+}
+
+BinaryRecordLayout RecordLayout(const SessionLog& log, LogBus bus) {
+  switch (bus) {
+    case LogBus::kCan: return log.canLayout();
+    case LogBus::kLin: return BinaryRecordLayout::kFixed24;
+    case LogBus::kFlexRay: return BinaryRecordLayout::kFlexRayVariable;
+  }
+  return BinaryRecordLayout::kFixed24;
+}
+
+// A record is the frame's first bytes in the read buffer, never more than the frame occupies
+// there, so it is written straight from the batch.
+void WriteRecords(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+  const BatchSettings settings = ReadBatchSettings(log);
+  const BinaryRecordLayout layout = RecordLayout(log, bus);
+  ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames, [&](const RawFrameView& frame) {
+    const uint8_t* record = frame.payload - kRawFrameHeaderSize;
+    if (!log.write(record, BinaryRecordSize(layout, frame.header))) log.fail(kLogWriteIncomplete);
+  });
+}
+
+void WriteBatch(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+  if (bytes == 0 || frames == 0) return;
+  switch (log.openedType()) {
+    case kLogTypeText:
+      if (log.isOpen()) WriteTextLines(log, bus, batch, bytes, frames);
+      break;
+    case kLogTypeBinary:
+      if (log.isOpen()) WriteRecords(log, bus, batch, bytes, frames);
+      break;
+    case kLogTypeMeasurementData:
+      // The measurement-data branch appends the records (RecordLayout) to voraChannel here.
+      break;
+    default: break;
+  }
+}
+
+}  // namespace
+
+void WriteCanLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+  WriteBatch(log, LogBus::kCan, batch, bytes, frames);
+}
+
+void WriteLinLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+  WriteBatch(log, LogBus::kLin, batch, bytes, frames);
+}
+
+void WriteFlexRayLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+  WriteBatch(log, LogBus::kFlexRay, batch, bytes, frames);
+}
+
+}  // namespace nKV_DLL300

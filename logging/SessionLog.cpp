@@ -1,0 +1,56 @@
+// The session's log stream and the failure report.
+#include "logging/SessionLog.h"
+
+#include <cstdio>
+
+#include "bus/CBusSystem.h"
+#include "platform/Drive.h"
+#include "service/MessageHeader.h"
+#include "service/SendReply.h"
+
+namespace nKV_DLL300 {
+
+namespace {
+
+void SendLogError(const CBusSystem& session, int32_t code) {
+  char text[sizeof kLogErrorFormat + 16];
+  std::snprintf(text, sizeof text, kLogErrorFormat, code);
+  SendText(*session.connection, text, &session, kMessageErrorText);
+}
+
+}  // namespace
+
+SessionLog::~SessionLog() {
+  if (logFile_ != nullptr) std::fclose(logFile_);
+}
+
+bool SessionLog::openStream(const std::string& runtimePath, const char* mode) {
+  if (logFile_ != nullptr) (void)closeStream();
+  logFile_ = platform::OpenFile(runtimePath, mode);
+  if (logFile_ == nullptr) return false;
+  std::setvbuf(logFile_, streamBuffer_, _IOFBF, kStreamBufferSize);
+  return true;
+}
+
+bool SessionLog::write(const void* bytes, size_t size) {
+  return std::fwrite(bytes, 1, size, logFile_) == size;
+}
+
+bool SessionLog::closeStream() {
+  if (logFile_ == nullptr) return true;
+  const bool flushed = std::fflush(logFile_) == 0;
+  std::fclose(logFile_);
+  logFile_ = nullptr;
+  return flushed;
+}
+
+void SessionLog::fail(int32_t code) {
+  session_.lastStatus.store(code);
+  // The report names the code of this failure even if the other thread overwrote lastStatus
+  // in between; the header shows lastStatus as it then is.
+  SendLogError(session_, code);
+}
+
+void ReportLogError(const CBusSystem& session) { SendLogError(session, session.lastStatus.load()); }
+
+}  // namespace nKV_DLL300

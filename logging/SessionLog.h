@@ -1,0 +1,86 @@
+// The log state of one bus session: its open text or binary stream, the measurement-data handles,
+// the writers' line buffer, and how a logging failure reaches the host.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdio>
+#include <string>
+
+#include "logging/BinaryLogFormat.h"
+#include "logging/TextLogFormat.h"
+
+namespace nKV_DLL300 {
+
+class CBusSystem;
+
+// Logging error codes, stored in the session's lastStatus and reported to the host.
+inline constexpr int32_t kLogOpenFailed = -20;       // not named, no directory, or not opened
+inline constexpr int32_t kLogWriteIncomplete = -21;  // a header, record or line not written whole
+inline constexpr int32_t kLogLibraryFailed = -24;    // the measurement-data library failed
+
+// The text a logging failure sends (message type 5), "%d" being the code.
+inline constexpr char kLogErrorFormat[] = "<ERROR:LOG FILE: %d> \n";
+
+// Owned by its session (a member) and bound to it for life.
+//
+// Threads: the session's poll thread uses it between OpenLogFile and the end of its poll loop;
+// the thread that stops the session uses it in CloseLogFile, after the poll thread was joined.
+// The two never overlap, so nothing here is locked.
+class SessionLog {
+ public:
+  explicit SessionLog(CBusSystem& session) : session_(session) {}
+  // A stream still open (a session destroyed without stop) is closed without a report.
+  ~SessionLog();
+  SessionLog(const SessionLog&) = delete;
+  SessionLog& operator=(const SessionLog&) = delete;
+
+  CBusSystem& session() const { return session_; }
+
+  // The log type this run opened with; the writers and the close follow it, not a type the
+  // host sets while the session runs (that one takes effect at the next run). -1: none yet.
+  int32_t openedType() const { return openedType_; }
+  void setOpenedType(int32_t type) { openedType_ = type; }
+  // The record layout of a binary CAN log, fixed when the log is opened so that one file never
+  // mixes the two layouts.
+  BinaryRecordLayout canLayout() const { return canLayout_; }
+  void setCanLayout(BinaryRecordLayout layout) { canLayout_ = layout; }
+
+  // The text or binary stream (logFile): open while a run logs to one.
+  bool isOpen() const { return logFile_ != nullptr; }
+  // Opens `runtimePath` (creating or truncating it) in `mode`; false when it cannot be opened.
+  // A stream still open is closed first.
+  bool openStream(const std::string& runtimePath, const char* mode);
+  // Hands `size` bytes to the stream in one call; false when it took fewer.
+  bool write(const void* bytes, size_t size);
+  // Writes the buffered rest and closes the stream; false when the rest could not be written.
+  bool closeStream();
+
+  // Stores `code` in the session's lastStatus and sends it to the host at once.
+  void fail(int32_t code);
+
+  // The writers format each text line here, then write it whole.
+  char* lineBuffer() { return line_; }
+  static constexpr size_t kLineBufferSize = kTextLineCapacity;
+
+  // Handles of the measurement-data branch (voraFile, voraChannel); -1 when none is open.
+  int32_t voraFile = -1;
+  int32_t voraChannel = -1;
+
+ private:
+  CBusSystem& session_;
+  std::FILE* logFile_ = nullptr;
+  int32_t openedType_ = -1;
+  BinaryRecordLayout canLayout_ = BinaryRecordLayout::kFixed24;
+  char line_[kLineBufferSize];
+  // The stream's buffer: larger than the default page, so that a saturated bus costs a few
+  // writes per millisecond. Outlives the stream (closed in closeStream or the destructor).
+  static constexpr size_t kStreamBufferSize = 64 * 1024;
+  char streamBuffer_[kStreamBufferSize];
+};
+
+// Sends the session's lastStatus as "<ERROR:LOG FILE: %d> \n" (message type 5), with the session
+// attached so that the header carries lastStatus too. Any thread of the session.
+void ReportLogError(const CBusSystem& session);
+
+}  // namespace nKV_DLL300
