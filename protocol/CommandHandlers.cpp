@@ -5,6 +5,7 @@
 
 #include "protocol/HardwareInfo.h"
 #include "protocol/MessageTable.h"
+#include "protocol/SessionCommands.h"
 #include "service/HostLink.h"
 
 namespace nKV_DLL300 {
@@ -23,8 +24,15 @@ int32_t Heartbeat(HostConnection& connection) {
 std::array<CommandHandler, kCommandCount> MakeHandlers() {
   std::array<CommandHandler, kCommandCount> handlers{};
   handlers.fill(&Unanswered);
+  handlers[kCommandSessionStart] = &StartSession;
+  handlers[kCommandSessionStop] = &StopSession;
+  handlers[kCommandSessionTerminate] = &TerminateSession;
+  handlers[kCommandSessionReadLastError] = &ReadLastError;
+  handlers[kCommandSessionReset] = &ResetSession;
   handlers[kCommandHeartbeat] = &Heartbeat;
   handlers[kCommandGetHardwareInfo] = &SendHardwareInfo;
+  handlers[kCommandTxStart] = &StartTransmitCommand;
+  handlers[kCommandTxStop] = &StopTransmitCommand;
   return handlers;
 }
 

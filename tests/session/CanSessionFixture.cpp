@@ -1,0 +1,102 @@
+// Hosts that run CAN sessions over TCP, and the helpers that read what the service sends them.
+#include "tests/session/CanSessionFixture.h"
+
+#include "tarvix/TarvixControl.h"
+
+namespace kvtest {
+
+const kvhost::IdentifierRecord* RecordMessage::find(uint32_t identifier, uint8_t type) const {
+  for (const kvhost::IdentifierRecord& record : records) {
+    if (record.identifier == identifier && record.type == type) return &record;
+  }
+  return nullptr;
+}
+
+void CanSessionTest::SetUp() {
+  tarvix::ResetToDefaults();
+  ServiceFixture::SetUp();
+}
+
+void CanSessionTest::TearDown() {
+  ServiceFixture::TearDown();
+  tarvix::ResetToDefaults();
+}
+
+nKV_DLL300::HostConnection& CanSessionTest::ConnectionAt(size_t slot) {
+  nKV_DLL300::ConnectionSlot& entry = service().connections.at(slot);
+  EXPECT_TRUE(WaitUntil([&] { return entry.connection != nullptr; }));
+  return *entry.connection;
+}
+
+void CanSessionTest::UsePort(nKV_DLL300::HostConnection& connection, const std::string& port) {
+  connection.settings.portName.Set(port);
+  connection.settings.interfaceName.Set(port + "@qv_corle_tarvix");
+  connection.busType.store(nKV_DLL300::kBusTypeCan);
+}
+
+std::optional<kvhost::HostMessage> CanSessionTest::NextMessage(
+    kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
+    std::chrono::milliseconds timeout) {
+  const auto deadline = std::chrono::steady_clock::now() + timeout;
+  for (;;) {
+    const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
+        deadline - std::chrono::steady_clock::now());
+    if (left.count() <= 0) return std::nullopt;
+    std::optional<kvhost::HostMessage> message = host.Receive(left);
+    if (!message) return std::nullopt;
+    if (accept(*message)) return message;
+  }
+}
+
+std::optional<kvhost::HostMessage> CanSessionTest::Command(kvhost::HostClient& host,
+                                                           const std::string& command) {
+  EXPECT_TRUE(host.Send(command)) << host.error();
+  return NextMessage(host, [](const kvhost::HostMessage& m) {
+    return m.header.type == kvhost::kText || m.header.type == kvhost::kErrorText;
+  }, kReplyDeadline);
+}
+
+std::optional<RecordMessage> CanSessionTest::RecordsWhere(
+    kvhost::HostClient& host, const std::function<bool(const RecordMessage&)>& accept) {
+  std::optional<RecordMessage> found;
+  NextMessage(host, [&](const kvhost::HostMessage& m) {
+    if (m.header.type != kvhost::kCanRecords) return false;
+    auto records = kvhost::DecodeCanRecords(m.payload, m.header.idCount);
+    EXPECT_TRUE(records.has_value()) << "a record message does not hold its header's count";
+    if (!records) return true;
+    RecordMessage decoded{m.header, std::move(*records)};
+    if (!accept(decoded)) return false;
+    found = std::move(decoded);
+    return true;
+  });
+  return found;
+}
+
+std::optional<RecordMessage> CanSessionTest::NextRecords(kvhost::HostClient& host) {
+  return RecordsWhere(host, [](const RecordMessage&) { return true; });
+}
+
+std::optional<kvhost::CanStatisticsView> CanSessionTest::NextStatistics(kvhost::HostClient& host) {
+  auto message = NextMessage(host, [](const kvhost::HostMessage& m) {
+    return m.header.type == kvhost::kStatistics;
+  });
+  if (!message) return std::nullopt;
+  auto statistics = kvhost::DecodeCanStatistics(message->payload);
+  EXPECT_TRUE(statistics.has_value()) << "statistics of " << message->payload.size() << " bytes";
+  return statistics;
+}
+
+kvhost::HostClient CanSessionTest::StartedHost(
+    size_t slot, const std::string& port,
+    const std::function<void(nKV_DLL300::SessionSettings&)>& configure) {
+  kvhost::HostClient host = ConnectHost();
+  nKV_DLL300::HostConnection& connection = ConnectionAt(slot);
+  UsePort(connection, port);
+  if (configure) configure(connection.settings);
+  auto reply = Command(host, "CMD_SESSION_START");
+  EXPECT_TRUE(reply.has_value());
+  if (reply) EXPECT_EQ(reply->text(), "<ACK: CMD_SESSION_START>\n");
+  return host;
+}
+
+}  // namespace kvtest

@@ -1,0 +1,62 @@
+// Over-TCP CAN sessions against the simulated driver: hosts, their settings, and what they receive.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <functional>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "host/HostClient.h"
+#include "host/RecordDecoder.h"
+#include "service/ServiceContext.h"
+#include "tests/support/ServiceFixture.h"
+
+namespace kvtest {
+
+// Frame types and identifiers of the default body bus.
+constexpr uint8_t kTypeData = 0x00;
+constexpr uint8_t kTypeRemote = 0x01;
+constexpr uint8_t kTypeBusError = 0x02;
+constexpr uint32_t kExtendedFlag = 0x20000000;
+
+// A decoded identifier-record message.
+struct RecordMessage {
+  kvhost::MessageHeaderView header;
+  std::vector<kvhost::IdentifierRecord> records;
+
+  const kvhost::IdentifierRecord* find(uint32_t identifier, uint8_t type = kTypeData) const;
+};
+
+class CanSessionTest : public ServiceFixture {
+ protected:
+  void SetUp() override;
+  void TearDown() override;
+
+  // The connection of the host in `slot` (hosts take slots in the order they connect).
+  nKV_DLL300::HostConnection& ConnectionAt(size_t slot);
+  // What SET_PROP_SESSION_PORTNAME stores for a CAN port: port name, interface name, bus type.
+  void UsePort(nKV_DLL300::HostConnection& connection, const std::string& port);
+
+  // Sends `command` and returns the next text reply (type 3 or 5), skipping records and statistics.
+  std::optional<kvhost::HostMessage> Command(kvhost::HostClient& host, const std::string& command);
+  // The next message for which `accept` holds, within `timeout`; others are skipped.
+  std::optional<kvhost::HostMessage> NextMessage(
+      kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
+      std::chrono::milliseconds timeout = kConditionDeadline);
+  // The next CAN record message (decoded and checked against its header's count).
+  std::optional<RecordMessage> NextRecords(kvhost::HostClient& host);
+  // The next record message for which `accept` holds.
+  std::optional<RecordMessage> RecordsWhere(kvhost::HostClient& host,
+                                            const std::function<bool(const RecordMessage&)>& accept);
+  // The next CAN statistics message.
+  std::optional<kvhost::CanStatisticsView> NextStatistics(kvhost::HostClient& host);
+
+  // Connects a host, gives it a CAN port and starts a session; checks the acknowledgement.
+  kvhost::HostClient StartedHost(size_t slot, const std::string& port,
+                                 const std::function<void(nKV_DLL300::SessionSettings&)>& configure = {});
+};
+
+}  // namespace kvtest

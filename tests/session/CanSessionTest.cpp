@@ -1,0 +1,255 @@
+// A host monitors the simulated CAN buses over TCP: records, payloads, time stamps, statistics.
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <cmath>
+#include <cstring>
+
+#include "driver/Properties.h"
+#include "driver/Status.h"
+#include "tarvix/TarvixControl.h"
+#include "tests/session/CanSessionFixture.h"
+
+namespace kvtest {
+namespace {
+
+using nKV_DLL300::SessionSettings;
+using Payload = std::vector<uint8_t>;
+
+constexpr uint32_t kBodyExtended = 0x18FEF100 | kExtendedFlag;
+constexpr uint64_t kUnitsPerMs = 10000;  // time stamps count 100 ns units
+constexpr uint64_t kUnixEpochIn1601Units = 116444736000000000ull;
+
+uint64_t NowIn1601Units() {
+  const auto since1970 = std::chrono::system_clock::now().time_since_epoch();
+  return kUnixEpochIn1601Units +
+         std::chrono::duration_cast<std::chrono::microseconds>(since1970).count() * 10;
+}
+
+// Bus load in 0.01 % units of the default body traffic at 500 kbit/s: the mean of the durations
+// with and without worst-case stuff bits of 100 standard 8-byte, 20 standard 3-byte and 10
+// extended 8-byte frames per second.
+uint32_t BodyBusLoad() {
+  auto meanMicroseconds = [](uint32_t bits) {
+    const double stuffed = bits + (bits - 12) / 5;
+    return (stuffed + bits) / 2 / 500000.0 * 1e6;
+  };
+  const double busTimePerSecond = 100 * meanMicroseconds(47 + 64) +
+                                  20 * meanMicroseconds(47 + 24) + 10 * meanMicroseconds(67 + 64);
+  return 10 * static_cast<uint32_t>(busTimePerSecond / 1000.0);
+}
+
+TEST_F(CanSessionTest, BodyBusShowsItsIdentifiersSortedWithPayloadsAndTimeStamps) {
+  kvhost::HostClient host = StartedHost(0, "CAN1");
+  auto message = RecordsWhere(host, [](const RecordMessage& m) { return m.records.size() == 4; });
+  ASSERT_TRUE(message.has_value());
+
+  const std::vector<uint32_t> sorted = {0x100, 0x1A0, 0x321, kBodyExtended};
+  for (size_t i = 0; i < sorted.size(); ++i) EXPECT_EQ(message->records[i].identifier, sorted[i]);
+  EXPECT_EQ(message->header.idCount, 4u);
+
+  const auto* counter = message->find(0x100);
+  ASSERT_NE(counter, nullptr);
+  ASSERT_EQ(counter->payload.size(), 8u);
+  EXPECT_EQ(Payload(counter->payload.begin() + 1, counter->payload.end()),
+            (Payload{1, 2, 3, 4, 5, 6, 7}));
+  const auto* short3 = message->find(0x1A0);
+  ASSERT_NE(short3, nullptr);
+  EXPECT_EQ(short3->payload, (Payload{0xAA, 0xBB, 0xCC}));
+  const auto* remote = message->find(0x321, kTypeRemote);
+  ASSERT_NE(remote, nullptr);
+  EXPECT_EQ(remote->payloadLength, 0u);
+  const auto* extended = message->find(kBodyExtended);
+  ASSERT_NE(extended, nullptr);
+  EXPECT_EQ(extended->payload, (Payload{0x00, 0x11, 0x22, 0x33, 0x44, 0x55, 0x66, 0x77}));
+
+  // Consecutive frames of 0x100 lie one 10 ms period apart (arbitration may shift one a little).
+  auto laterMessage = RecordsWhere(host, [](const RecordMessage& m) {
+    const auto* r = m.find(0x1A0);
+    return r != nullptr && r->count > 1;
+  });
+  ASSERT_TRUE(laterMessage.has_value());
+  const auto* later = laterMessage->find(0x100);
+  ASSERT_NE(later, nullptr);
+  EXPECT_NEAR(double(later->lastTimestamp - later->previousTimestamp), 10.0 * kUnitsPerMs,
+              1.0 * kUnitsPerMs);
+  EXPECT_NEAR(double(later->lastTimestamp), double(NowIn1601Units()), 60e3 * kUnitsPerMs);
+  EXPECT_EQ(later->echo, 0);
+}
+
+TEST_F(CanSessionTest, CountsGrowAtTheirPeriods) {
+  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) { s.txTimeData = 200; });
+  auto first = RecordsWhere(host, [](const RecordMessage& m) { return m.records.size() == 4; });
+  ASSERT_TRUE(first.has_value());
+  // Wait for enough of the slowest identifier (500 ms) to compare the rates.
+  auto later = RecordsWhere(host, [&](const RecordMessage& m) {
+    const auto* r = m.find(0x321, kTypeRemote);
+    return r != nullptr && r->count >= first->find(0x321, kTypeRemote)->count + 4;
+  });
+  ASSERT_TRUE(later.has_value());
+  auto grown = [&](uint32_t id, uint8_t type = kTypeData) {
+    return double(later->find(id, type)->count - first->find(id, type)->count);
+  };
+  const double remote = grown(0x321, kTypeRemote);  // every 500 ms
+  EXPECT_NEAR(grown(0x100) / remote, 50.0, 10.0);
+  EXPECT_NEAR(grown(0x1A0) / remote, 10.0, 2.5);
+  EXPECT_NEAR(grown(kBodyExtended) / remote, 5.0, 1.5);
+}
+
+TEST_F(CanSessionTest, BusErrorFramesAppearOnlyWhenTheHostAsksForThem) {
+  kvhost::HostClient quiet = StartedHost(0, "CAN1");
+  kvhost::HostClient logging = StartedHost(1, "CAN2", [](SessionSettings& s) {
+    s.logBusErrorFrames = 1;
+  });
+  auto withErrors = RecordsWhere(logging, [](const RecordMessage& m) {
+    return m.find(0, kTypeBusError) != nullptr;
+  });
+  ASSERT_TRUE(withErrors.has_value());
+  EXPECT_EQ(withErrors->find(0, kTypeBusError)->payloadLength, 0u);
+  // Once the bus has run for two seconds the quiet host has seen more than one error frame go by.
+  auto quietLater = RecordsWhere(quiet, [](const RecordMessage& m) {
+    const auto* r = m.find(0x321, kTypeRemote);
+    return r != nullptr && r->count >= 5;
+  });
+  ASSERT_TRUE(quietLater.has_value());
+  EXPECT_EQ(quietLater->find(0, kTypeBusError), nullptr);
+  EXPECT_EQ(quietLater->records.size(), 4u);
+}
+
+TEST_F(CanSessionTest, StatisticsShowFrameRatesAndTheBusLoadOfTheDefaultTraffic) {
+  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) {
+    s.baudRate = 500000;  // the frame durations are computed at the host's baud rate
+    s.logBusErrorFrames = 1;
+  });
+  ASSERT_TRUE(NextStatistics(host).has_value());  // the first period began with the session
+  auto statistics = NextStatistics(host);
+  ASSERT_TRUE(statistics.has_value());
+  EXPECT_NEAR(statistics->standardFramesPerSecond, 120.0, 12.0);
+  EXPECT_NEAR(statistics->extendedFramesPerSecond, 10.0, 2.0);
+  EXPECT_NEAR(statistics->remoteFramesPerSecond, 2.0, 1.0);
+  EXPECT_NEAR(statistics->errorFramesPerSecond, 1.0, 1.0);
+  EXPECT_NEAR(statistics->busLoad, BodyBusLoad(), 30.0);
+  EXPECT_GE(statistics->peakBusLoad, statistics->busLoad);
+  EXPECT_GT(statistics->standardFrames, statistics->standardFramesPerSecond);
+  EXPECT_EQ(statistics->faultCode, 0u);
+}
+
+TEST_F(CanSessionTest, FdSessionOnCan5SeesFdFramesAtTheDataRate) {
+  tarvix::StartRecording();
+  kvhost::HostClient host = StartedHost(0, "CAN5", [](SessionSettings& s) {
+    s.runMode.Set("NORMAL");
+    s.canIoMode = 2;
+    s.baudRate = 500000;
+    s.canFdBaudRate = 2000000;
+  });
+  auto message = RecordsWhere(host, [](const RecordMessage& m) { return m.records.size() == 4; });
+  ASSERT_TRUE(message.has_value());
+  const auto* brs = message->find(0x200, 0x18);
+  ASSERT_NE(brs, nullptr);
+  Payload ramp(64);
+  for (uint8_t i = 0; i < 64; ++i) ramp[i] = i;
+  EXPECT_EQ(brs->payload, ramp);
+  const auto* plain = message->find(0x201, 0x10);
+  ASSERT_NE(plain, nullptr);
+  EXPECT_EQ(plain->payloadLength, 12u);
+  const auto* extended = message->find(0x1ABCDE00 | kExtendedFlag, 0x18);
+  ASSERT_NE(extended, nullptr);
+  EXPECT_EQ(extended->payloadLength, 16u);
+  EXPECT_NE(message->find(0x080), nullptr);
+
+  bool dataRateSet = false;
+  for (const tarvix::CallRecord& call : tarvix::RecordedCalls()) {
+    if (call.operation == "kxCreateSession" && call.status == 0 && call.interfaceName == "CAN5") {
+      EXPECT_EQ(call.texts.at(0), ":can_fd_brs:");
+    }
+    if (call.operation == "kxSetProperty" && call.id == driver::kPropCanFdBaudRate) {
+      uint64_t rate = 0;
+      std::memcpy(&rate, call.value.data(), sizeof rate);
+      dataRateSet = rate == 2000000;
+    }
+  }
+  EXPECT_TRUE(dataRateSet);
+  auto statistics = NextStatistics(host);
+  ASSERT_TRUE(statistics.has_value());
+  EXPECT_GT(statistics->busLoad, 0u);
+}
+
+TEST_F(CanSessionTest, DatabaseModeTakesBaudRateAndIoModeFromTheDatabase) {
+  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) {
+    s.runMode.Set("NORMAL");
+    s.alias.Set("SimDB");
+    s.cluster.Set("Body");
+    s.baudRate = 125000;
+    s.canIoMode = 1;
+  });
+  const SessionSettings& settings = ConnectionAt(0).settings;
+  EXPECT_EQ(settings.baudRate.load(), 500000u);
+  EXPECT_EQ(settings.canIoMode.load(), 0u);
+  EXPECT_TRUE(RecordsWhere(host, [](const RecordMessage& m) { return m.records.size() == 4; }));
+}
+
+TEST_F(CanSessionTest, J1939SessionClaimsItsAddressAndSeesExtendedFramesAsJ1939) {
+  tarvix::StartRecording();
+  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) {
+    s.applicationProtocol = 1;
+    s.nodeAddress = 0x80;
+    s.nodeName = 0x1122334455667788ull;
+  });
+  EXPECT_EQ(ConnectionAt(0).session->lastStatus.load(), 0);
+  auto message = RecordsWhere(host, [](const RecordMessage& m) {
+    return m.find(kBodyExtended, 0xC0) != nullptr && m.find(0x100) != nullptr;
+  });
+  ASSERT_TRUE(message.has_value());
+  EXPECT_EQ(message->find(kBodyExtended, 0xC0)->payloadLength, 8u);
+
+  bool addressSet = false;
+  for (const tarvix::CallRecord& call : tarvix::RecordedCalls()) {
+    if (call.operation == "kxSetProperty" && call.id == driver::kPropJ1939NodeAddress) {
+      addressSet = call.value == Payload{0x80, 0, 0, 0};
+    }
+  }
+  EXPECT_TRUE(addressSet);
+}
+
+TEST_F(CanSessionTest, AddressHeldByAnotherNodeFailsTheStart) {
+  auto j1939 = [](SessionSettings& s) {
+    s.applicationProtocol = 1;
+    s.nodeAddress = 0x42;
+  };
+  kvhost::HostClient first = StartedHost(0, "CAN1", j1939);
+  kvhost::HostClient second = ConnectHost();
+  UsePort(ConnectionAt(1), "CAN2");
+  j1939(ConnectionAt(1).settings);
+  auto reply = Command(second, "CMD_SESSION_START");
+  ASSERT_TRUE(reply.has_value());
+  EXPECT_EQ(reply->text(), "<ERROR: -1074384374>\n");  // 0xBFF6320A, not claimed
+  EXPECT_EQ(reply->header.type, kvhost::kErrorText);
+  EXPECT_TRUE(second.WaitForClose(kReplyDeadline));
+}
+
+TEST_F(CanSessionTest, WrongBaudRateSeesOnlyBusErrorFrames) {
+  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) {
+    s.runMode.Set("NORMAL");
+    s.baudRate = 250000;
+    s.logBusErrorFrames = 1;
+  });
+  auto message = RecordsWhere(host, [](const RecordMessage& m) {
+    const auto* r = m.find(0, kTypeBusError);
+    return r != nullptr && r->count > 20;
+  });
+  ASSERT_TRUE(message.has_value());
+  EXPECT_EQ(message->records.size(), 1u);
+}
+
+TEST_F(CanSessionTest, TableCapacityBoundsTheIdentifiersShown) {
+  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) { s.dataLogIdsMax = 2; });
+  auto message = RecordsWhere(host, [](const RecordMessage& m) {
+    return !m.records.empty() && m.records[0].count > 50;
+  });
+  ASSERT_TRUE(message.has_value());
+  EXPECT_EQ(message->records.size(), 2u);
+  EXPECT_EQ(message->header.idCount, 2u);
+}
+
+}  // namespace
+}  // namespace kvtest
