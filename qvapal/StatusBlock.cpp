@@ -20,7 +20,7 @@ bool takesCode(int32_t held, int32_t code) {
 void recordFile(char (&target)[StatusBlock::kFileSize], std::string_view path) {
   std::memset(target, 0, sizeof target);
   if (path.size() <= kMaxFileLength) {
-    std::memcpy(target, path.data(), path.size());
+    if (!path.empty()) std::memcpy(target, path.data(), path.size());
     return;
   }
   std::memcpy(target, path.data(), kKeptEachSide);
