@@ -83,9 +83,10 @@ kxStatus kxCreateSession(const char* databaseName, const char* clusterName, cons
 }
 
 kxStatus kxSetProperty(kxRef ref, uint32_t propertyId, uint32_t size, const void* value) {
-  CallRecord c = Call("kxSetProperty", ref, propertyId, size);
-  tarvix::Keep(c, value, size);
-  return Run(std::move(c), ref, [&] { return Simulator::Instance().setProperty(ref, propertyId, size, value); });
+  return Run(
+      Call("kxSetProperty", ref, propertyId, size), ref,
+      [&] { return Simulator::Instance().setProperty(ref, propertyId, size, value); },
+      [&](CallRecord& r) { tarvix::Keep(r, value, size); });
 }
 
 kxStatus kxGetProperty(kxRef ref, uint32_t propertyId, uint32_t size, void* value) {
@@ -134,12 +135,14 @@ kxStatus kxReadFrame(kxRef session, void* buffer, uint32_t bufferSize, double ti
 kxStatus kxWriteFrame(kxRef session, const void* frame, uint32_t size, double timeoutSeconds) {
   CallRecord c = Call("kxWriteFrame", session, 0, size);
   c.timeout = timeoutSeconds;
-  tarvix::Keep(c, frame, size);
-  return Run(std::move(c), session, [&] {
-    kxStatus st = 0;
-    auto s = tarvix::SessionOf(session, st);
-    return s ? s->write(frame, size, timeoutSeconds) : st;
-  });
+  return Run(
+      std::move(c), session,
+      [&] {
+        kxStatus st = 0;
+        auto s = tarvix::SessionOf(session, st);
+        return s ? s->write(frame, size, timeoutSeconds) : st;
+      },
+      [&](CallRecord& r) { tarvix::Keep(r, frame, size); });
 }
 
 kxStatus kxWait(kxRef session, uint32_t condition, uint32_t parameter, double timeoutSeconds,
@@ -206,9 +209,10 @@ kxStatus kxdbCreateObject(kxRef parent, uint32_t objectClass, const char* name, 
 }
 
 kxStatus kxdbSetProperty(kxRef object, uint32_t propertyId, uint32_t size, const void* value) {
-  CallRecord c = Call("kxdbSetProperty", object, propertyId, size);
-  tarvix::Keep(c, value, size);
-  return Run(std::move(c), 0, [&] { return Simulator::Instance().dbSetProperty(object, propertyId, size, value); });
+  return Run(
+      Call("kxdbSetProperty", object, propertyId, size), 0,
+      [&] { return Simulator::Instance().dbSetProperty(object, propertyId, size, value); },
+      [&](CallRecord& r) { tarvix::Keep(r, value, size); });
 }
 
 kxStatus kxdbCloseDatabase(kxRef database, uint32_t closeAll) {

@@ -77,8 +77,9 @@ TEST_F(DatabaseKindsTest, InMemoryDatabaseHoldsClustersAndFrames) {
   EXPECT_EQ(kxdbCreateObject(cluster, driver::kClassFrame, "TxFrame", &frame), 0);
   const uint32_t id = 0x123;
   EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameIdentifier, 4, &id), 0);
-  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameIdentifier, 8, &id), driver::kWrongPropertySize);
-  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropClusterBaudRate, 8, &id), driver::kUnknownProperty);
+  const uint64_t wide = 0x123;
+  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameIdentifier, 8, &wide), driver::kWrongPropertySize);
+  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropClusterBaudRate, 8, &wide), driver::kUnknownProperty);
   const double negative = -1.0;
   EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameCyclicRate, 8, &negative), driver::kInvalidPropertyValue);
   const uint32_t fd = driver::kCanIoModeFdBrs;
