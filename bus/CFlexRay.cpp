@@ -1,0 +1,125 @@
+// The FlexRay session: subordinate and database opening, frame counting and the FlexRay report.
+#include "bus/CFlexRay.h"
+
+#include <memory>
+#include <string>
+
+#include "bus/CPollFlexRayDataThread.h"
+#include "bus/FlexRayStatistics.h"
+#include "driver/Properties.h"
+#include "driver/Sessions.h"
+#include "driver/States.h"
+#include "driver/tarvix.h"
+#include "service/HostConnection.h"
+
+namespace nKV_DLL300 {
+
+namespace {
+
+template <class T>
+int32_t SetProperty(uint32_t reference, uint32_t id, T value) {
+  return kxSetProperty(reference, id, sizeof value, &value);
+}
+
+}  // namespace
+
+CFlexRay::CFlexRay(HostConnection* owner)
+    : CTableSession(owner, kBusTypeFlexRay, ReadPacing::kNearlyFullRule) {}
+
+CFlexRay::~CFlexRay() { endForDestruction(); }
+
+void CFlexRay::startPollThread() {
+  startPollThreadWith(std::make_unique<CPollFlexRayDataThread>(this));
+}
+
+int32_t CFlexRay::fail(int32_t status) {
+  recordStatus(status);
+  return status;
+}
+
+int32_t CFlexRay::openFlexRaySession(const std::string& interfaceName, uint32_t termination) {
+  const SessionSettings& settings = connection->settings;
+  int32_t status;
+  if (settings.runMode.Contains("SUBORDINATE")) {
+    status = kxCreateSession(driver::kDatabaseSubordinate, "", "", interfaceName.c_str(),
+                             driver::kModeReceiveStream, &driverSession);
+  } else {
+    status = openDatabase(interfaceName, termination);
+  }
+  if (status < 0) return fail(status);
+  status = SetProperty(driverSession, driver::kPropEcho, settings.logTransmittedFrames.load());
+  return status < 0 ? fail(status) : status;
+}
+
+int32_t CFlexRay::openDatabase(const std::string& interfaceName, uint32_t termination) {
+  SessionSettings& settings = connection->settings;
+  const std::string alias = settings.alias.Get();
+  const std::string cluster = settings.cluster.Get();
+  int32_t status = kxCreateSession(alias.c_str(), cluster.c_str(), "", interfaceName.c_str(),
+                                   driver::kModeReceiveStream, &driverSession);
+  if (status < 0) return status;
+  uint64_t baudRate = 0;
+  status = kxGetProperty(driverSession, driver::kPropBaudRate, sizeof baudRate, &baudRate);
+  if (status < 0) return status;
+  settings.baudRate.store(baudRate);
+  status = kxStop(driverSession, driver::kScopeInterfaceOnly);
+  if (status < 0) return status;
+  status = SetProperty(driverSession, driver::kPropFlexRayTermination, termination);
+  if (status < 0) return status;
+  status = SetProperty(driverSession, driver::kPropFlexRayNullFrames, settings.showNullFrames.load());
+  if (status < 0) return status;
+  const uint32_t keySlot = settings.keySlot.load();
+  if (keySlot != kNoKeySlot) {
+    status = SetProperty(driverSession, driver::kPropKeySlot, keySlot);
+    if (status < 0) return status;
+  }
+  status = kxStart(driverSession, driver::kScopeNormal);
+  if (status < 0) return status;
+  return kxWait(driverSession, driver::kWaitInterfaceCommunicating, 0,
+                kFlexRayCommunicatingWaitSeconds, nullptr);
+}
+
+const char* CFlexRay::logHeaderLine() const {
+  return "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle Number\tChannel\tStartup\tSync\tPreamble";
+}
+
+uint32_t CFlexRay::batchFrameCount(uint32_t bytes) const {
+  RawFrameWalker walker(readBuffer, bytes);
+  RawFrameView frame;
+  uint32_t frames = 0;
+  while (walker.next(frame)) ++frames;
+  return frames;
+}
+
+void CFlexRay::countFrame(const RawFrameView& frame, bool inWindow) {
+  nKV_DLL300::countFrame(statistics, frame.header.type, inWindow);
+}
+
+void CFlexRay::readStates() {
+  uint32_t faultCode = 0;
+  uint32_t state = 0;
+  int32_t status = kxReadState(driverSession, driver::kStateFlexRay, sizeof state, &state, &faultCode);
+  if (status != 0) return recordStatus(status);
+  decodeState(statistics, state, faultCode);
+  uint32_t words[6] = {};
+  status = kxReadState(driverSession, driver::kStateFlexRayCounters, sizeof words, words, &faultCode);
+  if (status != 0) return recordStatus(status);
+  storeStatisticsWords(statistics, words, faultCode);
+  uint32_t channels = 0;
+  status = kxReadState(driverSession, driver::kStateFlexRayChannels, sizeof channels, &channels,
+                       &faultCode);
+  if (status != 0) return recordStatus(status);
+  storeLastStateWord(statistics, channels, faultCode);
+}
+
+void CFlexRay::reportBusState(uint64_t elapsedMilliseconds) {
+  beginReport();
+  prepareToSend(statistics, elapsedMilliseconds);
+  readStates();  // a failed read leaves its fields and those of the reads after it unchanged
+  sendStatistics();
+  if (closeWindowIfDue()) endWindow(statistics);
+}
+
+static_assert(driver::kStateFlexRayCountersSize == sizeof(uint32_t[6]));
+
+}  // namespace nKV_DLL300
