@@ -6,6 +6,7 @@
 #include <memory>
 #include <memory_resource>
 
+#include "logging/LogFile.h"
 #include "qvapal/iThread.h"
 #include "qvapal/tThreadController.h"
 #include "timing/Stopwatch.h"
@@ -102,13 +103,17 @@ class CBusSystem {
   // in its own destructor, so the thread never runs on a half-destroyed object.
   void endForDestruction();
 
-  // Closes the log file of the session, if one is open (the log writers plug in here).
-  void closeLogFile() {}
+  // Closes the log file of the session, if one is open.
+  void closeLogFile() { CloseLogFile(sessionLog); }
 
   // Poll thread only, from the start of each poll loop.
   Stopwatch dataWatch;    // period of the identifier-record messages
   Stopwatch stateWatch;   // period of the bus-statistics messages
   Stopwatch windowWatch;  // counting window of the per-second rates
+
+  // The session's log file (logFile, voraFile, voraChannel): the poll thread's while a loop runs,
+  // the stopping thread's in stop() after the join.
+  SessionLog sessionLog{*this};
 
  private:
   std::unique_ptr<nQVAPAL000::tThreadController> pollThreadController;  // service thread

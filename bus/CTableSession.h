@@ -9,6 +9,7 @@
 #include "bus/IdentifierTable.h"
 #include "bus/RawFrame.h"
 #include "driver/tarvix.h"
+#include "logging/LogWriters.h"
 #include "service/HostConnection.h"
 #include "service/MessageHeader.h"
 #include "service/SendReply.h"
@@ -61,8 +62,14 @@ class CTableSession : public CBusSystem {
   virtual void prepareLoop() {}
   // Frames in a batch of `bytes` bytes, as the log writer is told.
   virtual uint32_t batchFrameCount(uint32_t bytes) const = 0;
-  // Hands a batch to the bus's log writer while logFileEnabled is set (the writers plug in here).
-  virtual void logBatch(const uint8_t* /*batch*/, uint32_t /*bytes*/, uint32_t /*frames*/) {}
+  // Hands a batch to the bus's log writer while logFileEnabled is set.
+  virtual void logBatch(const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+    switch (busType) {
+      case kBusTypeLin: WriteLinLog(sessionLog, batch, bytes, frames); break;
+      case kBusTypeFlexRay: WriteFlexRayLog(sessionLog, batch, bytes, frames); break;
+      default: WriteCanLog(sessionLog, batch, bytes, frames); break;
+    }
+  }
   // A frame taken into the table while txTimeStatistic > 0.
   virtual void countFrame(const RawFrameView& frame, bool inWindow) = 0;
 
@@ -101,6 +108,7 @@ class CTableSession : public CBusSystem {
     stateWatch.Restart();
     windowWatch.Restart();
     burst_ = 0;
+    if (connection->settings.logFileEnabled.load() != 0) OpenLogFile(sessionLog, logHeaderLine());
     prepareLoop();
     return true;
   }

@@ -38,7 +38,7 @@ class BenchSession : public CBusSystem {
   void startPollThread() override {}
   int32_t pollLoop() override { return 0; }
   void reportBusState(uint64_t) override {}
-  SessionLog log{*this};
+  SessionLog& log() { return sessionLog; }
 };
 
 void Append(std::vector<uint8_t>& batch, RawFrameHeader h, const uint8_t* payload) {
@@ -101,10 +101,10 @@ void RunWriter(benchmark::State& state, Bus bus, uint8_t logType) {
   const std::vector<uint8_t> batch = MakeBatch(bus);
   const uint32_t bytes = static_cast<uint32_t>(batch.size());
   const auto writer = bus == Bus::kLin ? &WriteLinLog : bus == Bus::kFlexRay ? &WriteFlexRayLog : &WriteCanLog;
-  OpenLogFile(session.log, kCanTextLogHeader);
-  if (!session.log.isOpen()) state.SkipWithError("the log could not be opened");
-  for (auto _ : state) writer(session.log, batch.data(), bytes, kFramesPerBatch);
-  CloseLogFile(session.log);
+  OpenLogFile(session.log(), kCanTextLogHeader);
+  if (!session.log().isOpen()) state.SkipWithError("the log could not be opened");
+  for (auto _ : state) writer(session.log(), batch.data(), bytes, kFramesPerBatch);
+  CloseLogFile(session.log());
   if (session.lastStatus.load() != 0) state.SkipWithError("a write failed");
   state.SetItemsProcessed(state.iterations() * kFramesPerBatch);
 }

@@ -33,7 +33,7 @@ class LoggingSession : public nKV_DLL300::CBusSystem {
   int32_t pollLoop() override { return 0; }
   void reportBusState(uint64_t) override {}
 
-  nKV_DLL300::SessionLog log{*this};
+  nKV_DLL300::SessionLog& log() { return sessionLog; }
 };
 
 inline constexpr char kServiceDirectoryBelowDrive[] = "QV-RT\\tarvix\\kelvane";
@@ -73,7 +73,7 @@ class LogSessionTest : public ::testing::Test {
   }
 
   nKV_DLL300::SessionSettings& settings() { return connection_->settings; }
-  nKV_DLL300::SessionLog& log() { return session_->log; }
+  nKV_DLL300::SessionLog& log() { return session_->log(); }
   LoggingSession& session() { return *session_; }
 
   // Every message sent since the last call: a marker is sent and messages are read up to it.
