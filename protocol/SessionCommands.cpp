@@ -5,6 +5,8 @@
 #include <memory>
 
 #include "bus/CCAN.h"
+#include "bus/CFlexRay.h"
+#include "bus/CLIN.h"
 #include "service/HostConnection.h"
 #include "service/HostLink.h"
 #include "service/MessageHeader.h"
@@ -67,6 +69,22 @@ int32_t StartCan(HostConnection& connection) {
   return Launch(connection, std::move(session), result);
 }
 
+int32_t StartLin(HostConnection& connection) {
+  const SessionSettings& settings = connection.settings;
+  auto session = std::make_unique<CLIN>(&connection);
+  const int32_t result =
+      session->openLinSession(settings.interfaceName.Get(), settings.baudRate.load());
+  return Launch(connection, std::move(session), result);
+}
+
+int32_t StartFlexRay(HostConnection& connection) {
+  const SessionSettings& settings = connection.settings;
+  auto session = std::make_unique<CFlexRay>(&connection);
+  const int32_t result =
+      session->openFlexRaySession(settings.interfaceName.Get(), settings.termination.load());
+  return Launch(connection, std::move(session), result);
+}
+
 // The "already started" text of the live session's own bus.
 const char* AlreadyStartedText(const CBusSystem& session) {
   switch (session.busType) {
@@ -99,7 +117,8 @@ int32_t StartSession(HostConnection& connection) {
     return 0;
   }
   if (busType == kBusTypeCan) return StartCan(connection);
-  return 0;  // LIN and FlexRay sessions come with their bus classes
+  if (busType == kBusTypeLin) return StartLin(connection);
+  return StartFlexRay(connection);
 }
 
 int32_t StopSession(HostConnection& connection) {

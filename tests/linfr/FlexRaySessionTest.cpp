@@ -1,0 +1,314 @@
+// A host monitors the simulated FlexRay bus over TCP: modes, slots per channel, null frames, start
+// failures and statistics; with the commands' texts of LIN and FlexRay sessions.
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+
+#include "driver/Properties.h"
+#include "driver/Sessions.h"
+#include "driver/Status.h"
+#include "service/HostConnection.h"
+#include "tests/linfr/LinFlexRayFixture.h"
+
+namespace kvtest {
+namespace {
+
+using Payload = std::vector<uint8_t>;
+using Record = kvhost::IdentifierRecord;
+
+constexpr uint8_t kFlexRayData = 0x20;
+constexpr uint8_t kFlexRayNull = 0x21;
+constexpr uint8_t kChannelA = 0;
+constexpr uint8_t kChannelB = 1;
+constexpr uint64_t kFlexRayBitRate = 10000000;
+
+const std::string kPort = "SET_PROP_SESSION_PORTNAME=FlexRay1";
+const std::vector<std::string> kDatabase = {kPort, "SET_PROP_SESSION_RUNMODE=NORMAL",
+                                            "SET_PROP_SESSION_ALIAS=SimDB",
+                                            "SET_PROP_SESSION_CLUSTER=FlexRay"};
+
+std::vector<std::string> With(std::vector<std::string> properties, const std::string& more) {
+  properties.push_back(more);
+  return properties;
+}
+
+Payload Ramp(uint8_t first, size_t length) {
+  Payload bytes(length);
+  for (size_t i = 0; i < length; ++i) bytes[i] = static_cast<uint8_t>(first + i);
+  return bytes;
+}
+
+bool HasSlots(const BusRecords& m) {
+  return m.all(1).size() == 2 && m.find(2) && m.find(3) && m.find(40);
+}
+
+// The driver calls of the start from the creation on, in order, without the reads and state reads
+// of the poll thread.
+std::vector<std::pair<std::string, uint32_t>> StartCalls() {
+  std::vector<std::pair<std::string, uint32_t>> calls;
+  for (const tarvix::CallRecord& call : CallsOn("FlexRay1")) {
+    // The hardware table read at accept comes before the start.
+    if (calls.empty() && call.operation != "kxCreateSession") continue;
+    if (call.operation == "kxReadFrame" || call.operation == "kxReadState") continue;
+    if (call.operation == "kxClear") break;
+    calls.emplace_back(call.operation, call.id);
+  }
+  return calls;
+}
+
+TEST_F(LinFlexRayTest, DatabaseModeShowsEverySlotOnEachOfItsChannels) {
+  tarvix::StartRecording();
+  kvhost::HostClient host = StartedHost(kDatabase);
+  const std::vector<std::pair<std::string, uint32_t>> expected = {
+      {"kxCreateSession", driver::kModeReceiveStream},
+      {"kxGetProperty", driver::kPropBaudRate},
+      {"kxStop", driver::kScopeInterfaceOnly},
+      {"kxSetProperty", driver::kPropFlexRayTermination},
+      {"kxSetProperty", driver::kPropFlexRayNullFrames},
+      {"kxStart", driver::kScopeNormal},
+      {"kxWait", driver::kWaitInterfaceCommunicating},
+      {"kxSetProperty", driver::kPropEcho}};
+  EXPECT_EQ(StartCalls(), expected);
+  EXPECT_EQ(service().connections.at(0).connection->settings.baudRate.load(), kFlexRayBitRate);
+
+  auto message = RecordsWhere(host, kvhost::kFlexRayRecords, HasSlots);
+  ASSERT_TRUE(message.has_value());
+  ASSERT_EQ(message->records.size(), 5u);
+  EXPECT_EQ(message->header.idCount, 5u);
+  const uint32_t sorted[] = {1, 1, 2, 3, 40};
+  for (size_t i = 0; i < 5; ++i) EXPECT_EQ(message->records[i].identifier, sorted[i]);
+
+  const auto slot1 = message->all(1);
+  EXPECT_NE(slot1[0]->channel, slot1[1]->channel);
+  for (const Record* r : slot1) {
+    EXPECT_EQ(r->startup, 1);
+    EXPECT_EQ(r->sync, 1);
+    EXPECT_EQ(r->preamble, 0);
+    EXPECT_EQ(r->payload, Ramp(0x10, 16));
+  }
+  const Record& slot2 = *message->find(2);
+  EXPECT_EQ(slot2.channel, kChannelA);
+  EXPECT_EQ(slot2.startup + slot2.sync, 0);
+  ASSERT_EQ(slot2.payloadLength, 16u);
+  EXPECT_EQ(Payload(slot2.payload.begin() + 1, slot2.payload.end()), Payload(15, 0));
+  const Record& slot40 = *message->find(40);
+  EXPECT_EQ(slot40.channel, kChannelB);
+  EXPECT_EQ(slot40.payload, Ramp(0x40, 32));
+  // Without null frames slot 3 is seen only in the even cycles that carry its data.
+  const Record& slot3 = *message->find(3);
+  EXPECT_EQ(slot3.type, kFlexRayData);
+  EXPECT_EQ(slot3.cycle % 2, 0);
+  EXPECT_EQ(slot3.payload, Ramp(0x30, 8));
+  for (const Record& r : message->records) {
+    EXPECT_LT(r.cycle, 64);
+    EXPECT_EQ(r.echo, 0);
+    EXPECT_GE(r.lastTimestamp, r.previousTimestamp);
+  }
+}
+
+// Slot 3 carries data in even cycles and null frames in odd ones. Shown, they share its entry: the
+// count follows every cycle and the type stays that of the entry's first frame while the cycle
+// number follows the last frame.
+TEST_F(LinFlexRayTest, NullFramesJoinTheirSlotOnlyWhenShown) {
+  kvhost::HostClient shown = StartedHost(With(kDatabase, "SET_PROP_SESSION_SHOW_NULL_FRAMES=1"));
+  kvhost::HostClient hidden = StartedHost({"SET_PROP_SESSION_PORTNAME=FlexRay2",
+                                           "SET_PROP_SESSION_RUNMODE=NORMAL",
+                                           "SET_PROP_SESSION_ALIAS=SimDB",
+                                           "SET_PROP_SESSION_CLUSTER=FlexRay"});
+
+  auto mixed = RecordsWhere(shown, kvhost::kFlexRayRecords, [](const BusRecords& m) {
+    const Record* slot3 = m.find(3);
+    const Record* slot2 = m.find(2);
+    if (slot3 == nullptr || slot2 == nullptr || slot2->count < 20) return false;
+    EXPECT_LE(std::abs(int64_t{slot3->count} - int64_t{slot2->count}), 2) << "one frame per cycle";
+    const bool lastWasNull = slot3->cycle % 2 == 1;
+    return lastWasNull != (slot3->type == kFlexRayNull);
+  });
+  EXPECT_TRUE(mixed.has_value()) << "slot 3 always showed the type of its last frame";
+
+  auto dataOnly = RecordsWhere(hidden, kvhost::kFlexRayRecords, [](const BusRecords& m) {
+    const Record* slot3 = m.find(3);
+    const Record* slot2 = m.find(2);
+    return slot3 != nullptr && slot2 != nullptr && slot2->count >= 20;
+  });
+  ASSERT_TRUE(dataOnly.has_value());
+  const Record& slot3 = *dataOnly->find(3);
+  EXPECT_EQ(slot3.type, kFlexRayData);
+  EXPECT_EQ(slot3.cycle % 2, 0);
+  EXPECT_NEAR(2.0 * slot3.count, dataOnly->find(2)->count, 3.0) << "every other cycle";
+
+  auto shownCounts = FlexRayStatisticsWhere(
+      shown, [](const kvhost::FlexRayStatisticsView& s) { return s.nullFrames > 0; });
+  EXPECT_TRUE(shownCounts.has_value());
+  auto hiddenCounts = FlexRayStatisticsWhere(
+      hidden, [](const kvhost::FlexRayStatisticsView& s) { return s.dataFrames > 0; });
+  ASSERT_TRUE(hiddenCounts.has_value());
+  EXPECT_EQ(hiddenCounts->nullFrames, 0u);
+}
+
+struct KeySlotCase {
+  const char* name;
+  std::vector<std::string> properties;
+  std::vector<uint32_t> setValues;  // the key slot values set on the driver
+};
+void PrintTo(const KeySlotCase& c, std::ostream* os) { *os << c.name; }
+
+class KeySlotTest : public LinFlexRayTest, public ::testing::WithParamInterface<KeySlotCase> {};
+
+TEST_P(KeySlotTest, KeySlotIsSetBeforeTheStartOnlyWhenGiven) {
+  tarvix::StartRecording();
+  kvhost::HostClient host = StartedHost(GetParam().properties);
+  std::vector<uint32_t> values;
+  for (const tarvix::CallRecord& call : SetPropertyCalls("FlexRay1", driver::kPropKeySlot)) {
+    uint32_t value = 0;
+    ASSERT_EQ(call.value.size(), sizeof value);
+    std::memcpy(&value, call.value.data(), sizeof value);
+    values.push_back(value);
+  }
+  EXPECT_EQ(values, GetParam().setValues);
+  if (!values.empty()) {
+    const auto calls = StartCalls();
+    const auto at = [&](const std::pair<std::string, uint32_t>& call) {
+      return std::find(calls.begin(), calls.end(), call) - calls.begin();
+    };
+    EXPECT_LT(at({"kxSetProperty", driver::kPropKeySlot}), at({"kxStart", driver::kScopeNormal}));
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Values, KeySlotTest,
+    ::testing::Values(KeySlotCase{"Default", kDatabase, {}},
+                      KeySlotCase{"Zero", With(kDatabase, "SET_PROP_SESSION_KEY_SLOT=0"), {0}},
+                      KeySlotCase{"Hex", With(kDatabase, "SET_PROP_SESSION_KEY_SLOT=0x10"), {16}}),
+    [](const auto& info) { return std::string(info.param.name); });
+
+TEST_F(LinFlexRayTest, SubordinateFlexRaySessionSetsOnlyTheEchoProperty) {
+  tarvix::StartRecording();
+  kvhost::HostClient host = StartedHost({kPort});
+  const std::vector<std::pair<std::string, uint32_t>> expected = {
+      {"kxCreateSession", driver::kModeReceiveStream}, {"kxSetProperty", driver::kPropEcho}};
+  EXPECT_EQ(StartCalls(), expected);
+  for (const tarvix::CallRecord& call : CallsOn("FlexRay1")) {
+    if (call.operation == "kxCreateSession") {
+      EXPECT_EQ(call.texts.at(0), driver::kDatabaseSubordinate);
+    }
+  }
+  EXPECT_TRUE(RecordsWhere(host, kvhost::kFlexRayRecords, HasSlots));
+}
+
+TEST_F(LinFlexRayTest, NormalFlexRayStartWithoutAliasAndClusterIsRefused) {
+  tarvix::StartRecording();
+  std::optional<kvhost::HostMessage> reply;
+  kvhost::HostClient host = HostWith({kPort, "SET_PROP_SESSION_RUNMODE=NORMAL"}, &reply);
+  ASSERT_TRUE(reply.has_value());
+  EXPECT_EQ(reply->header.type, kvhost::kErrorText);
+  EXPECT_EQ(reply->text(), "<ERROR: CMD_SESSION_START: no Alias and Cluster defined>\n");
+  EXPECT_TRUE(StartCalls().empty()) << "no driver session is opened";
+  // The connection stays open and has no session.
+  auto lastError = Command(host, "CMD_SESSION_READ_LAST_ERROR");
+  ASSERT_TRUE(lastError.has_value());
+  EXPECT_EQ(lastError->text(), "<TCP Error: 0> \n");
+}
+
+TEST_F(LinFlexRayTest, FlexRayStartFailsWhenTheBusNeverCommunicates) {
+  tarvix::StartRecording();
+  tarvix::InjectStatus("kxWait", "FlexRay1", driver::kWaitTimeout, false);
+  std::optional<kvhost::HostMessage> reply;
+  kvhost::HostClient host = HostWith(kDatabase, &reply);
+  ASSERT_TRUE(reply.has_value());
+  EXPECT_EQ(reply->header.type, kvhost::kErrorText);
+  EXPECT_EQ(reply->text(), "<ERROR: " + std::to_string(driver::kWaitTimeout) + ">\n");
+  EXPECT_EQ(reply->header.lastStatus, driver::kWaitTimeout);
+  EXPECT_TRUE(host.WaitForClose(kReplyDeadline)) << "a failed start ends the connection";
+
+  bool waited = false;
+  bool cleared = false;
+  for (const tarvix::CallRecord& call : CallsOn("FlexRay1")) {
+    if (call.operation == "kxWait") {
+      waited = true;
+      EXPECT_EQ(call.id, driver::kWaitInterfaceCommunicating);
+      EXPECT_DOUBLE_EQ(call.timeout, 3.0);
+    }
+    if (call.operation == "kxSetProperty") {
+      EXPECT_FALSE(waited) << "nothing is set after the wait";
+    }
+    cleared |= call.operation == "kxClear" && call.status == 0;
+  }
+  EXPECT_TRUE(waited);
+  EXPECT_TRUE(cleared) << "the driver session of a failed start is closed";
+}
+
+TEST_F(LinFlexRayTest, FlexRayStatisticsCarryRatesAndTheThreeStates) {
+  kvhost::HostClient host = StartedHost(With(kDatabase, "SET_PROP_SESSION_SHOW_NULL_FRAMES=1"));
+  // Per 5 ms cycle: slot 1 on A and B, slots 2 and 40, and slot 3 with data in every other cycle
+  // and a null frame in the others: 900 data and 100 null frames a second.
+  auto statistics = FlexRayStatisticsWhere(host, [](const kvhost::FlexRayStatisticsView& s) {
+    return s.dataFramesPerSecond >= 855 && s.dataFramesPerSecond <= 945 &&
+           s.nullFramesPerSecond >= 95 && s.nullFramesPerSecond <= 105;
+  });
+  ASSERT_TRUE(statistics.has_value());
+  EXPECT_GE(statistics->dataFrames, statistics->dataFramesPerSecond / 2);
+  EXPECT_EQ(statistics->faultCode, 0u);
+  EXPECT_EQ(statistics->reserved, 0u);
+  EXPECT_EQ(statistics->stateBits0to3, 2u) << "normal active";
+  EXPECT_EQ(statistics->stateBits4to7, 0u);
+  EXPECT_EQ(statistics->stateBits8to12, 1u) << "one sync slot";
+  EXPECT_EQ(statistics->stateBit13 + statistics->stateBit14, 0u);
+  EXPECT_GT(statistics->statisticsWords[0], 0u) << "cycles since the start";
+  EXPECT_GT(statistics->statisticsWords[1], statistics->statisticsWords[2]) << "data over null";
+  EXPECT_LT(statistics->statisticsWords[5], 64u) << "current cycle";
+  EXPECT_EQ(statistics->lastStateWord, 3u) << "channels A and B active";
+}
+
+struct BusTexts {
+  const char* name;
+  std::string port;
+  std::string interfaceName;
+  std::string lastError;
+  std::string alreadyStarted;
+  std::string refusal;
+};
+void PrintTo(const BusTexts& c, std::ostream* os) { *os << c.name; }
+
+class BusTextsTest : public LinFlexRayTest, public ::testing::WithParamInterface<BusTexts> {};
+
+TEST_P(BusTextsTest, SessionCommandsAnswerWithTheTextsOfTheBus) {
+  const BusTexts& bus = GetParam();
+  tarvix::StartRecording();
+  kvhost::HostClient host = StartedHost({bus.port});
+  const std::pair<std::string, std::string> exchanges[] = {
+      {"CMD_SESSION_READ_LAST_ERROR", bus.lastError},
+      {"CMD_SESSION_START", bus.alreadyStarted},
+      {"SET_PROP_SESSION_TERMINATION=1", bus.refusal},
+      {"CMD_TX_START", "<ACK: CMD_TX_START>\n"},
+      {"CMD_SESSION_TERMINATE", "<ACK: CMD_SESSION_TERMINATE>\n"},
+  };
+  for (const auto& [command, text] : exchanges) {
+    auto reply = Command(host, command);
+    ASSERT_TRUE(reply.has_value()) << command;
+    EXPECT_EQ(reply->text(), text) << command;
+  }
+  EXPECT_TRUE(host.WaitForClose(kReplyDeadline));
+  size_t writes = 0;
+  bool cleared = false;
+  for (const tarvix::CallRecord& call : CallsOn(bus.interfaceName)) {
+    writes += call.operation == "kxWriteFrame";
+    cleared |= call.operation == "kxClear" && call.status == 0;
+  }
+  EXPECT_EQ(writes, 0u) << "only CAN sessions transmit";
+  EXPECT_TRUE(cleared) << "terminating clears the driver session";
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Buses, BusTextsTest,
+    ::testing::Values(
+        BusTexts{"LIN", "SET_PROP_SESSION_PORTNAME=LIN1", "LIN1", "<LIN Error: 0>  <TCP Error: 0> \n",
+                 "<ERROR: LIN session is already started>\n",
+                 "<ERROR: SET_PROP_SESSION_TERMINATION: LIN Session yet created>\n"},
+        BusTexts{"FlexRay", kPort, "FlexRay1", "<FlexRay Error: 0>  <TCP Error: 0> \n",
+                 "<ERROR: FlexRay session is already started>\n",
+                 "<ERROR: SET_PROP_SESSION_TERMINATION: FR Session yet created>\n"}),
+    [](const auto& info) { return std::string(info.param.name); });
+
+}  // namespace
+}  // namespace kvtest

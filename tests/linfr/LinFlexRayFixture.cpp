@@ -1,0 +1,135 @@
+// Hosts that monitor LIN and FlexRay sessions over TCP, and the helpers that read what they receive.
+#include "tests/linfr/LinFlexRayFixture.h"
+
+namespace kvtest {
+
+std::vector<const kvhost::IdentifierRecord*> BusRecords::all(uint32_t identifier) const {
+  std::vector<const kvhost::IdentifierRecord*> found;
+  for (const kvhost::IdentifierRecord& record : records) {
+    if (record.identifier == identifier) found.push_back(&record);
+  }
+  return found;
+}
+
+const kvhost::IdentifierRecord* BusRecords::find(uint32_t identifier) const {
+  const auto found = all(identifier);
+  return found.empty() ? nullptr : found.front();
+}
+
+void LinFlexRayTest::SetUp() {
+  tarvix::ResetToDefaults();
+  ServiceFixture::SetUp();
+}
+
+void LinFlexRayTest::TearDown() {
+  ServiceFixture::TearDown();
+  tarvix::ResetToDefaults();
+}
+
+std::optional<kvhost::HostMessage> LinFlexRayTest::NextMessage(
+    kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
+    std::chrono::milliseconds timeout) {
+  const auto deadline = std::chrono::steady_clock::now() + timeout;
+  for (;;) {
+    const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
+        deadline - std::chrono::steady_clock::now());
+    if (left.count() <= 0) return std::nullopt;
+    std::optional<kvhost::HostMessage> message = host.Receive(left);
+    if (!message) return std::nullopt;
+    if (accept(*message)) return message;
+  }
+}
+
+std::optional<kvhost::HostMessage> LinFlexRayTest::Command(kvhost::HostClient& host,
+                                                           const std::string& command) {
+  EXPECT_TRUE(host.Send(command)) << host.error();
+  return NextMessage(host, [](const kvhost::HostMessage& m) {
+    return m.header.type == kvhost::kText || m.header.type == kvhost::kErrorText;
+  }, kReplyDeadline);
+}
+
+void LinFlexRayTest::Set(kvhost::HostClient& host, const std::string& assignment) {
+  auto reply = Command(host, assignment);
+  ASSERT_TRUE(reply.has_value()) << "no reply to " << assignment;
+  EXPECT_EQ(reply->text().rfind("<ACK: ", 0), 0u) << assignment << " answered " << reply->text();
+}
+
+std::optional<BusRecords> LinFlexRayTest::RecordsWhere(
+    kvhost::HostClient& host, uint8_t type, const std::function<bool(const BusRecords&)>& accept) {
+  std::optional<BusRecords> found;
+  NextMessage(host, [&](const kvhost::HostMessage& m) {
+    if (m.header.type != type) return false;
+    auto records = type == kvhost::kLinRecords
+                       ? kvhost::DecodeLinRecords(m.payload, m.header.idCount)
+                       : kvhost::DecodeFlexRayRecords(m.payload, m.header.idCount);
+    EXPECT_TRUE(records.has_value()) << "a record message does not hold its header's count";
+    if (!records) return true;
+    BusRecords decoded{m.header, std::move(*records)};
+    if (!accept(decoded)) return false;
+    found = std::move(decoded);
+    return true;
+  });
+  return found;
+}
+
+std::optional<kvhost::LinStatisticsView> LinFlexRayTest::LinStatisticsWhere(
+    kvhost::HostClient& host, const std::function<bool(const kvhost::LinStatisticsView&)>& accept) {
+  std::optional<kvhost::LinStatisticsView> found;
+  NextMessage(host, [&](const kvhost::HostMessage& m) {
+    if (m.header.type != kvhost::kStatistics) return false;
+    found = kvhost::DecodeLinStatistics(m.payload);
+    EXPECT_TRUE(found.has_value()) << "LIN statistics of " << m.payload.size() << " bytes";
+    return !found || accept(*found);
+  });
+  return found;
+}
+
+std::optional<kvhost::FlexRayStatisticsView> LinFlexRayTest::FlexRayStatisticsWhere(
+    kvhost::HostClient& host,
+    const std::function<bool(const kvhost::FlexRayStatisticsView&)>& accept) {
+  std::optional<kvhost::FlexRayStatisticsView> found;
+  NextMessage(host, [&](const kvhost::HostMessage& m) {
+    if (m.header.type != kvhost::kStatistics) return false;
+    found = kvhost::DecodeFlexRayStatistics(m.payload);
+    EXPECT_TRUE(found.has_value()) << "FlexRay statistics of " << m.payload.size() << " bytes";
+    return !found || accept(*found);
+  });
+  return found;
+}
+
+kvhost::HostClient LinFlexRayTest::HostWith(const std::vector<std::string>& properties,
+                                            std::optional<kvhost::HostMessage>* startReply) {
+  kvhost::HostClient host = ConnectHost();
+  for (const std::string& property : properties) Set(host, property);
+  auto reply = Command(host, "CMD_SESSION_START");
+  EXPECT_TRUE(reply.has_value()) << "no reply to CMD_SESSION_START";
+  if (startReply != nullptr) *startReply = std::move(reply);
+  return host;
+}
+
+kvhost::HostClient LinFlexRayTest::StartedHost(const std::vector<std::string>& properties) {
+  std::optional<kvhost::HostMessage> reply;
+  kvhost::HostClient host = HostWith(properties, &reply);
+  if (reply) {
+    EXPECT_EQ(reply->text(), "<ACK: CMD_SESSION_START>\n");
+  }
+  return host;
+}
+
+std::vector<tarvix::CallRecord> CallsOn(const std::string& interfaceName) {
+  std::vector<tarvix::CallRecord> calls;
+  for (tarvix::CallRecord& call : tarvix::RecordedCalls()) {
+    if (call.interfaceName == interfaceName) calls.push_back(std::move(call));
+  }
+  return calls;
+}
+
+std::vector<tarvix::CallRecord> SetPropertyCalls(const std::string& interfaceName, uint32_t id) {
+  std::vector<tarvix::CallRecord> calls;
+  for (tarvix::CallRecord& call : CallsOn(interfaceName)) {
+    if (call.operation == "kxSetProperty" && call.id == id) calls.push_back(std::move(call));
+  }
+  return calls;
+}
+
+}  // namespace kvtest

@@ -1,0 +1,241 @@
+// A host monitors the simulated LIN bus over TCP: its modes, records, checksums and statistics.
+#include <gtest/gtest.h>
+
+#include <set>
+
+#include "driver/Properties.h"
+#include "service/HostConnection.h"
+#include "tests/linfr/LinFlexRayFixture.h"
+
+namespace kvtest {
+namespace {
+
+using Payload = std::vector<uint8_t>;
+using Record = kvhost::IdentifierRecord;
+
+constexpr uint8_t kLinData = 0x40;
+constexpr uint8_t kLinNoResponse = 0x42;
+constexpr uint8_t kLinBusError = 0x41;
+constexpr uint8_t kEnhancedChecksumFlag = 0x01;
+// Enhanced checksums of the schedule's constant frames: the inverted carry-wrapping sum of the
+// protected identifier (0x50, 0xD3) and the data bytes.
+constexpr uint32_t kChecksum0x10 = 0x69;
+constexpr uint32_t kChecksum0x13 = 0xF0;
+
+const std::string kPort = "SET_PROP_SESSION_PORTNAME=LIN1";
+const std::string kNormal = "SET_PROP_SESSION_RUNMODE=NORMAL";
+
+bool Has(const BusRecords& m, std::initializer_list<uint32_t> identifiers) {
+  for (uint32_t identifier : identifiers) {
+    if (m.find(identifier) == nullptr) return false;
+  }
+  return true;
+}
+
+// The driver calls of the start from the creation on, in order, without the reads and state reads
+// of the poll thread.
+std::vector<std::pair<std::string, uint32_t>> StartCalls(const std::string& interfaceName) {
+  std::vector<std::pair<std::string, uint32_t>> calls;
+  for (const tarvix::CallRecord& call : CallsOn(interfaceName)) {
+    // The hardware table read at accept comes before the start.
+    if (calls.empty() && call.operation != "kxCreateSession") continue;
+    if (call.operation == "kxReadFrame" || call.operation == "kxReadState") continue;
+    if (call.operation == "kxClear") break;
+    calls.emplace_back(call.operation, call.id);
+  }
+  return calls;
+}
+
+struct LinMode {
+  const char* name;
+  std::vector<std::string> properties;
+  std::vector<std::pair<std::string, uint32_t>> startCalls;  // operation and its id argument
+};
+void PrintTo(const LinMode& m, std::ostream* os) { *os << m.name; }
+
+const std::vector<std::pair<std::string, uint32_t>> kReceiveProperties = {
+    {"kxSetProperty", driver::kPropEcho},
+    {"kxSetProperty", driver::kPropBusErrorFrames},
+    {"kxSetProperty", driver::kPropLinNoResponseFrames},
+    {"kxSetProperty", driver::kPropLinChecksumFlag},
+};
+
+std::vector<std::pair<std::string, uint32_t>> Then(std::vector<std::pair<std::string, uint32_t>> a) {
+  a.insert(a.end(), kReceiveProperties.begin(), kReceiveProperties.end());
+  return a;
+}
+
+const LinMode kModes[] = {
+    {"Subordinate", {kPort}, Then({{"kxCreateSession", 6}})},
+    {"BuiltIn",
+     {kPort, kNormal, "SET_PROP_SESSION_BAUDRATE=19200"},
+     Then({{"kxCreateSession", 6},
+           {"kxStop", 2},
+           {"kxSetProperty", driver::kPropBaudRate},
+           {"kxStart", 0}})},
+    {"Database",
+     {kPort, kNormal, "SET_PROP_SESSION_ALIAS=SimDB", "SET_PROP_SESSION_CLUSTER=LIN"},
+     Then({{"kxCreateSession", 6},
+           {"kxGetProperty", driver::kPropBaudRate},
+           {"kxStop", 2},
+           {"kxStart", 0}})},
+};
+
+class LinModeTest : public LinFlexRayTest, public ::testing::WithParamInterface<LinMode> {};
+
+TEST_P(LinModeTest, ScheduleShowsOneEntryPerAnsweredIdentifier) {
+  tarvix::StartRecording();
+  kvhost::HostClient host = StartedHost(GetParam().properties);
+  auto message = RecordsWhere(host, kvhost::kLinRecords, [](const BusRecords& m) {
+    return Has(m, {0x10, 0x11, 0x13});
+  });
+  ASSERT_TRUE(message.has_value());
+  EXPECT_EQ(StartCalls("LIN1"), GetParam().startCalls);
+
+  // Without the no-response property 0x12 never appears; the table is sorted by identifier.
+  ASSERT_EQ(message->records.size(), 3u);
+  EXPECT_EQ(message->header.idCount, 3u);
+  const std::vector<Payload> payloads = {{0x12, 0x34}, {}, {0xDE, 0xAD, 0xBE, 0xEF}};
+  const uint32_t identifiers[] = {0x10, 0x11, 0x13};
+  for (size_t i = 0; i < 3; ++i) {
+    const Record& r = message->records[i];
+    SCOPED_TRACE(r.identifier);
+    EXPECT_EQ(r.identifier, identifiers[i]);
+    EXPECT_EQ(r.type, kLinData);
+    EXPECT_EQ(r.flag, kEnhancedChecksumFlag);
+    EXPECT_EQ(r.checksum, 0u) << "the info byte holds the checksum only when asked for";
+    EXPECT_EQ(r.echo, 0);
+    EXPECT_GE(r.count, 1u);
+    if (!payloads[i].empty()) {
+      EXPECT_EQ(r.payload, payloads[i]);
+    }
+  }
+  const Record& counter = message->records[1];
+  ASSERT_EQ(counter.payloadLength, 8u);
+  EXPECT_EQ(Payload(counter.payload.begin() + 1, counter.payload.end()),
+            (Payload{1, 2, 3, 4, 5, 6, 7}));
+}
+
+INSTANTIATE_TEST_SUITE_P(Modes, LinModeTest, ::testing::ValuesIn(kModes),
+                         [](const auto& info) { return std::string(info.param.name); });
+
+TEST_F(LinFlexRayTest, DatabaseModeTakesTheClusterBaudRate) {
+  kvhost::HostClient host = StartedHost({kPort, kNormal, "SET_PROP_SESSION_BAUDRATE=9600",
+                                         "SET_PROP_SESSION_ALIAS=SimDB",
+                                         "SET_PROP_SESSION_CLUSTER=LIN"});
+  EXPECT_EQ(service().connections.at(0).connection->settings.baudRate.load(), 19200u);
+  EXPECT_TRUE(RecordsWhere(host, kvhost::kLinRecords, [](const BusRecords& m) {
+    return Has(m, {0x10, 0x11, 0x13});
+  }));
+}
+
+TEST_F(LinFlexRayTest, NoResponseFramesAndChecksumsAsTheDriverSendsThem) {
+  kvhost::HostClient host =
+      StartedHost({kPort, "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1", "SET_PROP_SESSION_LOG_CHECKSUM=1"});
+  auto message = RecordsWhere(host, kvhost::kLinRecords, [](const BusRecords& m) {
+    return Has(m, {0x10, 0x11, 0x12, 0x13});
+  });
+  ASSERT_TRUE(message.has_value());
+  ASSERT_EQ(message->records.size(), 4u);
+  const Record& silent = *message->find(0x12);
+  EXPECT_EQ(silent.type, kLinNoResponse);
+  EXPECT_EQ(silent.payloadLength, 0u);
+  EXPECT_EQ(message->find(0x10)->checksum, kChecksum0x10);
+  EXPECT_EQ(message->find(0x13)->checksum, kChecksum0x13);
+  EXPECT_EQ(message->find(0x13)->flag, kEnhancedChecksumFlag);
+
+  auto statistics = LinStatisticsWhere(host, [](const kvhost::LinStatisticsView& s) {
+    return s.noResponseFrames > 0;
+  });
+  ASSERT_TRUE(statistics.has_value());
+  EXPECT_GT(statistics->dataFrames, statistics->noResponseFrames);
+}
+
+// One identifier that answers in one slot and stays silent in the next: one entry whose count
+// covers both and whose type and payload are those of its last frame.
+TEST_F(LinFlexRayTest, IdentifierOfBothTypesKeepsOneEntryOfItsLastFrame) {
+  std::string error;
+  ASSERT_TRUE(tarvix::LoadConfiguration(R"({
+    "buses": [{"name": "lin", "protocol": "LIN", "slotMs": 10, "schedule": [
+      {"id": "0x20", "length": 2, "payload": "AB CD"}, {"id": "0x20", "response": false}]}],
+    "devices": [{"name": "SIM-LIN", "interfaces": [{"name": "LIN1", "bus": "lin", "port": 1}]}]
+  })", ".", &error)) << error;
+  kvhost::HostClient host = StartedHost({kPort, "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"});
+
+  std::set<uint8_t> typesSeen;
+  auto message = RecordsWhere(host, kvhost::kLinRecords, [&](const BusRecords& m) {
+    EXPECT_EQ(m.records.size(), 1u);
+    const Record& r = m.records.front();
+    if (r.type == kLinData) {
+      EXPECT_EQ(r.payload, (Payload{0xAB, 0xCD}));
+    }
+    if (r.type == kLinNoResponse) {
+      EXPECT_EQ(r.payloadLength, 0u);
+    }
+    typesSeen.insert(r.type);
+    return typesSeen.size() == 2;
+  });
+  EXPECT_TRUE(message.has_value()) << "the entry never showed both types";
+  auto statistics = LinStatisticsWhere(host, [](const kvhost::LinStatisticsView& s) {
+    return s.dataFrames > 0 && s.noResponseFrames > 0;
+  });
+  EXPECT_TRUE(statistics.has_value());
+}
+
+// ":memory:" runs at the host's baud rate: at the wrong one the interface sees bus-error frames,
+// which enter the table and the counters only when the host asked for them.
+TEST_F(LinFlexRayTest, BuiltInModeAtTheWrongBaudRateSeesOnlyBusErrors) {
+  kvhost::HostClient quiet = StartedHost({kPort, kNormal, "SET_PROP_SESSION_BAUDRATE=9600"});
+  kvhost::HostClient errors = StartedHost({"SET_PROP_SESSION_PORTNAME=LIN2", kNormal,
+                                           "SET_PROP_SESSION_BAUDRATE=9600",
+                                           "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1"});
+  auto message = RecordsWhere(errors, kvhost::kLinRecords, [](const BusRecords& m) {
+    return !m.records.empty();
+  });
+  ASSERT_TRUE(message.has_value());
+  ASSERT_EQ(message->records.size(), 1u);
+  EXPECT_EQ(message->records[0].type, kLinBusError);
+  auto counted = LinStatisticsWhere(errors, [](const kvhost::LinStatisticsView& s) {
+    return s.errorFrames > 0;
+  });
+  ASSERT_TRUE(counted.has_value());
+  EXPECT_EQ(counted->dataFrames, 0u);
+
+  // The quiet host gets statistics with nothing counted and never a record message.
+  auto first = LinStatisticsWhere(quiet, [](const kvhost::LinStatisticsView&) { return true; });
+  auto second = NextMessage(quiet, [](const kvhost::HostMessage& m) {
+    EXPECT_NE(m.header.type, kvhost::kLinRecords);
+    return m.header.type == kvhost::kStatistics;
+  });
+  ASSERT_TRUE(first.has_value());
+  ASSERT_TRUE(second.has_value());
+  auto later = kvhost::DecodeLinStatistics(second->payload);
+  ASSERT_TRUE(later.has_value());
+  EXPECT_EQ(later->errorFrames + later->dataFrames, 0u);
+  EXPECT_EQ(later->stateBits4to7, 1u) << "last error: bit rate";
+}
+
+TEST_F(LinFlexRayTest, LinStatisticsCarryRatesAndTheStateWord) {
+  kvhost::HostClient host = StartedHost({kPort, "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"});
+  // 100 slots per second: 75 answered, 25 without response. A window on a busy machine may be
+  // cut short, so a report within a few frames of the schedule is waited for.
+  auto statistics = LinStatisticsWhere(host, [](const kvhost::LinStatisticsView& s) {
+    return s.dataFramesPerSecond >= 70 && s.dataFramesPerSecond <= 80 &&
+           s.noResponseFramesPerSecond >= 22 && s.noResponseFramesPerSecond <= 28;
+  });
+  ASSERT_TRUE(statistics.has_value());
+  EXPECT_EQ(statistics->errorFrames, 0u);
+  EXPECT_EQ(statistics->errorFramesPerSecond, 0u);
+  EXPECT_EQ(statistics->faultCode, 0u);
+  EXPECT_EQ(statistics->stateBits0to7 & 1, 1u) << "communicating";
+  EXPECT_EQ(statistics->stateBits2to3, 1u) << "active";
+  EXPECT_EQ(statistics->stateBit1, 0u);
+  EXPECT_EQ(statistics->stateBit31, 0u) << "running";
+  EXPECT_EQ(statistics->stateBits4to7, 2u) << "last error: no response";
+  EXPECT_EQ(statistics->stateBits8to15, 0x12u) << "identifier of the last error";
+  EXPECT_LT(statistics->stateBits24to29, 4u) << "a slot of the four-slot schedule";
+  EXPECT_EQ(statistics->stateBits0to7 & 0xF0, statistics->stateBits4to7 << 4);
+}
+
+}  // namespace
+}  // namespace kvtest
