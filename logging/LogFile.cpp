@@ -6,6 +6,7 @@
 
 #include "bus/CBusSystem.h"
 #include "logging/LogFileName.h"
+#include "logging/VoraLog.h"
 #include "service/HostConnection.h"
 
 namespace nKV_DLL300 {
@@ -54,9 +55,7 @@ void OpenLogFile(SessionLog& log, std::string_view headerLine) {
   switch (logType) {
     case kLogTypeText: OpenTextLog(log, path, headerLine); break;
     case kLogTypeBinary: OpenBinaryLog(log, path); break;
-    case kLogTypeMeasurementData:
-      // The measurement-data branch opens voraFile and voraChannel here, with `path`.
-      break;
+    case kLogTypeMeasurementData: OpenVoraLog(log, path); break;
     default: break;  // named nothing (reported above) and opens nothing
   }
 }
@@ -69,9 +68,7 @@ void CloseLogFile(SessionLog& log) {
       // that looks complete, so a failure here is reported once.
       if (!log.closeStream()) log.fail(kLogWriteIncomplete);
       break;
-    case kLogTypeMeasurementData:
-      // The measurement-data branch flushes and closes voraFile here.
-      break;
+    case kLogTypeMeasurementData: CloseVoraLog(log); break;
     default: break;
   }
   log.setOpenedType(-1);

@@ -12,7 +12,7 @@ namespace nKV_DLL300 {
 // it for the log type the settings hold now:
 //   0 text     truncated ("w"), then `headerLine` and a line feed
 //   1 binary   truncated ("w+b"), then the 12-byte file header
-//   2 measurement data: its own branch (nothing is opened until that branch exists)
+//   2 measurement data: the library file and channel of OpenVoraLog (logging/VoraLog.h)
 // Failures are reported at once and the session goes on: a name or directory failure reports
 // -20 and the open that follows fails and reports -20 again (two reports); an open failure -20;
 // a header not written whole -21 (the file stays open). The header line is used by type 0 only.

@@ -7,6 +7,7 @@
 #include "logging/FrameSelection.h"
 #include "logging/LogFileName.h"
 #include "logging/TextLogFormat.h"
+#include "logging/VoraLog.h"
 #include "service/HostConnection.h"
 
 namespace nKV_DLL300 {
@@ -86,9 +87,7 @@ void WriteBatch(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t byte
     case kLogTypeBinary:
       if (log.isOpen()) WriteRecords(log, bus, batch, bytes, frames);
       break;
-    case kLogTypeMeasurementData:
-      // The measurement-data branch appends the records (RecordLayout) to voraChannel here.
-      break;
+    case kLogTypeMeasurementData: WriteVoraRecords(log, RecordLayout(log, bus), batch, bytes, frames); break;
     default: break;
   }
 }

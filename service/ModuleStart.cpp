@@ -1,4 +1,5 @@
 // Loading the module starts its service; unloading it shuts the service down in order.
+#include "logging/MeasurementLibrary.h"
 #include "protocol/DriverSystem.h"
 #include "service/ServiceContext.h"
 
@@ -14,6 +15,12 @@ class ModuleService {
   ~ModuleService() {
     context_->Shutdown();
     delete context_;
+    // Every session has stopped and closed its measurement-data file, so the library can go. A
+    // failure to free it at process shutdown has nobody to be reported to.
+    try {
+      UnloadMeasurementLibrary();
+    } catch (const vorException&) {
+    }
   }
   ModuleService(const ModuleService&) = delete;
   ModuleService& operator=(const ModuleService&) = delete;
@@ -32,6 +39,13 @@ class ModuleService {
 // The first static initialiser of the module: the service thread exists before any other
 // static object of the module is constructed.
 __attribute__((init_priority(101))) ModuleService theModuleService;
+
+// The next: the measurement-data library loader names vora.dll from the environment and the
+// registry file; the first type 2 log loads it. (Its unload is the service's last step above.)
+struct MeasurementLibraryLoader {
+  MeasurementLibraryLoader() { LocateMeasurementLibrary(); }
+};
+__attribute__((init_priority(102))) MeasurementLibraryLoader theMeasurementLibraryLoader;
 
 }  // namespace
 
