@@ -53,9 +53,12 @@ bench: deps
 # without a file or a usable first word).
 DRIVE_C ?= $(or $(KELVANERT_DRIVE_C),$(HOME)/.kelvanert/drive_c)
 SERVICE_DIR = $(DRIVE_C)/QV-RT/tarvix/kelvane
+# Where the controller looks for the measurement-data library of type 2 logs by default.
+VORA_DLL = $(DRIVE_C)/Program Files/Quovera/Shared/vora/vora.dll
 
 run: build
 	@mkdir -p "$(SERVICE_DIR)"
+	@install -D -m 755 build/vora/vora.dll "$(VORA_DLL)" && echo "kelvanert: measurement-data library $(VORA_DLL)"
 	@port=$$(awk 'BEGIN { p = 13456 } { for (i = 1; i <= NF; i++) { t = $$i; \
 	    if (length(t) <= 19 && index(t, "=") > 0) p = (substr(t, index(t, "=") + 1) + 0) % 65536; \
 	    exit } } END { print p }' "$(SERVICE_DIR)/kelvanert.ini" 2>/dev/null || echo 13456); \
