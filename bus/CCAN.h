@@ -8,6 +8,7 @@
 #include "bus/CTableSession.h"
 #include "bus/CanFrameTimes.h"
 #include "bus/CanIdentifierRules.h"
+#include "transmit/CTransmitFrame.h"
 
 namespace nKV_DLL300 {
 
@@ -32,12 +33,21 @@ class CCAN : public CTableSession<CanIdentifierRules, CanBusStatistics, kCanRead
   // status is also lastStatus. Service thread, before startPollThread.
   int32_t openCanSession(const std::string& interfaceName, uint64_t baudRate, uint32_t termination);
 
+  // Stops the host's transmission first, whenever the session ends (terminate, heartbeat
+  // loss, closed host), then the session itself.
+  int32_t stop() override {
+    transmit.StopIfActive();
+    return CBusSystem::stop();
+  }
   void startPollThread() override;
   // Bus load, frame rates and the driver's CAN state word, sent as one statistics message.
   void reportBusState(uint64_t elapsedMilliseconds) override;
 
   // Status of the address claim (and of the transmit operations that share it). Service thread.
   int32_t addressClaimStatus = 0;
+  // The frame the host defines with SET_TX_PROP and sends with CMD_TX_START; its driver status
+  // goes to addressClaimStatus. Service thread.
+  CTransmitFrame transmit{connection->settings, addressClaimStatus};
 
  protected:
   const char* logHeaderLine() const override;

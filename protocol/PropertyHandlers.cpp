@@ -8,13 +8,13 @@
 #include "protocol/NameProperties.h"
 #include "protocol/PlainProperties.h"
 #include "protocol/SessionLockedProperties.h"
+#include "protocol/TransmitProperties.h"
 
 namespace nKV_DLL300 {
 
 namespace {
 
-// A recognised property whose handler is not in place yet (the transmit-frame properties): the
-// message is taken, nothing sent.
+// A recognised property without a handler: the message is taken, nothing sent.
 void Unanswered(HostConnection&, std::string_view) {}
 
 PropertyHandlerTable MakeHandlers() {
@@ -24,6 +24,7 @@ PropertyHandlerTable MakeHandlers() {
   AddPlainPropertyHandlers(handlers);
   AddCheckedPropertyHandlers(handlers);
   AddSessionLockedPropertyHandlers(handlers);
+  AddTransmitPropertyHandlers(handlers);
   return handlers;
 }
 

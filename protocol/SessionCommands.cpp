@@ -7,6 +7,7 @@
 #include "bus/CCAN.h"
 #include "bus/CFlexRay.h"
 #include "bus/CLIN.h"
+#include "protocol/TransmitProperties.h"
 #include "service/HostConnection.h"
 #include "service/HostLink.h"
 #include "service/MessageHeader.h"
@@ -160,13 +161,16 @@ int32_t ResetSession(HostConnection& connection) {
   return 0;
 }
 
+// Transmission exists on CAN sessions only; LIN and FlexRay sessions get the acknowledgement.
 int32_t StartTransmitCommand(HostConnection& connection) {
   SendText(connection, kTxStartAck, connection.session.get(), kMessageText);
+  if (CTransmitFrame* frame = CanTransmitFrame(connection)) frame->StartTransmit();
   return 0;
 }
 
 int32_t StopTransmitCommand(HostConnection& connection) {
   SendText(connection, kTxStopAck, connection.session.get(), kMessageText);
+  if (CTransmitFrame* frame = CanTransmitFrame(connection)) frame->StopTransmit();
   return 0;
 }
 

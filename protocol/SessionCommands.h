@@ -20,7 +20,9 @@ int32_t TerminateSession(HostConnection& connection);
 int32_t ReadLastError(HostConnection& connection);
 // CMD_SESSION_RESET: the table is emptied at the session's next identifier-record send.
 int32_t ResetSession(HostConnection& connection);
-// CMD_TX_START and CMD_TX_STOP: the acknowledgement.
+// CMD_TX_START and CMD_TX_STOP: the acknowledgement, then, on a CAN session, the start or stop
+// of its transmit frame. Ending the session (terminate, heartbeat, closed host) stops
+// transmission through the CAN session's stop.
 int32_t StartTransmitCommand(HostConnection& connection);
 int32_t StopTransmitCommand(HostConnection& connection);
 

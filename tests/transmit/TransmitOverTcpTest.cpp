@@ -1,0 +1,289 @@
+// A host defines, starts, updates and stops a frame on CAN3; a second host watches CAN4 on the
+// same quiet test bus and sees exactly that frame.
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "tarvix/TarvixControl.h"
+#include "tests/session/CanSessionFixture.h"
+
+namespace kvtest {
+namespace {
+
+using Bytes = std::vector<uint8_t>;
+using nKV_DLL300::SessionSettings;
+
+constexpr uint32_t kTxId = 0x123;
+constexpr uint8_t kTypeFdBrs = 0x18;
+constexpr uint8_t kEchoFlag = 0x80;
+constexpr uint32_t kRecordPeriodMs = 100;
+constexpr double kUnitsPerSecond = 1e7;  // record time stamps count 100 ns
+// Record messages that pass while a stopped frame must not be counted again (at 100 ms each,
+// far longer than the 50 ms repetition).
+constexpr int kQuietMessages = 6;
+
+class TransmitTest : public CanSessionTest {
+ protected:
+  // Slot 0: a CAN session on CAN3 at the test bus's rates, classic unless `canIoMode` says FD.
+  kvhost::HostClient Transmitter(uint32_t canIoMode = 0, uint8_t logTransmitted = 0) {
+    return StartedHost(0, "CAN3", [&](SessionSettings& s) {
+      s.runMode.Set("NORMAL");
+      s.baudRate.store(500000);
+      s.canFdBaudRate.store(2000000);
+      s.canIoMode.store(canIoMode);
+      s.logTransmittedFrames.store(logTransmitted);
+      s.txTimeData.store(kRecordPeriodMs);
+    });
+  }
+
+  // Watches CAN4 as the bus runs, with a record message every 100 ms.
+  kvhost::HostClient Monitor(size_t slot = 1) {
+    return StartedHost(slot, "CAN4", [](SessionSettings& s) { s.txTimeData.store(kRecordPeriodMs); });
+  }
+
+  // Sends each property message and checks its acknowledgement, "<ACK: NAME>\n".
+  void Define(kvhost::HostClient& host, const std::vector<std::string>& messages) {
+    for (const std::string& message : messages) {
+      auto reply = Command(host, message);
+      ASSERT_TRUE(reply.has_value()) << message;
+      EXPECT_EQ(reply->text(), "<ACK: " + message.substr(0, message.find('=')) + ">\n");
+    }
+  }
+
+  void Expect(kvhost::HostClient& host, const std::string& command) {
+    auto reply = Command(host, command);
+    ASSERT_TRUE(reply.has_value()) << command;
+    EXPECT_EQ(reply->text(), "<ACK: " + command + ">\n");
+  }
+
+  // The first record of `identifier` in a message of `host` for which `accept` holds.
+  std::optional<kvhost::IdentifierRecord> Seen(
+      kvhost::HostClient& host, uint32_t identifier, uint8_t type,
+      const std::function<bool(const kvhost::IdentifierRecord&)>& accept) {
+    auto message = RecordsWhere(host, [&](const RecordMessage& m) {
+      const kvhost::IdentifierRecord* record = m.find(identifier, type);
+      return record != nullptr && accept(*record);
+    });
+    if (!message) return std::nullopt;
+    return *message->find(identifier, type);
+  }
+
+  std::optional<kvhost::IdentifierRecord> SeenCount(kvhost::HostClient& host, uint32_t atLeast,
+                                                    uint32_t identifier = kTxId,
+                                                    uint8_t type = kTypeData) {
+    return Seen(host, identifier, type,
+                [&](const kvhost::IdentifierRecord& r) { return r.count >= atLeast; });
+  }
+
+  // The count of `identifier` in the next record message, 0 when it is not listed. A session
+  // with an empty table sends no records, so a statistics message (once a second) also ends the
+  // wait, giving `noNews`.
+  std::optional<uint32_t> NextCount(kvhost::HostClient& host, uint32_t identifier = kTxId,
+                                    uint32_t noNews = 0) {
+    auto message = NextMessage(host, [](const kvhost::HostMessage& m) {
+      return m.header.type == kvhost::kCanRecords || m.header.type == kvhost::kStatistics;
+    });
+    if (!message) return std::nullopt;
+    if (message->header.type == kvhost::kStatistics) return noNews;
+    auto records = kvhost::DecodeCanRecords(message->payload, message->header.idCount);
+    if (!records) return std::nullopt;
+    for (const kvhost::IdentifierRecord& record : *records) {
+      if (record.identifier == identifier) return record.count;
+    }
+    return 0u;
+  }
+
+  // The frame is no longer on the bus: its count stays the same over several record messages.
+  // The first message may still hold a frame that was in flight at the stop.
+  void ExpectCountStops(kvhost::HostClient& monitor, uint32_t identifier = kTxId) {
+    ASSERT_TRUE(NextCount(monitor, identifier).has_value());
+    auto settled = NextCount(monitor, identifier);
+    ASSERT_TRUE(settled.has_value());
+    for (int i = 0; i < kQuietMessages; ++i) {
+      auto later = NextCount(monitor, identifier, *settled);
+      ASSERT_TRUE(later.has_value());
+      EXPECT_EQ(*later, *settled) << "the frame is still being sent";
+    }
+  }
+
+  void DefineCyclic(kvhost::HostClient& host) {
+    Define(host, {"SET_TX_PROP_IDENTIFIER=291", "SET_TX_PROP_PAYLOAD_LENGTH=5",
+                  "SET_TX_PROP_PAYLOAD=1,2,3", "SET_TX_PROP_TIMING_TYPE=0",
+                  "SET_TX_PROP_CYCLIC_RATE=0,05"});
+  }
+};
+
+TEST_F(TransmitTest, EventFrameGoesOutOncePerStartWithItsIdentifierLengthAndPayload) {
+  kvhost::HostClient sender = Transmitter();
+  kvhost::HostClient monitor = Monitor();
+  Define(sender, {"SET_TX_PROP_IDENTIFIER=291", "SET_TX_PROP_PAYLOAD_LENGTH=5",
+                  "SET_TX_PROP_PAYLOAD=1,2,3", "SET_TX_PROP_TIMING_TYPE=1"});
+
+  Expect(sender, "CMD_TX_START");
+  auto first = SeenCount(monitor, 1);
+  ASSERT_TRUE(first.has_value());
+  EXPECT_EQ(first->count, 1u);
+  EXPECT_EQ(first->payloadLength, 5u);
+  EXPECT_EQ(first->payload, (Bytes{1, 2, 3, 0, 0}));
+
+  Expect(sender, "CMD_TX_START");
+  ASSERT_TRUE(SeenCount(monitor, 2).has_value());
+  for (int i = 0; i < kQuietMessages; ++i) EXPECT_EQ(NextCount(monitor), 2u) << "an event frame repeated";
+
+  // A stop empties the payload: the next start sends the length in zeros.
+  Expect(sender, "CMD_TX_STOP");
+  Expect(sender, "CMD_TX_START");
+  auto third = SeenCount(monitor, 3);
+  ASSERT_TRUE(third.has_value());
+  EXPECT_EQ(third->payload, (Bytes{0, 0, 0, 0, 0}));
+}
+
+TEST_F(TransmitTest, CyclicFrameRepeatsFollowsPayloadUpdatesAndEndsWithStop) {
+  kvhost::HostClient sender = Transmitter();
+  kvhost::HostClient monitor = Monitor();
+  DefineCyclic(sender);
+  Expect(sender, "CMD_TX_START");
+
+  // About 20 frames a second, measured in bus time between two records.
+  auto early = SeenCount(monitor, 3);
+  ASSERT_TRUE(early.has_value());
+  auto later = SeenCount(monitor, early->count + 20);
+  ASSERT_TRUE(later.has_value());
+  const double seconds = (later->lastTimestamp - early->lastTimestamp) / kUnitsPerSecond;
+  ASSERT_GT(seconds, 0.0);
+  const double perSecond = (later->count - early->count) / seconds;
+  EXPECT_GT(perSecond, 10.0);
+  EXPECT_LT(perSecond, 40.0);
+
+  Define(sender, {"SET_TX_PROP_PAYLOAD=9,8,7"});
+  EXPECT_TRUE(Seen(monitor, kTxId, kTypeData, [](const kvhost::IdentifierRecord& r) {
+                return r.payload == Bytes{9, 8, 7, 0, 0};
+              }).has_value());
+
+  Expect(sender, "CMD_TX_STOP");
+  ExpectCountStops(monitor);
+}
+
+TEST_F(TransmitTest, SecondStartReplacesTheRunningFrameInsteadOfAddingOne) {
+  kvhost::HostClient sender = Transmitter();
+  kvhost::HostClient monitor = Monitor();
+  DefineCyclic(sender);
+  Expect(sender, "CMD_TX_START");
+  ASSERT_TRUE(SeenCount(monitor, 3).has_value());
+
+  Define(sender, {"SET_TX_PROP_IDENTIFIER=292"});
+  Expect(sender, "CMD_TX_START");
+  ASSERT_TRUE(SeenCount(monitor, 3, kTxId + 1).has_value());
+  ExpectCountStops(monitor, kTxId);
+  Expect(sender, "CMD_TX_STOP");
+  ExpectCountStops(monitor, kTxId + 1);
+}
+
+TEST_F(TransmitTest, RemoteExtendedAndFdFramesReachTheOtherInterface) {
+  struct Case {
+    const char* name;
+    uint32_t canIoMode;
+    std::vector<std::string> definition;
+    uint32_t seenIdentifier;
+    uint8_t seenType;
+    uint32_t seenLength;
+  };
+  const std::vector<Case> cases = {
+      {"remote", 0, {"SET_TX_PROP_IDENTIFIER=801", "SET_TX_PROP_FRAME_TYPE=1"}, 801, kTypeRemote, 0},
+      {"extended", 0, {"SET_TX_PROP_IDENTIFIER=28036592", "SET_TX_PROP_EXTENDED_ID=1",
+                       "SET_TX_PROP_PAYLOAD_LENGTH=8", "SET_TX_PROP_PAYLOAD=1,2,3,4,5,6,7,8"},
+       28036592 | kExtendedFlag, kTypeData, 8},
+      {"FD with bit-rate switching", 2, {"SET_TX_PROP_IDENTIFIER=512", "SET_TX_PROP_FRAME_TYPE=24",
+                                         "SET_TX_PROP_PAYLOAD_LENGTH=12",
+                                         "SET_TX_PROP_PAYLOAD=1,2,3,4,5,6,7,8,9,10,11,12"},
+       512, kTypeFdBrs, 12},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.name);
+    tarvix::ResetToDefaults();
+    StartService();
+    kvhost::HostClient sender = Transmitter(c.canIoMode);
+    kvhost::HostClient monitor = Monitor();
+    Define(sender, c.definition);
+    Expect(sender, "CMD_TX_START");
+    auto seen = Seen(monitor, c.seenIdentifier, c.seenType,
+                     [](const kvhost::IdentifierRecord&) { return true; });
+    ASSERT_TRUE(seen.has_value());
+    EXPECT_EQ(seen->count, 1u);
+    if (c.seenType != kTypeRemote) {
+      EXPECT_EQ(seen->payloadLength, c.seenLength);
+      for (uint32_t i = 0; i < seen->payload.size(); ++i) EXPECT_EQ(seen->payload[i], i + 1);
+    }
+  }
+}
+
+TEST_F(TransmitTest, OwnSessionSeesItsFrameOnlyWhenLoggingTransmittedFrames) {
+  for (uint8_t logTransmitted : {0, 1}) {
+    SCOPED_TRACE(logTransmitted);
+    tarvix::ResetToDefaults();
+    StartService();
+    kvhost::HostClient sender = Transmitter(0, logTransmitted);
+    kvhost::HostClient monitor = Monitor();
+    Define(sender, {"SET_TX_PROP_IDENTIFIER=291", "SET_TX_PROP_PAYLOAD_LENGTH=1"});
+    Expect(sender, "CMD_TX_START");
+    ASSERT_TRUE(SeenCount(monitor, 1).has_value());
+
+    if (logTransmitted != 0) {
+      auto echo = SeenCount(sender, 1);
+      ASSERT_TRUE(echo.has_value());
+      EXPECT_EQ(echo->echo, kEchoFlag);
+    } else {
+      for (int i = 0; i < kQuietMessages; ++i) EXPECT_EQ(NextCount(sender), 0u);
+    }
+  }
+}
+
+TEST_F(TransmitTest, EndingTheSessionStopsACyclicFrame) {
+  enum class End { kTerminate, kCloseSocket };
+  for (End end : {End::kTerminate, End::kCloseSocket}) {
+    SCOPED_TRACE(end == End::kTerminate ? "terminate" : "closed socket");
+    tarvix::ResetToDefaults();
+    StartService();
+    kvhost::HostClient sender = Transmitter();
+    kvhost::HostClient monitor = Monitor();
+    DefineCyclic(sender);
+    Expect(sender, "CMD_TX_START");
+    ASSERT_TRUE(SeenCount(monitor, 3).has_value());
+
+    if (end == End::kTerminate) {
+      Expect(sender, "CMD_SESSION_TERMINATE");
+      EXPECT_TRUE(sender.WaitForClose(kConditionDeadline));
+    } else {
+      sender.Close();
+      ASSERT_TRUE(WaitUntil([&] { return service().connections[0].connection == nullptr; }));
+    }
+    ExpectCountStops(monitor);
+  }
+}
+
+// The watchdog runs only after 10 s in which no host sent anything, so the monitor stays silent
+// too and is ended with the sender; a fresh monitor then finds the bus quiet.
+TEST_F(TransmitTest, HeartbeatLossStopsACyclicFrame) {
+  kvhost::HostClient sender = Transmitter();
+  kvhost::HostClient monitor = Monitor();
+  DefineCyclic(sender);
+  Expect(sender, "CMD_TX_START");
+  ASSERT_TRUE(SeenCount(monitor, 3).has_value());
+
+  auto farewell = NextMessage(sender, [](const kvhost::HostMessage& m) {
+    return m.header.type == kvhost::kErrorText;
+  }, 3 * kConditionDeadline);
+  ASSERT_TRUE(farewell.has_value());
+  EXPECT_EQ(farewell->text(), "<ERROR: Heartbeat message missing| TCP Client disconnect> \n");
+  ASSERT_TRUE(WaitUntil([&] {
+    return service().connections[0].connection == nullptr &&
+           service().connections[1].connection == nullptr;
+  }));
+
+  kvhost::HostClient watcher = Monitor(0);
+  for (int i = 0; i < kQuietMessages; ++i) EXPECT_EQ(NextCount(watcher), 0u);
+}
+
+}  // namespace
+}  // namespace kvtest
