@@ -1,0 +1,260 @@
+// Type 2 logs of live CAN, LIN and FlexRay sessions, read back with vora-dump's reader and h5dump.
+#include <stdio.h>
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <map>
+#include <regex>
+#include <sstream>
+#include <string>
+#include <tuple>
+#include <vector>
+
+#include "host/voradump/VoraReader.h"
+#include "logging/BinaryLogFormat.h"
+#include "logging/BinaryRecordReader.h"
+#include "logging/MeasurementLibrary.h"
+#include "tests/session/CanSessionFixture.h"
+
+namespace kvtest {
+namespace {
+
+using namespace nKV_DLL300;
+namespace fs = std::filesystem;
+
+constexpr char kLogDirectory[] = "QV-RT\\tarvix\\kelvane\\";
+constexpr char kDefaultBelowDrive[] = "Program Files\\Quovera\\Shared\\vora\\vora.dll";
+
+// The standard output of a command line, or "" when it cannot run.
+std::string Output(const std::string& command) {
+  std::string out;
+  FILE* pipe = popen(command.c_str(), "r");
+  if (pipe == nullptr) return out;
+  char buffer[4096];
+  for (size_t n; (n = fread(buffer, 1, sizeof buffer, pipe)) > 0;) out.append(buffer, n);
+  pclose(pipe);
+  return out;
+}
+
+std::string Quote(const fs::path& path) { return "'" + path.string() + "'"; }
+
+size_t Count(const std::string& text, const std::regex& pattern) {
+  return static_cast<size_t>(std::distance(std::sregex_iterator(text.begin(), text.end(), pattern),
+                                           std::sregex_iterator()));
+}
+
+class VoraOverTcpTest : public CanSessionTest {
+ protected:
+  void SetUp() override {
+    CanSessionTest::SetUp();
+    LocateMeasurementLibrary();
+  }
+  void TearDown() override {
+    CanSessionTest::TearDown();
+    UnloadMeasurementLibrary();
+  }
+
+  void InstallLibrary() {
+    const fs::path target = drive_.Native(kDefaultBelowDrive);
+    fs::create_directories(target.parent_path());
+    fs::copy_file(VORA_DLL_PATH, target, fs::copy_options::overwrite_existing);
+  }
+
+  // Connects a host and sends `properties` (each answered); the texts of error replies are kept.
+  kvhost::HostClient Configured(const std::vector<std::string>& properties, std::vector<std::string>& errors) {
+    kvhost::HostClient host = ConnectHost();
+    for (const std::string& property : properties) {
+      std::optional<kvhost::HostMessage> reply = Command(host, property);
+      EXPECT_TRUE(reply) << property;
+      if (reply && reply->header.type == kvhost::kErrorText) errors.push_back(reply->text());
+    }
+    std::optional<kvhost::HostMessage> started = Command(host, "CMD_SESSION_START");
+    EXPECT_TRUE(started && started->text() == "<ACK: CMD_SESSION_START>\n");
+    return host;
+  }
+
+  // Waits for `periods` non-empty identifier-record messages of `recordType`, keeping the error
+  // texts seen meanwhile.
+  void WaitForRecords(kvhost::HostClient& host, uint8_t recordType, std::vector<std::string>& errors,
+                      int periods = 2) {
+    for (int seen = 0; seen < periods;) {
+      std::optional<kvhost::HostMessage> m = NextMessage(host, [&](const kvhost::HostMessage& m) {
+        if (m.header.type == kvhost::kErrorText) errors.push_back(m.text());
+        return m.header.type == recordType;
+      });
+      if (!m) {
+        ADD_FAILURE() << "no identifier records";
+        return;
+      }
+      if (!m->payload.empty()) ++seen;
+    }
+  }
+
+  void Terminate(kvhost::HostClient& host) {
+    EXPECT_TRUE(host.Send("CMD_SESSION_TERMINATE"));
+    EXPECT_TRUE(host.WaitForClose(kConditionDeadline));
+  }
+
+  // One session run with logging; the error texts it received.
+  std::vector<std::string> Run(const std::vector<std::string>& properties, uint8_t recordType) {
+    std::vector<std::string> errors;
+    kvhost::HostClient host = Configured(properties, errors);
+    WaitForRecords(host, recordType, errors);
+    Terminate(host);
+    return errors;
+  }
+
+  fs::path LogPath(const std::string& name) const { return drive_.Native(kLogDirectory + name); }
+
+  // The only channel of a log file, with its bytes.
+  std::optional<std::pair<voradump::Channel, std::vector<uint8_t>>> OnlyChannel(const std::string& name) {
+    std::string error;
+    std::unique_ptr<voradump::VoraReader> reader = voradump::VoraReader::Open(LogPath(name).string(), error);
+    if (!reader) {
+      ADD_FAILURE() << name << ": " << error;
+      return std::nullopt;
+    }
+    const std::vector<voradump::Group> groups = reader->Groups();
+    if (groups.size() != 1 || groups[0].channels.size() != 1) {
+      ADD_FAILURE() << name << ": not one group with one channel";
+      return std::nullopt;
+    }
+    std::vector<uint8_t> bytes;
+    EXPECT_TRUE(reader->ReadBytes(groups[0].channels[0], bytes));
+    return std::make_pair(groups[0].channels[0], bytes);
+  }
+};
+
+struct BusCase {
+  const char* what;
+  std::vector<std::string> properties;  // the port and its settings
+  uint8_t recordType;
+  BinaryRecordLayout layout;
+  RecordBus bus;
+  std::map<uint32_t, uint32_t> recordSizes;  // identifier -> bytes of its record
+  int64_t protocol;
+  std::vector<uint32_t> rare{};  // identifiers that a short run may miss (bus errors once a second)
+};
+
+void PrintTo(const BusCase& c, std::ostream* os) { *os << c.what; }
+
+class VoraBusTest : public VoraOverTcpTest, public ::testing::WithParamInterface<BusCase> {};
+
+// The channel holds exactly the records of the binary log of the bus; the reader, vora-dump and
+// h5dump agree on names, properties and size.
+TEST_P(VoraBusTest, LogHoldsTheBusRecordsReadableByEveryReader) {
+  const BusCase& c = GetParam();
+  InstallLibrary();
+  std::vector<std::string> properties = c.properties;
+  for (const char* p : {"SET_PROP_LOGFILE_NAME=run", "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE_VORA_GROUP_NAME=Bus",
+                        "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=Frames", "SET_PROP_LOGFILE=1"}) {
+    properties.push_back(p);
+  }
+  EXPECT_TRUE(Run(properties, c.recordType).empty());
+
+  const auto channel = OnlyChannel("run.vora");
+  ASSERT_TRUE(channel);
+  const auto& [info, bytes] = *channel;
+  EXPECT_EQ(info.group, "Bus");
+  EXPECT_EQ(info.name, "Frames");
+  EXPECT_EQ(info.IntegerProperty("QV_network_frame_byte_order"), 0);
+  EXPECT_EQ(info.IntegerProperty("QV_network_frame_version"), 512);
+  EXPECT_EQ(info.IntegerProperty("QV_network_protocol"), c.protocol);
+  ASSERT_GT(bytes.size(), 0u);
+  EXPECT_TRUE(RecordsAreConsistent(bytes.data(), bytes.size(), c.layout, c.bus));
+
+  BinaryRecordReader reader(bytes.data(), bytes.size(), c.layout);
+  std::map<uint32_t, int> counted;
+  size_t records = 0;
+  for (RawFrameView frame; reader.next(frame); ++records) {
+    const auto size = c.recordSizes.find(frame.header.identifier);
+    ASSERT_NE(size, c.recordSizes.end()) << std::hex << frame.header.identifier;
+    EXPECT_EQ(BinaryRecordSize(c.layout, frame.header), size->second) << std::hex << frame.header.identifier;
+    ++counted[frame.header.identifier];
+  }
+  EXPECT_EQ(reader.remaining(), 0u);
+  for (const auto& [identifier, size] : c.recordSizes) {
+    if (std::find(c.rare.begin(), c.rare.end(), identifier) == c.rare.end()) {
+      EXPECT_GT(counted[identifier], 0) << std::hex << identifier;
+    }
+  }
+
+  // vora-dump decodes one text log line per record.
+  const std::string lines = Output(std::string(VORADUMP_PATH) + " --decode " + Quote(LogPath("run.vora")));
+  EXPECT_EQ(Count(lines, std::regex(R"((^|\n)\d\d:\d\d:\d\d,\d\d\d\t)")), records) << lines.substr(0, 400);
+
+  // h5dump, reading the file on its own: the group, the dataset of the channel's size, the properties.
+  const std::string header = Output(std::string(H5DUMP_PATH) + " -A " + Quote(LogPath("run.vora")));
+  EXPECT_NE(header.find("GROUP \"Bus\""), std::string::npos) << header;
+  EXPECT_NE(header.find("DATASET \"Frames\""), std::string::npos) << header;
+  EXPECT_NE(header.find("( " + std::to_string(bytes.size()) + " ) / ( H5S_UNLIMITED )"), std::string::npos) << header;
+  for (const auto& [name, value] : std::vector<std::pair<std::string, int64_t>>{
+           {"QV_network_frame_byte_order", 0}, {"QV_network_frame_version", 512}, {"QV_network_protocol", c.protocol}}) {
+    const std::string attribute = Output(std::string(H5DUMP_PATH) + " -a /Bus/Frames/" + name + " " + Quote(LogPath("run.vora")));
+    EXPECT_NE(attribute.find("(0): " + std::to_string(value) + "\n"), std::string::npos) << attribute;
+  }
+}
+
+constexpr uint32_t kExtended = 0x20000000;
+
+INSTANTIATE_TEST_SUITE_P(
+    DefaultHardware, VoraBusTest,
+    ::testing::Values(
+        BusCase{"ClassicCan", {"SET_PROP_SESSION_PORTNAME=CAN1"}, kvhost::kCanRecords, BinaryRecordLayout::kFixed24,
+                RecordBus::kCan, {{0x100, 24}, {0x1A0, 24}, {0x321, 24}, {kExtended | 0x18FEF100, 24}, {0, 24}}, 0, {0}},
+        BusCase{"CanFd", {"SET_PROP_SESSION_PORTNAME=CAN5"}, kvhost::kCanRecords, BinaryRecordLayout::kCanVariable,
+                RecordBus::kCan, {{0x200, 80}, {0x201, 32}, {kExtended | 0x1ABCDE00, 32}, {0x080, 24}}, 0},
+        BusCase{"Lin", {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
+                        "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"},
+                kvhost::kLinRecords, BinaryRecordLayout::kFixed24, RecordBus::kLin,
+                {{0x10, 24}, {0x11, 24}, {0x12, 24}, {0x13, 24}}, 2},
+        BusCase{"FlexRay", {"SET_PROP_SESSION_PORTNAME=FlexRay1"}, kvhost::kFlexRayRecords,
+                BinaryRecordLayout::kFlexRayVariable, RecordBus::kFlexRay, {{1, 32}, {2, 32}, {3, 24}, {40, 48}}, 1}),
+    [](const ::testing::TestParamInfo<BusCase>& info) { return std::string(info.param.what); });
+
+TEST_F(VoraOverTcpTest, MissingLibraryIsReportedOnceAndLoadedByALaterSessionOnceInstalled) {
+  const std::vector<std::string> properties = {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=late",
+                                               "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE=1"};
+  EXPECT_EQ(Run(properties, kvhost::kCanRecords), std::vector<std::string>{"<ERROR:LOG FILE: -24> \n"});
+  EXPECT_FALSE(fs::exists(LogPath("late.vora")));
+  InstallLibrary();
+  EXPECT_TRUE(Run(properties, kvhost::kCanRecords).empty());
+  const auto channel = OnlyChannel("late.vora");
+  ASSERT_TRUE(channel);
+  EXPECT_GT(channel->second.size(), 0u);
+  EXPECT_EQ(channel->second.size() % 24, 0u);
+}
+
+// Two sessions load the library together and write their own files at the same time.
+TEST_F(VoraOverTcpTest, TwoSessionsLogAtOnceEachToItsOwnFile) {
+  InstallLibrary();
+  std::vector<std::string> errors;
+  kvhost::HostClient can = Configured({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=can",
+                                       "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=CAN1",
+                                       "SET_PROP_LOGFILE=1"},
+                                      errors);
+  kvhost::HostClient lin = Configured({"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
+                                       "SET_PROP_LOGFILE_NAME=lin", "SET_PROP_LOGFILE_TYPE=2",
+                                       "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=LIN1", "SET_PROP_LOGFILE=1"},
+                                      errors);
+  WaitForRecords(can, kvhost::kCanRecords, errors);
+  WaitForRecords(lin, kvhost::kLinRecords, errors);
+  Terminate(can);
+  Terminate(lin);
+  EXPECT_TRUE(errors.empty());
+  for (const auto& [file, name, protocol, bus] : {std::tuple{"can.vora", "CAN1", 0, RecordBus::kCan},
+                                                  std::tuple{"lin.vora", "LIN1", 2, RecordBus::kLin}}) {
+    const auto channel = OnlyChannel(file);
+    ASSERT_TRUE(channel) << file;
+    EXPECT_EQ(channel->first.name, name);
+    EXPECT_EQ(channel->first.IntegerProperty("QV_network_protocol"), protocol);
+    EXPECT_GT(channel->second.size(), 0u);
+    EXPECT_TRUE(RecordsAreConsistent(channel->second.data(), channel->second.size(), BinaryRecordLayout::kFixed24, bus))
+        << file;
+  }
+}
+
+}  // namespace
+}  // namespace kvtest
