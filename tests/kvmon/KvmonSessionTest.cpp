@@ -1,0 +1,253 @@
+// kvmon as a child process against a service on the simulated hardware: JSON and text lines of the
+// default traffic, the live table on a pseudo-terminal, the hardware table, transmit, and the
+// controller's refusals in plain words.
+#include <netinet/in.h>
+#include <signal.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <map>
+#include <nlohmann/json.hpp>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "tests/kvmon/KvmonProcess.h"
+#include "tests/support/ServiceFixture.h"
+
+namespace kvtest {
+namespace {
+
+using nlohmann::json;
+
+constexpr auto kToolDeadline = 60s;  // a loaded machine runs the child slowly
+
+class KvmonSession : public ServiceFixture {
+ protected:
+  std::vector<std::string> Args(std::vector<std::string> args) const {
+    args.insert(args.begin(), {"-c", "127.0.0.1:" + std::to_string(port()), "-w", "30"});
+    return args;
+  }
+  KvmonProcess Start(const std::vector<std::string>& args) {
+    auto process = KvmonProcess::WithPipes(KVMON_PATH, Args(args));
+    EXPECT_TRUE(process.started());
+    return process;
+  }
+  // Ctrl-C: the tool must end its session and exit 0.
+  static void Interrupt(KvmonProcess& process) {
+    process.Signal(SIGINT);
+    EXPECT_EQ(process.WaitForExit(kToolDeadline), 0) << process.err();
+  }
+  void ExpectNoHostLeft() {
+    EXPECT_TRUE(WaitUntil([&] { return service().statistics().connectionsOpen.load() == 0; }));
+  }
+};
+
+// The complete JSON lines of `out`, each parsed (a line that is not JSON fails the test).
+std::vector<json> JsonObjects(const std::string& out) {
+  std::vector<json> objects;
+  auto lines = SplitLines(out);
+  if (!out.empty() && out.back() != '\n') lines.pop_back();  // still being written
+  for (const auto& line : lines) {
+    auto object = json::parse(line, nullptr, false);
+    EXPECT_FALSE(object.is_discarded()) << line;
+    if (!object.is_discarded()) objects.push_back(std::move(object));
+  }
+  return objects;
+}
+
+// The latest record of each "id/type" (FlexRay: "slot/channel").
+std::map<std::string, json> LatestRecords(const std::string& out) {
+  std::map<std::string, json> latest;
+  for (const auto& object : JsonObjects(out)) {
+    if (object["kind"] != "record") continue;
+    const std::string second = object.contains("channel") ? object["channel"].get<std::string>()
+                                                           : object["type"].get<std::string>();
+    latest[std::to_string(object["id"].get<uint32_t>()) + "/" + second] = object;
+  }
+  return latest;
+}
+
+bool SeenTwice(const std::map<std::string, json>& latest, const std::set<std::string>& keys) {
+  for (const auto& key : keys) {
+    auto found = latest.find(key);
+    if (found == latest.end() || found->second["count"].get<uint32_t>() < 2) return false;
+  }
+  return true;
+}
+
+bool HasStatistics(const std::string& out) {
+  for (const auto& object : JsonObjects(out)) {
+    if (object["kind"] == "statistics") return true;
+  }
+  return false;
+}
+
+TEST_F(KvmonSession, JsonLinesMatchTheDefaultTrafficOfCan1) {
+  auto kvmon = Start({"--json", "CAN1"});
+  const std::set<std::string> keys = {"256/data", "416/data", "801/remote", "419361024/data"};
+  ASSERT_TRUE(kvmon.ReadUntil([&](const std::string& out) { return SeenTwice(LatestRecords(out), keys) && HasStatistics(out); },
+                              kToolDeadline))
+      << kvmon.out() << kvmon.err();
+  const auto latest = LatestRecords(kvmon.out());
+  EXPECT_EQ(latest.size(), keys.size()) << "bus-error frames are not listed by default";
+
+  const json& counter = latest.at("256/data");
+  EXPECT_EQ(counter["length"], 8);
+  EXPECT_EQ(counter["data"].get<std::string>().substr(2), "01020304050607");
+  EXPECT_EQ(latest.at("416/data")["data"], "AABBCC");
+  EXPECT_EQ(latest.at("801/remote")["length"], 0);
+  EXPECT_EQ(latest.at("419361024/data")["extended"], true);
+  EXPECT_EQ(latest.at("419361024/data")["data"], "0011223344556677");
+  const std::map<std::string, double> periods = {
+      {"256/data", 10}, {"416/data", 50}, {"801/remote", 500}, {"419361024/data", 100}};
+  for (const auto& [key, period] : periods) {
+    EXPECT_NEAR(latest.at(key)["period_ms"].get<double>(), period, period * 0.2) << key;
+  }
+  for (const auto& object : JsonObjects(kvmon.out())) {
+    if (object["kind"] != "statistics") continue;
+    EXPECT_EQ(object["bus"], "CAN");
+    EXPECT_EQ(object["state"], "error active");
+    EXPECT_EQ(object["tec"], 0);
+  }
+  Interrupt(kvmon);
+  ExpectNoHostLeft();
+}
+
+struct BusCase {
+  std::vector<std::string> args;
+  std::set<std::string> keys;
+};
+
+TEST_F(KvmonSession, JsonLinesShowLinAndFlexRayTraffic) {
+  const BusCase cases[] = {
+      {{"--run-mode", "normal", "--baud", "19200", "LIN1"}, {"16/data", "17/data", "19/data"}},
+      {{"--no-response", "LIN2"}, {"16/data", "17/data", "18/no-resp", "19/data"}},
+      {{"--alias", "SimDB", "--cluster", "FlexRay", "FlexRay1"}, {"1/A", "1/B", "2/A", "3/A", "40/B"}},
+  };
+  for (const auto& c : cases) {
+    std::vector<std::string> args = {"--json"};
+    args.insert(args.end(), c.args.begin(), c.args.end());
+    auto kvmon = Start(args);
+    EXPECT_TRUE(kvmon.ReadUntil([&](const std::string& out) { return SeenTwice(LatestRecords(out), c.keys); },
+                                kToolDeadline))
+        << c.args.back() << ": " << kvmon.out() << kvmon.err();
+    EXPECT_EQ(LatestRecords(kvmon.out()).size(), c.keys.size()) << c.args.back();
+    Interrupt(kvmon);
+  }
+  ExpectNoHostLeft();
+}
+
+TEST_F(KvmonSession, TextLinesEndByThemselvesAfterTheAskedNumberOfReports) {
+  auto kvmon = Start({"-n", "2", "CAN1"});
+  ASSERT_EQ(kvmon.WaitForExit(kToolDeadline), 0) << kvmon.err();
+  size_t counterLines = 0, statisticsLines = 0;
+  for (const auto& line : SplitLines(kvmon.out())) {
+    if (line.find(" CAN1 100 data [8] ") != std::string::npos) ++counterLines;
+    if (line.find(" CAN1 statistics standard=") != std::string::npos) ++statisticsLines;
+  }
+  EXPECT_EQ(counterLines, 2u) << kvmon.out();
+  EXPECT_GE(statisticsLines, 1u) << kvmon.out();
+  ExpectNoHostLeft();
+}
+
+TEST_F(KvmonSession, TerminalShowsTheLiveTableAndCtrlCEndsTheSession) {
+  auto kvmon = KvmonProcess::OnTerminal(KVMON_PATH, Args({"CAN1"}), 100, 30);
+  ASSERT_TRUE(kvmon.started());
+  const std::string highlighted = "\x1b[1;31m";  // the counter byte of 0x100 changes every report
+  ASSERT_TRUE(kvmon.ReadUntil(
+      [&](const std::string& out) {
+        return out.find("18FEF100  data") != std::string::npos && out.find("error active") != std::string::npos &&
+               out.find(highlighted) != std::string::npos;
+      },
+      kToolDeadline))
+      << kvmon.out();
+  EXPECT_NE(kvmon.out().find("CAN1 on 127.0.0.1:"), std::string::npos);
+  EXPECT_NE(kvmon.out().find("321       remote     0"), std::string::npos) << kvmon.out();
+  EXPECT_NE(kvmon.out().find("1A0       data       3"), std::string::npos) << kvmon.out();
+  EXPECT_NE(kvmon.out().find("AA BB CC"), std::string::npos);
+  kvmon.Type("\x03");  // Ctrl-C typed on the terminal
+  EXPECT_EQ(kvmon.WaitForExit(kToolDeadline), 0) << kvmon.out();
+  EXPECT_NE(kvmon.out().find("\x1b[?25h"), std::string::npos) << "the cursor is shown again";
+  ExpectNoHostLeft();
+}
+
+TEST_F(KvmonSession, HardwareTableListsTheTenInterfacesForPeopleAndAsJson) {
+  auto table = Start({"--hardware"});
+  ASSERT_EQ(table.WaitForExit(kToolDeadline), 0) << table.err();
+  const auto lines = SplitLines(table.out());
+  ASSERT_EQ(lines.size(), 13u) << table.out();
+  EXPECT_NE(lines[0].find("driver version 21.5.0.3, 10 interfaces"), std::string::npos) << lines[0];
+  EXPECT_EQ(lines[3], "CAN1                 1  CAN      no");
+  EXPECT_EQ(lines[5], "CAN3                 3  CAN      yes");
+  EXPECT_EQ(lines[9], "LIN1                 1  LIN      -");
+  EXPECT_EQ(lines[12], "FlexRay2             2  FlexRay  -");
+
+  auto machine = Start({"--hardware", "--json"});
+  ASSERT_EQ(machine.WaitForExit(kToolDeadline), 0) << machine.err();
+  const auto objects = JsonObjects(machine.out());
+  ASSERT_EQ(objects.size(), 10u);
+  EXPECT_EQ(objects[5], json::parse(R"({"interface":"CAN6","port":6,"protocol":0,"bus":"CAN","can_fd":true})"));
+  EXPECT_EQ(objects[8], json::parse(R"({"interface":"FlexRay1","port":1,"protocol":1,"bus":"FlexRay","can_fd":false})"));
+}
+
+TEST_F(KvmonSession, TransmitFrameDefinedWithTxIsSeenOnTheOtherInterfaceOfTheBus) {
+  auto watcher = Start({"--json", "CAN4"});
+  auto sender = Start({"--run-mode", "normal", "--baud", "500000", "--tx", "123#11223344", "--tx-every", "20", "CAN3"});
+  EXPECT_TRUE(watcher.ReadUntil(
+      [](const std::string& out) {
+        auto latest = LatestRecords(out);
+        auto found = latest.find("291/data");
+        return found != latest.end() && found->second["data"] == "11223344" && found->second["count"] >= 2;
+      },
+      kToolDeadline))
+      << watcher.out() << watcher.err() << sender.err();
+  Interrupt(sender);
+  Interrupt(watcher);
+  ExpectNoHostLeft();
+}
+
+struct RefusalCase {
+  std::vector<std::string> args;
+  int exitCode;
+  std::string words;
+};
+
+TEST_F(KvmonSession, RefusalsOfTheControllerAreToldInPlainWords) {
+  const RefusalCase cases[] = {
+      {{"ETH1"}, 1, "the controller has no interface named 'ETH1'"},
+      {{"CAN9"}, 1, "could not open the session on CAN9: no such interface (status 0xBFF63040)"},
+      {{"--run-mode", "normal", "FlexRay1"}, 1, "needs a database: give --alias and --cluster"},
+      {{"--alias", "SimDB", "--cluster", "Nope", "CAN1"}, 1, "no such cluster in the database"},
+      {{"--stats-period", "500", "CAN1"}, 2, "--stats-period"},
+  };
+  for (const auto& c : cases) {
+    auto kvmon = Start(c.args);
+    EXPECT_EQ(kvmon.WaitForExit(kToolDeadline), c.exitCode) << c.args.back();
+    EXPECT_NE(kvmon.err().find(c.words), std::string::npos) << kvmon.err();
+    EXPECT_EQ(kvmon.err().find("<ERROR"), std::string::npos) << kvmon.err();
+  }
+}
+
+uint16_t PortWithoutListener() {
+  const int probe = socket(AF_INET, SOCK_STREAM, 0);
+  sockaddr_in address{};
+  address.sin_family = AF_INET;
+  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+  socklen_t size = sizeof address;
+  bind(probe, reinterpret_cast<sockaddr*>(&address), sizeof address);
+  getsockname(probe, reinterpret_cast<sockaddr*>(&address), &size);
+  close(probe);
+  return ntohs(address.sin_port);
+}
+
+TEST_F(KvmonSession, MissingControllerIsReportedAfterTheWait) {
+  auto kvmon = KvmonProcess::WithPipes(
+      KVMON_PATH, {"-c", "127.0.0.1:" + std::to_string(PortWithoutListener()), "-w", "0.5", "CAN1"});
+  EXPECT_EQ(kvmon.WaitForExit(kToolDeadline), 1);
+  EXPECT_NE(kvmon.err().find("cannot connect to the controller"), std::string::npos) << kvmon.err();
+  EXPECT_NE(kvmon.err().find("is it running?"), std::string::npos) << kvmon.err();
+}
+
+}  // namespace
+}  // namespace kvtest
