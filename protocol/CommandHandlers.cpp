@@ -21,7 +21,7 @@ int32_t Heartbeat(HostConnection& connection) {
   return 0;
 }
 
-std::array<CommandHandler, kCommandCount> MakeHandlers() {
+constexpr std::array<CommandHandler, kCommandCount> MakeHandlers() {
   std::array<CommandHandler, kCommandCount> handlers{};
   handlers.fill(&Unanswered);
   handlers[kCommandSessionStart] = &StartSession;
@@ -36,7 +36,8 @@ std::array<CommandHandler, kCommandCount> MakeHandlers() {
   return handlers;
 }
 
-const std::array<CommandHandler, kCommandCount> kHandlers = MakeHandlers();
+// Built at compile time: the service thread may run before the module's dynamic initialisers.
+constexpr std::array<CommandHandler, kCommandCount> kHandlers = MakeHandlers();
 
 }  // namespace
 

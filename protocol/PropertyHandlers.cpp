@@ -28,13 +28,18 @@ PropertyHandlerTable MakeHandlers() {
   return handlers;
 }
 
-const PropertyHandlerTable kHandlers = MakeHandlers();
+// Built on first use, not by a static initialiser: the module's service thread starts before the
+// module's other static objects are constructed.
+const PropertyHandlerTable& Handlers() {
+  static const PropertyHandlerTable handlers = MakeHandlers();
+  return handlers;
+}
 
 }  // namespace
 
 PropertyHandler PropertyHandlerFor(int32_t id) {
   if (id <= kPropertyUnknown || id >= kPropertyCount) return &Unanswered;
-  return kHandlers[static_cast<size_t>(id)];
+  return Handlers()[static_cast<size_t>(id)];
 }
 
 }  // namespace nKV_DLL300
