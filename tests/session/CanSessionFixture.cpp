@@ -95,7 +95,9 @@ kvhost::HostClient CanSessionTest::StartedHost(
   if (configure) configure(connection.settings);
   auto reply = Command(host, "CMD_SESSION_START");
   EXPECT_TRUE(reply.has_value());
-  if (reply) EXPECT_EQ(reply->text(), "<ACK: CMD_SESSION_START>\n");
+  if (reply) {
+    EXPECT_EQ(reply->text(), "<ACK: CMD_SESSION_START>\n");
+  }
   return host;
 }
 
