@@ -4,7 +4,6 @@
 #include <set>
 
 #include "driver/Properties.h"
-#include "service/HostConnection.h"
 #include "tests/linfr/LinFlexRayFixture.h"
 
 namespace kvtest {
@@ -118,16 +117,6 @@ TEST_P(LinModeTest, ScheduleShowsOneEntryPerAnsweredIdentifier) {
 
 INSTANTIATE_TEST_SUITE_P(Modes, LinModeTest, ::testing::ValuesIn(kModes),
                          [](const auto& info) { return std::string(info.param.name); });
-
-TEST_F(LinFlexRayTest, DatabaseModeTakesTheClusterBaudRate) {
-  kvhost::HostClient host = StartedHost({kPort, kNormal, "SET_PROP_SESSION_BAUDRATE=9600",
-                                         "SET_PROP_SESSION_ALIAS=SimDB",
-                                         "SET_PROP_SESSION_CLUSTER=LIN"});
-  EXPECT_EQ(service().connections.at(0).connection->settings.baudRate.load(), 19200u);
-  EXPECT_TRUE(RecordsWhere(host, kvhost::kLinRecords, [](const BusRecords& m) {
-    return Has(m, {0x10, 0x11, 0x13});
-  }));
-}
 
 TEST_F(LinFlexRayTest, NoResponseFramesAndChecksumsAsTheDriverSendsThem) {
   kvhost::HostClient host =
