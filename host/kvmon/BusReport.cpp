@@ -59,7 +59,7 @@ BusReport LinReport(const kvhost::LinStatisticsView& s) {
   if (s.stateBits4to7 != 0) {
     char id[8];
     std::snprintf(id, sizeof id, "%02X", s.stateBits8to15);
-    report.state.push_back(Words("last_error_id", "on", id));
+    report.state.push_back(Words("last_error_id", "on identifier", id));
   }
   if (s.stateBit1) report.state.push_back(Words("sleep", "", "sleeping"));
   return report;

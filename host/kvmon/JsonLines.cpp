@@ -82,7 +82,7 @@ std::string JsonLines::StatisticsObject(const std::string& interfaceName, const 
   return object + Field("fault", std::to_string(report.faultCode)) + "}";
 }
 
-void JsonLines::ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records) {
+void JsonLines::ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, size_t) {
   for (const auto& record : records) Write(RecordObject(interfaceName_, bus, record));
   if (std::fflush(out_) != 0) failed_ = true;
 }

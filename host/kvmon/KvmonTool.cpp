@@ -104,7 +104,7 @@ class SessionMessages {
                          : bus == Bus::kLin ? kvhost::DecodeLinRecords(message.payload, count)
                                             : kvhost::DecodeFlexRayRecords(message.payload, count);
     if (records) {
-      display_.ShowRecords(bus, *records);
+      display_.ShowRecords(bus, *records, message.payload.size());
     } else {
       display_.ShowNotice("a malformed identifier report of the controller was skipped");
     }

@@ -3,10 +3,23 @@
 
 namespace kvmon {
 
-void LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records) {
-  std::map<RowKey, std::vector<uint8_t>> payloads;
-  std::vector<LiveRow> rows;
-  rows.reserve(records.size());
+namespace {
+
+// The largest message payload of the controller, less the largest record (CAN: 28 bytes and a
+// J1939 payload of 2047): a message this long may have been cut at the buffer's end.
+constexpr size_t kFullMessage = 100000 - (28 + 2047);
+
+}  // namespace
+
+void LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records, size_t payloadBytes) {
+  const bool continues = lastMessageBytes_ >= kFullMessage && !rows_.empty() && !records.empty() &&
+                         records.front().identifier >= rows_.back().record.identifier;
+  lastMessageBytes_ = payloadBytes;
+  if (!continues) {
+    lastPayloads_ = std::move(payloads_);
+    payloads_.clear();
+    rows_.clear();
+  }
   for (const auto& record : records) {
     const RowKey key = KeyOf(bus_, record);
     LiveRow row;
@@ -19,11 +32,9 @@ void LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records) {
         row.changed[i] = i >= before->second.size() || before->second[i] != record.payload[i];
       }
     }
-    payloads[key] = record.payload;
-    rows.push_back(std::move(row));
+    payloads_[key] = record.payload;
+    rows_.push_back(std::move(row));
   }
-  rows_ = std::move(rows);
-  lastPayloads_ = std::move(payloads);
 }
 
 }  // namespace kvmon

@@ -21,9 +21,12 @@ class LiveTable {
  public:
   explicit LiveTable(Bus bus) : bus_(bus) {}
 
-  // Takes one report (the controller sends its whole table, sorted by identifier) and makes it
-  // the rows. Identifiers missing from it (after a reset on the controller) are forgotten.
-  void Update(const std::vector<kvhost::IdentifierRecord>& records);
+  // Takes one record message of `payloadBytes` bytes. The controller sends its whole table,
+  // sorted by identifier, as one message of at most 100000 bytes, or as several when it needs
+  // more: a message continues the report before it when that one was full and this one goes on in
+  // identifier order. A new report replaces the rows; identifiers missing from it (after a reset
+  // on the controller) are forgotten.
+  void Update(const std::vector<kvhost::IdentifierRecord>& records, size_t payloadBytes = 0);
 
   const std::vector<LiveRow>& rows() const { return rows_; }
   Bus bus() const { return bus_; }
@@ -31,7 +34,9 @@ class LiveTable {
  private:
   Bus bus_;
   std::vector<LiveRow> rows_;
-  std::map<RowKey, std::vector<uint8_t>> lastPayloads_;
+  std::map<RowKey, std::vector<uint8_t>> lastPayloads_;  // of the report before the current one
+  std::map<RowKey, std::vector<uint8_t>> payloads_;      // of the current report so far
+  size_t lastMessageBytes_ = 0;
 };
 
 }  // namespace kvmon

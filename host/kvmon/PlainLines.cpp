@@ -63,7 +63,7 @@ std::string PlainLines::StatisticsLine(const std::string& interfaceName, const s
   return line;
 }
 
-void PlainLines::ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records) {
+void PlainLines::ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, size_t) {
   for (const auto& record : records) Write(RecordLine(interfaceName_, bus, record));
   if (std::fflush(out_) != 0) failed_ = true;
 }

@@ -18,7 +18,7 @@ class PlainLines : public Display {
   PlainLines(std::string interfaceName, std::FILE* out, std::FILE* err)
       : interfaceName_(std::move(interfaceName)), out_(out), err_(err) {}
 
-  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records) override;
+  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, size_t messageBytes) override;
   void ShowStatistics(const BusReport& report) override;
   void ShowNotice(const std::string& words) override;
   bool failed() const override { return failed_; }

@@ -52,16 +52,22 @@ std::string TerminalView::RowLine(const LiveRow& row, int columns) const {
   const auto& r = row.record;
   std::string line = Columns(IdentifierText(table_.bus(), r), FrameTypeName(table_.bus(), r.type),
                              std::to_string(r.payloadLength), std::to_string(r.count), PeriodText(r));
-  const int room = std::max(columns - kFixedColumns, 8);
-  size_t shown = std::min<size_t>(r.payload.size(), static_cast<size_t>((room + 1) / 3));
-  if (shown < r.payload.size() && shown > 0) --shown;  // room for the "+N" mark
+  // The payload gets the columns left of the last one; a cut payload ends in "+N" (at most " +2047").
+  constexpr int kMarkRoom = 6;
+  constexpr int kLeastRoom = kMarkRoom + 2;  // one byte and the mark
+  const int room = columns - 1 - kFixedColumns;
+  const bool narrow = room < kLeastRoom;  // plain text, cut at the window's edge
+  size_t shown = r.payload.size();
+  if (narrow || shown * 3 > static_cast<size_t>(room + 1)) {
+    shown = narrow ? shown : static_cast<size_t>((room + 1 - kMarkRoom) / 3);
+  }
   for (size_t i = 0; i < shown; ++i) {
     if (i > 0) line += ' ';
     const std::string hex = HexBytes({r.payload[i]}, "");
-    line += row.changed[i] ? std::string(kChanged) + hex + kReset : hex;
+    line += row.changed[i] && !narrow ? std::string(kChanged) + hex + kReset : hex;
   }
   if (shown < r.payload.size()) line += " +" + std::to_string(r.payload.size() - shown);
-  return line;
+  return narrow ? Fit(line, columns) : line;
 }
 
 std::string TerminalView::RatesLine() const {
@@ -116,8 +122,8 @@ void TerminalView::Draw() {
   if (std::fwrite(screen.data(), 1, screen.size(), out_) != screen.size() || std::fflush(out_) != 0) failed_ = true;
 }
 
-void TerminalView::ShowRecords(Bus, const std::vector<kvhost::IdentifierRecord>& records) {
-  table_.Update(records);
+void TerminalView::ShowRecords(Bus, const std::vector<kvhost::IdentifierRecord>& records, size_t messageBytes) {
+  table_.Update(records, messageBytes);
   Draw();
 }
 

@@ -2,6 +2,7 @@
 // and the line formats of records and statistics.
 #include <gtest/gtest.h>
 
+#include <cctype>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -11,6 +12,7 @@
 #include "host/kvmon/LiveTable.h"
 #include "host/kvmon/PlainLines.h"
 #include "host/kvmon/PlainWords.h"
+#include "host/kvmon/TerminalView.h"
 
 namespace kvmon {
 namespace {
@@ -64,6 +66,60 @@ TEST(KvmonLiveTable, ChangedBytesAreMarkedAgainstThePreviousReportOfTheSameRow) 
   EXPECT_EQ(table.rows()[0].changed, (std::vector<bool>{false, true, false, true}));
   EXPECT_TRUE(table.rows()[1].fresh);
   EXPECT_EQ(table.rows()[2].changed, (std::vector<bool>{false}));
+}
+
+TEST(KvmonLiveTable, AFullMessageIsContinuedByTheNextInIdentifierOrder) {
+  constexpr size_t kFullMessageBytes = 100000;
+  LiveTable table(Bus::kCan);
+  table.Update({Record(0x100, {1}), Record(0x200, {2})}, kFullMessageBytes);
+  table.Update({Record(0x300, {3})}, 40);  // the rest of the same report
+  ASSERT_EQ(table.rows().size(), 3u);
+  EXPECT_EQ(table.rows()[2].record.identifier, 0x300u);
+
+  table.Update({Record(0x100, {9}), Record(0x200, {2})}, kFullMessageBytes);  // the next report
+  table.Update({Record(0x300, {4})}, 40);
+  ASSERT_EQ(table.rows().size(), 3u);
+  EXPECT_EQ(table.rows()[0].changed, (std::vector<bool>{true}));
+  EXPECT_EQ(table.rows()[2].changed, (std::vector<bool>{true}));
+
+  table.Update({Record(0x100, {9})}, 40);  // after a short message every message is a new report
+  table.Update({Record(0x300, {4})}, 40);
+  ASSERT_EQ(table.rows().size(), 1u);
+  EXPECT_EQ(table.rows()[0].record.identifier, 0x300u);
+}
+
+// A line as the terminal shows it: without escape sequences.
+std::string Visible(const std::string& line) {
+  std::string text;
+  for (size_t i = 0; i < line.size(); ++i) {
+    if (line[i] == '\x1b') {
+      while (i < line.size() && !std::isalpha(static_cast<unsigned char>(line[i]))) ++i;
+      continue;
+    }
+    text += line[i];
+  }
+  return text;
+}
+
+TEST(KvmonTerminalView, LongPayloadsAreCutToTheWindowWithTheCountOfHiddenBytes) {
+  std::FILE* screen = std::fopen("/dev/null", "w");
+  ASSERT_NE(screen, nullptr);
+  TerminalView view(Bus::kCan, "CAN5 on test", screen, nullptr);
+  std::vector<uint8_t> ramp(64);
+  for (size_t i = 0; i < ramp.size(); ++i) ramp[i] = static_cast<uint8_t>(i);
+  view.ShowRecords(Bus::kCan, {Record(0x200, ramp, 2)}, 0);
+  for (const int columns : {40, 60, 80, 96, 132, 240}) {
+    const auto lines = view.Lines(TerminalSize{columns, 24});
+    for (const auto& line : lines) EXPECT_LT(Visible(line).size(), static_cast<size_t>(columns)) << Visible(line);
+    const std::string row = Visible(lines[2]);
+    EXPECT_EQ(row.rfind("200 ", 0), 0u) << row;
+    if (columns >= 60 && columns < 240) {  // narrower windows cut the row before the payload
+      EXPECT_NE(row.find(" +"), std::string::npos) << row;
+    }
+  }
+  const std::string whole = Visible(view.Lines(TerminalSize{240, 24})[2]);
+  EXPECT_NE(whole.find("3D 3E 3F"), std::string::npos) << whole;
+  std::fclose(screen);
 }
 
 std::vector<uint8_t> Words(const std::vector<uint32_t>& words) {
