@@ -256,37 +256,72 @@ bool SetSeconds(std::FILE* err, const char* option, const char* text, double& ta
   return true;
 }
 
+// Session options that switch a property on (value 1).
+struct FlagOption {
+  int code;
+  const char* property;
+};
+constexpr FlagOption kFlagOptions[] = {
+    {kJ1939, "SET_PROP_SESSION_APPLICATION_PROTOCOL"},  {kListenOnly, "SET_PROP_SESSION_LISTEN_ONLY"},
+    {kBusErrors, "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES"}, {kEcho, "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES"},
+    {kNullFrames, "SET_PROP_SESSION_SHOW_NULL_FRAMES"},    {kNoResponse, "SET_PROP_SESSION_NO_RESPONSE_FRAMES"},
+    {kTermination, "SET_PROP_SESSION_TERMINATION"},        {kLogChecksum, "SET_PROP_SESSION_LOG_CHECKSUM"},
+};
+
+// Session options with a number, checked against the range the controller accepts.
+struct NumberOption {
+  int code;
+  const char* option;
+  const char* property;
+  uint64_t min, max;
+};
+constexpr NumberOption kNumberOptions[] = {
+    {'b', "baud", "SET_PROP_SESSION_BAUDRATE", 1, 100000000},
+    {kFdBaud, "fd-baud", "SET_PROP_SESSION_CANFD_BAUDRATE", 1, 100000000},
+    {kIsoFd, "iso-fd", "SET_PROP_SESSION_ISOFD_MODE", 0, INT32_MAX},
+    {kNodeAddress, "node-address", "SET_PROP_SESSION_NODE_ADDRESS", 0, 255},
+    {kNodeName, "node-name", "SET_PROP_SESSION_NODE_NAME", 0, UINT64_MAX},
+    {kTransceiver, "transceiver", "SET_PROP_SESSION_TRANSCEIVER_TYPE", 0, 4},
+    {kKeySlot, "key-slot", "SET_PROP_SESSION_KEY_SLOT", 0, 0xFFFFFFFE},
+    {kDataPeriod, "data-period", "SET_PROP_TX_TIME_DATA", 1, INT32_MAX},
+    {kStatsPeriod, "stats-period", "SET_PROP_TX_TIME_STATISTIC", 1000, INT32_MAX},
+    {kTableSize, "table-size", "SET_PROP_DATA_LOG_IDS_MAX", 1, 65535},
+};
+
+// Session options with a name.
+struct TextOption {
+  int code;
+  const char* option;
+  const char* property;
+};
+constexpr TextOption kTextOptions[] = {
+    {kAlias, "alias", "SET_PROP_SESSION_ALIAS"},
+    {kCluster, "cluster", "SET_PROP_SESSION_CLUSTER"},
+    {kLogName, "log-name", "SET_PROP_LOGFILE_NAME"},
+    {kLogGroup, "log-group", "SET_PROP_LOGFILE_VORA_GROUP_NAME"},
+    {kLogChannel, "log-channel", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME"},
+};
+
 // Session options; false on a bad value (reported).
 bool ApplySessionOption(int code, const char* arg, Collected& c, std::FILE* err) {
-  switch (code) {
-    case 'm': return SetRunMode(c, err, arg);
-    case 'b': return AddNumber(c, err, "baud", "SET_PROP_SESSION_BAUDRATE", arg, 1, 100000000);
-    case kFdBaud: return AddNumber(c, err, "fd-baud", "SET_PROP_SESSION_CANFD_BAUDRATE", arg, 1, 100000000);
-    case kIoMode: return AddIoMode(c, err, arg);
-    case kIsoFd: return AddNumber(c, err, "iso-fd", "SET_PROP_SESSION_ISOFD_MODE", arg, 0, INT32_MAX);
-    case kAlias: c.alias = arg ? arg : ""; return AddText(c, err, "alias", "SET_PROP_SESSION_ALIAS", arg);
-    case kCluster: c.cluster = arg ? arg : ""; return AddText(c, err, "cluster", "SET_PROP_SESSION_CLUSTER", arg);
-    case kJ1939: c.properties.push_back("SET_PROP_SESSION_APPLICATION_PROTOCOL=1"); return true;
-    case kNodeAddress: return AddNumber(c, err, "node-address", "SET_PROP_SESSION_NODE_ADDRESS", arg, 0, 255);
-    case kNodeName: return AddNumber(c, err, "node-name", "SET_PROP_SESSION_NODE_NAME", arg, 0, UINT64_MAX);
-    case kListenOnly: c.properties.push_back("SET_PROP_SESSION_LISTEN_ONLY=1"); return true;
-    case kBusErrors: c.properties.push_back("SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1"); return true;
-    case kEcho: c.properties.push_back("SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=1"); return true;
-    case kNullFrames: c.properties.push_back("SET_PROP_SESSION_SHOW_NULL_FRAMES=1"); return true;
-    case kNoResponse: c.properties.push_back("SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"); return true;
-    case kTermination: c.properties.push_back("SET_PROP_SESSION_TERMINATION=1"); return true;
-    case kTransceiver: return AddNumber(c, err, "transceiver", "SET_PROP_SESSION_TRANSCEIVER_TYPE", arg, 0, 4);
-    case kKeySlot: return AddNumber(c, err, "key-slot", "SET_PROP_SESSION_KEY_SLOT", arg, 0, 0xFFFFFFFE);
-    case kDataPeriod: return AddNumber(c, err, "data-period", "SET_PROP_TX_TIME_DATA", arg, 1, INT32_MAX);
-    case kStatsPeriod: return AddNumber(c, err, "stats-period", "SET_PROP_TX_TIME_STATISTIC", arg, 1000, INT32_MAX);
-    case kTableSize: return AddNumber(c, err, "table-size", "SET_PROP_DATA_LOG_IDS_MAX", arg, 1, 65535);
-    case 'l': return AddLogType(c, err, arg);
-    case kLogName: return AddText(c, err, "log-name", "SET_PROP_LOGFILE_NAME", arg);
-    case kLogGroup: return AddText(c, err, "log-group", "SET_PROP_LOGFILE_VORA_GROUP_NAME", arg);
-    case kLogChannel: return AddText(c, err, "log-channel", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME", arg);
-    case kLogChecksum: c.properties.push_back("SET_PROP_SESSION_LOG_CHECKSUM=1"); return true;
-    default: return Fail(err, "unknown option");
+  for (const auto& flag : kFlagOptions) {
+    if (flag.code == code) {
+      c.properties.push_back(std::string(flag.property) + "=1");
+      return true;
+    }
   }
+  for (const auto& n : kNumberOptions) {
+    if (n.code == code) return AddNumber(c, err, n.option, n.property, arg, n.min, n.max);
+  }
+  if (code == kAlias) c.alias = arg ? arg : "";
+  if (code == kCluster) c.cluster = arg ? arg : "";
+  for (const auto& t : kTextOptions) {
+    if (t.code == code) return AddText(c, err, t.option, t.property, arg);
+  }
+  if (code == 'm') return SetRunMode(c, err, arg);
+  if (code == kIoMode) return AddIoMode(c, err, arg);
+  if (code == 'l') return AddLogType(c, err, arg);
+  return Fail(err, "unknown option");
 }
 
 // Connection, output and transmit options; nullopt when `code` is a session option.
