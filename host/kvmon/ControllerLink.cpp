@@ -1,6 +1,7 @@
 // Connecting with retries, request and reply, and the heartbeat of kvmon.
 #include "host/kvmon/ControllerLink.h"
 
+#include <cstdio>
 #include <string_view>
 #include <thread>
 
@@ -43,12 +44,15 @@ std::optional<ControllerLink> ControllerLink::Open(const std::string& host, uint
   kvhost::HostClient client;
   const auto deadline = Clock::now() + std::chrono::duration_cast<Clock::duration>(
                                            std::chrono::duration<double>(waitSeconds));
+  bool announced = false;
   while (!client.Connect(host, port)) {
     if (Clock::now() >= deadline || gStopRequested || client.error().rfind("not an IPv4", 0) == 0) {
       error = "cannot connect to the controller at " + Where(host, port) + ": " + client.error() +
               " (is it running? it listens 10 s after its start)";
       return std::nullopt;
     }
+    if (!announced) std::fprintf(stderr, "kvmon: waiting for the controller at %s to listen ...\n", Where(host, port).c_str());
+    announced = true;
     std::this_thread::sleep_for(kConnectRetry);
   }
   auto greeting = client.Receive(kReplyDeadline);
