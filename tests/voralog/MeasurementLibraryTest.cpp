@@ -239,10 +239,4 @@ TEST_F(MeasurementLibraryTest, ConcurrentFirstLoadsLoadTheLibraryOnce) {
   if (still != nullptr) dlclose(still);
 }
 
-TEST_F(MeasurementLibraryTest, UnloadOfALibraryNotLoadedDoesNothing) {
-  library_.Locate();
-  EXPECT_EQ(ThrownCode([&] { library_.Unload(); }), 0);
-  EXPECT_FALSE(library_.loaded());
-}
-
 }  // namespace

@@ -196,24 +196,6 @@ TEST_F(VoraLogTest, GroupAndChannelNamesReachTheFileUnchanged) {
   EXPECT_EQ(VoraChannelPath("", ""), "/''/''");
 }
 
-TEST_F(VoraLogTest, MissingLibraryReportsOnceAndIsLoadedByALaterRunOnceInstalled) {
-  settings().logFileName.Set("late");
-  RunWith({Batch({{.identifier = 0x100}}), Batch({{.identifier = 0x100}})});
-  EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogLibraryFailed)});
-  EXPECT_EQ(session().lastStatus.load(), kLogLibraryFailed);
-  EXPECT_FALSE(fs::exists(ServiceDirectory() / "late.vora"));
-
-  RunWith({Batch({{.identifier = 0x100}})});
-  EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogLibraryFailed)});
-
-  InstallLibrary();
-  RunWith({Batch({{.identifier = 0x100}})});
-  EXPECT_TRUE(SentMessages().empty());
-  const std::optional<ChannelContents> contents = OnlyChannel("late.vora");
-  ASSERT_TRUE(contents);
-  EXPECT_EQ(contents->bytes.size(), 24u);
-}
-
 // A file the library cannot create (its directory is a file) is silent: the run logs nothing.
 TEST_F(VoraLogTest, FileTheLibraryCannotOpenIsSilentAndSkipsTheRun) {
   InstallLibrary();
