@@ -30,7 +30,9 @@ constexpr uint64_t kDataBaudRate = 2000000;
 std::string Describe(const tarvix::CallRecord& call) {
   char line[160];
   uint64_t value = 0;
-  std::memcpy(&value, call.value.data(), std::min<size_t>(call.value.size(), sizeof value));
+  if (!call.value.empty()) {
+    std::memcpy(&value, call.value.data(), std::min<size_t>(call.value.size(), sizeof value));
+  }
   if (call.operation == "kxdbSetProperty" && call.id == driver::kPropFrameCyclicRate) {
     double seconds = 0;
     std::memcpy(&seconds, &value, sizeof seconds);
