@@ -46,7 +46,8 @@ int32_t HandleCommand(HostConnection& connection, std::string_view text) {
 int32_t HandleMessageText(HostConnection& connection, std::string_view text) {
   bool txProperty = text.starts_with(kTxPropertyPrefix);
   // Transmit properties belong to a CAN session's frame; without one they are dropped.
-  if (txProperty && (!connection.session || connection.busType.load() != kCanBus)) return 0;
+  // The session's own kind counts, not a port name set while it runs.
+  if (txProperty && (!connection.session || connection.session->busType != kCanBus)) return 0;
   if (txProperty || text.starts_with(kPropertyPrefix)) return HandleProperty(connection, text);
   return HandleCommand(connection, text);
 }

@@ -20,13 +20,8 @@ uint32_t BusTypeOfPort(std::string_view portName) {
 
 void PortName(HostConnection& connection, std::string_view value) {
   uint32_t busType = BusTypeOfPort(value);
-  // busType must keep describing a live session: transmit, refusals and report headers depend on
-  // it. A name of another kind while a session runs is refused and changes nothing; a name of
-  // the same kind is stored for the next session.
-  if (connection.session && !value.empty() && busType != connection.busType.load()) {
-    SendPropertyReply(connection, "<ERROR: WRONG PORT NAME>\n", kNone);
-    return;
-  }
+  // A name of another bus while a session runs is taken for the next session: the live session
+  // keeps its own kind (CBusSystem::busType), and its commands, refusals and transmit follow that.
   connection.settings.portName.Set(value);
   connection.settings.interfaceName.Set(std::string(value).append(kInterfaceSuffix));
   if (value.empty()) {

@@ -57,7 +57,8 @@ void Answer(HostConnection& connection, const LockedRule& rule, bool accepted,
     SendPropertyReply(connection, FillReply(rule.acknowledgement, shown), ReplySession::kNone);
     return;
   }
-  std::string_view bus = BusWord(connection.busType.load());
+  // The refusal names the live session's bus, whatever port name was set since it started.
+  std::string_view bus = BusWord(connection.session->busType);
   if (bus.empty()) return;
   std::string refusal = "<ERROR: ";
   refusal.append(rule.name).append(": ").append(bus).append(" Session yet created>\n");

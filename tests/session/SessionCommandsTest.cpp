@@ -171,7 +171,12 @@ TEST_F(CanSessionTest, RejectedBaudRateFailsTheStart) {
 
 TEST_F(CanSessionTest, AnotherPortNameKeepsTheRunningSessionsKind) {
   kvhost::HostClient host = StartedHost(0, "CAN1");
-  ConnectionAt(0).busType.store(nKV_DLL300::kBusTypeLin);  // what SET_PROP_SESSION_PORTNAME=LIN1 does
+  auto renamed = Command(host, "SET_PROP_SESSION_PORTNAME=LIN1");
+  ASSERT_TRUE(renamed.has_value());
+  EXPECT_EQ(renamed->text(), "<ACK: SET_PROP_SESSION_PORTNAME LIN1>");
+  auto refused = Command(host, "SET_PROP_SESSION_LISTEN_ONLY=1");
+  ASSERT_TRUE(refused.has_value());
+  EXPECT_EQ(refused->text(), "<ERROR: SET_PROP_SESSION_LISTEN_ONLY: CAN Session yet created>\n");
   auto again = Command(host, "CMD_SESSION_START");
   ASSERT_TRUE(again.has_value());
   EXPECT_EQ(again->text(), "<ERROR: CAN session is already started>\n");

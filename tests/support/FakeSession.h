@@ -11,7 +11,9 @@ class FakeSession : public nKV_DLL300::CBusSystem {
     int stops = 0;
     bool destroyed = false;
   };
-  FakeSession(nKV_DLL300::HostConnection* owner, Calls& calls) : CBusSystem(owner), calls_(calls) {}
+  FakeSession(nKV_DLL300::HostConnection* owner, Calls& calls,
+              uint32_t kind = nKV_DLL300::kBusTypeCan)
+      : CBusSystem(owner, kind), calls_(calls) {}
   ~FakeSession() override { calls_.destroyed = true; }
   int32_t pollOnce() override { return 0; }
   int32_t stop() override {
