@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <ctime>
 #include <random>
+#include <vector>
 
 namespace nKV_DLL300 {
 namespace {
@@ -32,20 +33,17 @@ const DateCase kDates[] = {
     {"LargestConvertible", 0x7FFF'FFFF'FFFF'FFFFull, {30828, 9, 4, 14, 2, 48, 5, 477}},
 };
 
+// year, month, dayOfWeek, day, hour, minute, second, ms
+std::vector<int64_t> Fields(const CalendarTime& t) {
+  return {t.year, t.month, t.dayOfWeek, t.day, t.hour, t.minute, t.second, t.milliseconds};
+}
+
 class FileTimeDates : public testing::TestWithParam<DateCase> {};
 
 TEST_P(FileTimeDates, ConvertsToExpectedCalendarFields) {
   CalendarTime t{};
   ASSERT_TRUE(FileTimeToCalendarTime(GetParam().fileTime, t));
-  const CalendarTime& e = GetParam().expected;
-  EXPECT_EQ(t.year, e.year);
-  EXPECT_EQ(t.month, e.month);
-  EXPECT_EQ(t.dayOfWeek, e.dayOfWeek);
-  EXPECT_EQ(t.day, e.day);
-  EXPECT_EQ(t.hour, e.hour);
-  EXPECT_EQ(t.minute, e.minute);
-  EXPECT_EQ(t.second, e.second);
-  EXPECT_EQ(t.milliseconds, e.milliseconds);
+  EXPECT_EQ(Fields(t), Fields(GetParam().expected));
 }
 
 INSTANTIATE_TEST_SUITE_P(Dates, FileTimeDates, testing::ValuesIn(kDates),
@@ -74,14 +72,9 @@ TEST(FileTime, AgreesWithCLibraryUtcCalendarFrom1601To9999) {
     ASSERT_NE(gmtime_r(&asTimeT, &tm), nullptr);
     CalendarTime t{};
     ASSERT_TRUE(FileTimeToCalendarTime(fileTime, t));
-    ASSERT_EQ(t.year, tm.tm_year + 1900) << unixSeconds;
-    ASSERT_EQ(t.month, tm.tm_mon + 1) << unixSeconds;
-    ASSERT_EQ(t.day, tm.tm_mday) << unixSeconds;
-    ASSERT_EQ(t.dayOfWeek, tm.tm_wday) << unixSeconds;
-    ASSERT_EQ(t.hour, tm.tm_hour) << unixSeconds;
-    ASSERT_EQ(t.minute, tm.tm_min) << unixSeconds;
-    ASSERT_EQ(t.second, tm.tm_sec) << unixSeconds;
-    ASSERT_EQ(t.milliseconds, ms) << unixSeconds;
+    ASSERT_EQ(Fields(t), (std::vector<int64_t>{tm.tm_year + 1900, tm.tm_mon + 1, tm.tm_wday, tm.tm_mday,
+                                                tm.tm_hour, tm.tm_min, tm.tm_sec, static_cast<int64_t>(ms)}))
+        << unixSeconds;
   }
 }
 

@@ -37,6 +37,13 @@ inline void AppendFrame(std::vector<uint8_t>& batch, const FrameSpec& f, uint8_t
   }
 }
 
+// `count` bytes counting up from `first`.
+inline std::vector<uint8_t> Counting(size_t count, uint8_t first = 0) {
+  std::vector<uint8_t> bytes(count);
+  for (size_t i = 0; i < count; ++i) bytes[i] = static_cast<uint8_t>(first + i);
+  return bytes;
+}
+
 inline std::vector<uint8_t> Batch(std::initializer_list<FrameSpec> frames) {
   std::vector<uint8_t> batch;
   for (const FrameSpec& f : frames) AppendFrame(batch, f);

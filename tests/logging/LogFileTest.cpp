@@ -5,6 +5,8 @@
 
 #include <csignal>
 #include <filesystem>
+#include <functional>
+#include <tuple>
 
 #include "logging/LogFileName.h"
 #include "logging/LogWriters.h"
@@ -32,13 +34,6 @@ std::vector<std::string> FilesBelow(const fs::path& root) {
   return files;
 }
 
-TEST(LogFileExtensionTest, NamesTheThreeTypesAndRefusesOthers) {
-  EXPECT_EQ(LogFileExtension(kLogTypeText), ".txt");
-  EXPECT_EQ(LogFileExtension(kLogTypeBinary), ".zfl");
-  EXPECT_EQ(LogFileExtension(kLogTypeMeasurementData), ".vora");
-  for (uint32_t type : {3u, 255u, 0xFFFFFFFFu}) EXPECT_THROW(LogFileExtension(type), std::exception);
-}
-
 TEST(LogFileNameTest, OnlyPlainNamesAreFileNames) {
   for (const char* name : {"run", "", "run.1", "...", " a b ", "C:x", "..a"}) {
     EXPECT_TRUE(IsPlainFileName(name)) << name;
@@ -50,21 +45,17 @@ TEST(LogFileNameTest, OnlyPlainNamesAreFileNames) {
 
 using LogFileTest = LogSessionTest;
 
-TEST_F(LogFileTest, EmptyNameWritesDotTxtWithTheHeaderLine) {
-  settings().logFileType.store(kLogTypeText);
-  OpenLogFile(log(), kHeader);
-  CloseLogFile(log());
-  EXPECT_EQ(ReadLog(".txt"), std::string(kHeader) + "\n");
+// An empty name is a file of the bare extension; a run without frames leaves the header alone.
+TEST_F(LogFileTest, EmptyRunLeavesTheHeaderOfItsType) {
+  const std::string binaryHeader(reinterpret_cast<const char*>(kBinaryLogFileHeaderBytes.data()), 12);
+  for (const auto& [type, file, expected] : {std::tuple{kLogTypeText, ".txt", std::string(kHeader) + "\n"},
+                                             std::tuple{kLogTypeBinary, ".zfl", binaryHeader}}) {
+    settings().logFileType.store(type);
+    OpenLogFile(log(), kHeader);
+    CloseLogFile(log());
+    EXPECT_EQ(ReadLog(file), expected);
+  }
   EXPECT_TRUE(SentMessages().empty());
-}
-
-TEST_F(LogFileTest, EmptyRunOfABinaryLogLeavesTheTwelveByteHeader) {
-  settings().logFileType.store(kLogTypeBinary);
-  settings().logFileName.Set("empty");
-  OpenLogFile(log(), kHeader);
-  CloseLogFile(log());
-  const std::string expected(reinterpret_cast<const char*>(kBinaryLogFileHeaderBytes.data()), 12);
-  EXPECT_EQ(ReadLog("empty.zfl"), expected);
 }
 
 TEST_F(LogFileTest, SecondRunWithTheSameNameKeepsOnlyItsOwnFrames) {
@@ -114,49 +105,48 @@ TEST_F(LogFileTest, UnsafeNamesCreateNothingAndReportTwice) {
   EXPECT_FALSE(fs::exists(drive_.path().parent_path() / "escaped.txt"));
 }
 
-TEST_F(LogFileTest, UnknownLogTypeReportsTheNamingFailureAndOpensNothing) {
-  settings().logFileType.store(3);
-  OpenLogFile(log(), kHeader);
-  const std::vector<uint8_t> batch = OneCanFrame(0);
-  WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
-  CloseLogFile(log());
-  EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogOpenFailed)});
-}
-
-TEST_F(LogFileTest, FileThatCannotBeOpenedReportsOnceAndSkipsTheRun) {
-  // A directory where the file should be cannot be opened for writing, whoever runs the test.
-  settings().logFileName.Set("blocked");
-  for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
-    settings().logFileType.store(type);
-    fs::create_directories(ServiceDirectory() / ("blocked" + LogFileExtension(type)));
+// Each failure to open is reported (once, or twice when the directory lookup failed first) and the
+// session keeps the status.
+TEST_F(LogFileTest, OpenFailuresReportAndSkipTheRun) {
+  struct Case {
+    const char* what;
+    uint8_t type;
+    const char* name;
+    std::function<void()> arrange;
+    size_t reports;
+  };
+  const auto block = [&](const char* file) { return [this, file] { fs::create_directories(ServiceDirectory() / file); }; };
+  const Case cases[] = {
+      {"unknown type: no name", 3, "any", [] {}, 1},
+      // A directory where the file should be cannot be opened for writing, whoever runs the test.
+      {"text file is a directory", kLogTypeText, "blocked", block("blocked.txt"), 1},
+      {"binary file is a directory", kLogTypeBinary, "blocked", block("blocked.zfl"), 1},
+      {"unwritable directory (not for root)", kLogTypeText, "denied",
+       [&] { fs::permissions(ServiceDirectory(), fs::perms::owner_read | fs::perms::owner_exec); },
+       ::geteuid() == 0 ? 0u : 1u},
+      // A file stands where the directory's parent should be: the lookup fails, then the open.
+      {"directory cannot be made", kLogTypeText, "",
+       [&] {
+         fs::permissions(ServiceDirectory(), fs::perms::owner_all);
+         fs::remove_all(drive_.Native("QV-RT\\tarvix"));
+         drive_.WriteFile("QV-RT\\tarvix", "not a directory");
+       },
+       2},
+  };
+  for (const Case& c : cases) {
+    UseBus(kBusTypeCan);
+    settings().logFileType.store(c.type);
+    settings().logFileName.Set(c.name);
+    c.arrange();
     OpenLogFile(log(), kHeader);
     const std::vector<uint8_t> batch = OneCanFrame(0);
     WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
     CloseLogFile(log());
-    EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogOpenFailed)});
+    EXPECT_EQ(SentErrorTexts(), std::vector<std::string>(c.reports, LogErrorText(kLogOpenFailed))) << c.what;
+    if (c.reports > 0) {
+      EXPECT_EQ(session().lastStatus.load(), kLogOpenFailed) << c.what;
+    }
   }
-}
-
-TEST_F(LogFileTest, UnwritableServiceDirectoryReportsOnce) {
-  if (::geteuid() == 0) GTEST_SKIP() << "permissions do not bind root; see the blocked-file test";
-  settings().logFileName.Set("denied");
-  OpenLogFile(log(), kHeader);  // creates the directory
-  CloseLogFile(log());
-  fs::remove(ServiceDirectory() / "denied.txt");
-  fs::permissions(ServiceDirectory(), fs::perms::owner_read | fs::perms::owner_exec);
-  OpenLogFile(log(), kHeader);
-  CloseLogFile(log());
-  fs::permissions(ServiceDirectory(), fs::perms::owner_all);
-  EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogOpenFailed)});
-}
-
-TEST_F(LogFileTest, ServiceDirectoryThatCannotBeMadeReportsTwice) {
-  // A file stands where the directory's parent should be: the lookup fails, then the open.
-  drive_.WriteFile("QV-RT\\tarvix", "not a directory");
-  OpenLogFile(log(), kHeader);
-  CloseLogFile(log());
-  EXPECT_EQ(SentErrorTexts(), std::vector<std::string>(2, LogErrorText(kLogOpenFailed)));
-  EXPECT_EQ(session().lastStatus.load(), kLogOpenFailed);
 }
 
 TEST_F(LogFileTest, CloseWithoutAnOpenSendsNothing) {

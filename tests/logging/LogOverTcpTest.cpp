@@ -11,18 +11,16 @@
 #include "driver/Sessions.h"
 #include "driver/tarvix.h"
 #include "logging/BinaryLogFormat.h"
-#include "logging/BinaryRecordReader.h"
 #include "logging/FileTime.h"
 #include "logging/TextLogFormat.h"
 #include "tarvix/TarvixControl.h"
-#include "tests/session/CanSessionFixture.h"
+#include "tests/logging/LogRunFixture.h"
 
 namespace kvtest {
 namespace {
 
 using namespace nKV_DLL300;
 
-constexpr char kLogDirectory[] = "QV-RT\\tarvix\\kelvane\\";
 const std::regex kTimeCell(R"(^\d\d:\d\d:\d\d,\d\d\d\t)");
 
 std::vector<std::string> Lines(const std::string& text) {
@@ -38,45 +36,8 @@ std::string AfterTime(const std::string& line) {
   return line.size() > kTimeCellLength ? line.substr(kTimeCellLength) : line;
 }
 
-bool IsText(const kvhost::HostMessage& m) { return m.header.type == kvhost::kText; }
-
-class LogOverTcpTest : public CanSessionTest {
+class LogOverTcpTest : public LogRunTest {
  protected:
-  // Connects a host, sends `properties` (each acknowledged), starts a session, waits until
-  // `periods` identifier-record messages of `recordType` arrived (each a txTimeData apart), then
-  // terminates the session. Returns the texts of the error messages seen meanwhile.
-  std::vector<std::string> Run(const std::vector<std::string>& properties, uint8_t recordType,
-                               int periods = 2) {
-    kvhost::HostClient host = ConnectHost();
-    std::vector<std::string> errors;
-    for (const std::string& property : properties) {
-      std::optional<kvhost::HostMessage> reply = Command(host, property);
-      EXPECT_TRUE(reply) << property;
-      if (reply && reply->header.type == kvhost::kErrorText) {
-        errors.push_back(reply->text());
-        // A name answered like an empty one is acknowledged after the error.
-        if (property.starts_with("SET_PROP_LOGFILE_NAME=")) EXPECT_TRUE(NextMessage(host, IsText));
-      }
-    }
-    std::optional<kvhost::HostMessage> started = Command(host, "CMD_SESSION_START");
-    EXPECT_TRUE(started && started->text() == "<ACK: CMD_SESSION_START>\n")
-        << (started ? started->text() : "no reply");
-    for (int seen = 0; seen < periods;) {
-      std::optional<kvhost::HostMessage> m = NextMessage(host, [&](const kvhost::HostMessage& m) {
-        if (m.header.type == kvhost::kErrorText) errors.push_back(m.text());
-        return m.header.type == recordType;
-      });
-      if (!m) {
-        ADD_FAILURE() << "no identifier records";
-        break;
-      }
-      if (!m->payload.empty()) ++seen;
-    }
-    EXPECT_TRUE(host.Send("CMD_SESSION_TERMINATE"));
-    EXPECT_TRUE(host.WaitForClose(kConditionDeadline));
-    return errors;
-  }
-
   // Sends one classic frame on `sender` through an output session of the test's own and waits
   // until it went out.
   void SendOneFrame(const char* sender, uint32_t identifier) {
@@ -101,12 +62,6 @@ class LogOverTcpTest : public CanSessionTest {
     ASSERT_EQ(kxWait(out, driver::kWaitTransmitComplete, 0, 20.0, nullptr), 0);
     EXPECT_EQ(kxClear(out), 0);
     EXPECT_EQ(kxdbCloseDatabase(db, 1), 0);
-  }
-
-  std::string LogFile(const std::string& name) {
-    std::optional<std::string> contents = drive_.ReadFile(kLogDirectory + name);
-    EXPECT_TRUE(contents) << name;
-    return contents.value_or("");
   }
 };
 
@@ -164,31 +119,26 @@ TEST_F(LogOverTcpTest, FdTextAndBinaryLogsShowSwitchingAndVariableRecords) {
                   kvhost::kCanRecords)
                   .empty());
   const std::string file = LogFile("fd.zfl");
-  ASSERT_GT(file.size(), 12u);
   ASSERT_TRUE(HasBinaryLogMagic(reinterpret_cast<const uint8_t*>(file.data()), file.size()));
-  BinaryRecordReader reader(reinterpret_cast<const uint8_t*>(file.data()) + 12, file.size() - 12,
-                            BinaryRecordLayout::kCanVariable);
   const std::map<uint32_t, size_t> sizes = {
       {0x200, 80}, {0x201, 32}, {kExtendedFlag | 0x1ABCDE00, 32}, {0x080, 24}};
   std::map<uint32_t, int> counted;
-  RawFrameView frame;
-  size_t offset = reader.offset();
-  while (reader.next(frame)) {
+  size_t remaining = 1, total = 12;
+  for (const RawFrameView& frame : ReadRecords(file, BinaryRecordLayout::kCanVariable, &remaining)) {
     ASSERT_TRUE(sizes.count(frame.header.identifier)) << std::hex << frame.header.identifier;
-    EXPECT_EQ(reader.offset() - offset, sizes.at(frame.header.identifier));
-    offset = reader.offset();
+    total += sizes.at(frame.header.identifier);
     ++counted[frame.header.identifier];
   }
-  EXPECT_EQ(reader.remaining(), 0u);
+  EXPECT_EQ(remaining, 0u);
+  EXPECT_EQ(total, file.size());
   EXPECT_EQ(counted.size(), sizes.size());
 }
 
-TEST_F(LogOverTcpTest, LinTextLogHasTheChecksumColumnAndNoResponseFrames) {
-  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
-                   "SET_PROP_SESSION_LOG_CHECKSUM=1", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1",
-                   "SET_PROP_LOGFILE=1"},
-                  kvhost::kLinRecords)
-                  .empty());
+TEST_F(LogOverTcpTest, LinLogsHaveTheChecksumColumnNoResponseFramesAndFixedRecords) {
+  const std::vector<std::string> port = {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
+                                         "SET_PROP_SESSION_LOG_CHECKSUM=1", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1",
+                                         "SET_PROP_LOGFILE=1"};
+  EXPECT_TRUE(Run(port, kvhost::kLinRecords).empty());
   const std::vector<std::string> lines = Lines(LogFile(".txt"));
   ASSERT_GT(lines.size(), 20u);
   EXPECT_EQ(lines[0], std::string(kLinTextLogHeaderWithChecksum) + "\n");
@@ -200,13 +150,10 @@ TEST_F(LogOverTcpTest, LinTextLogHasTheChecksumColumnAndNoResponseFrames) {
     ++ids[rest[1]];
   }
   EXPECT_EQ(ids.size(), 4u);
-}
 
-TEST_F(LogOverTcpTest, LinBinaryLogHasTwentyFourBytesPerFrame) {
-  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
-                   "SET_PROP_LOGFILE_NAME=lin", "SET_PROP_LOGFILE_TYPE=1", "SET_PROP_LOGFILE=1"},
-                  kvhost::kLinRecords)
-                  .empty());
+  std::vector<std::string> binary = port;
+  binary.insert(binary.end() - 1, {"SET_PROP_LOGFILE_NAME=lin", "SET_PROP_LOGFILE_TYPE=1"});
+  EXPECT_TRUE(Run(binary, kvhost::kLinRecords).empty());
   const std::string file = LogFile("lin.zfl");
   ASSERT_GT(file.size(), 12u + 24u);
   EXPECT_EQ((file.size() - 12) % 24, 0u);
@@ -257,10 +204,7 @@ TEST_F(LogOverTcpTest, BinaryLogHoldsEveryFrameOfTheBusCaptureInOrder) {
   ASSERT_EQ((file.size() - 12) % 24, 0u);
   // Each record as the capture writes it: "(seconds.micros) body ID#DATA".
   std::vector<std::string> logged;
-  BinaryRecordReader reader(reinterpret_cast<const uint8_t*>(file.data()) + 12, file.size() - 12,
-                            BinaryRecordLayout::kFixed24);
-  RawFrameView frame;
-  while (reader.next(frame)) {
+  for (const RawFrameView& frame : ReadRecords(file, BinaryRecordLayout::kFixed24)) {
     const RawFrameHeader& h = frame.header;
     const uint64_t micros = (h.timestamp - kFileTimeUnixEpoch) / 10;
     char text[96];
@@ -287,42 +231,37 @@ TEST_F(LogOverTcpTest, BinaryLogHoldsEveryFrameOfTheBusCaptureInOrder) {
 TEST_F(LogOverTcpTest, EchoFramesAreLoggedOnlyWithTheSetting) {
   // CAN3's own frames come back to its session as echoes; CAN4's frames are ordinary traffic.
   for (uint8_t logTransmitted : {0, 1}) {
-    kvhost::HostClient host = ConnectHost();
-    for (const std::string& property : std::vector<std::string>{"SET_PROP_SESSION_PORTNAME=CAN3", "SET_PROP_LOGFILE_NAME=echo", "SET_PROP_LOGFILE_TYPE=1",
-          "SET_PROP_LOGFILE=1", "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=" + std::to_string(logTransmitted),
-          "CMD_SESSION_START"}) {
-      ASSERT_TRUE(Command(host, property)) << property;
-    }
+    std::vector<std::string> errors;
+    kvhost::HostClient host = Configured({"SET_PROP_SESSION_PORTNAME=CAN3", "SET_PROP_LOGFILE_NAME=echo",
+                                          "SET_PROP_LOGFILE_TYPE=1", "SET_PROP_LOGFILE=1",
+                                          "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=" + std::to_string(logTransmitted)},
+                                         errors);
+    EXPECT_TRUE(errors.empty());
     for (const char* sender : {"CAN3", "CAN4"}) SendOneFrame(sender, sender[3] == '3' ? 0x33 : 0x44);
     // Both frames are in the identifier table once they were read: the log has had its batch.
     ASSERT_TRUE(RecordsWhere(host, [](const RecordMessage& m) { return m.find(0x44) != nullptr; }));
-    EXPECT_TRUE(host.Send("CMD_SESSION_TERMINATE"));
-    EXPECT_TRUE(host.WaitForClose(kConditionDeadline));
+    Terminate(host);
     const std::string file = LogFile("echo.zfl");
     std::vector<uint32_t> ids;
-    BinaryRecordReader reader(reinterpret_cast<const uint8_t*>(file.data()) + 12, file.size() - 12,
-                              BinaryRecordLayout::kCanVariable);
-    RawFrameView frame;
-    while (reader.next(frame)) ids.push_back(frame.header.identifier);
+    for (const RawFrameView& frame : ReadRecords(file, BinaryRecordLayout::kCanVariable)) {
+      ids.push_back(frame.header.identifier);
+    }
     const std::vector<uint32_t> expected =
         logTransmitted ? std::vector<uint32_t>{0x33, 0x44} : std::vector<uint32_t>{0x44};
     EXPECT_EQ(ids, expected);
   }
 }
 
-TEST_F(LogOverTcpTest, FileThatCannotBeOpenedIsReportedOnceWithTheSession) {
-  std::filesystem::create_directories(drive_.Native(std::string(kLogDirectory) + "blocked.txt"));
-  const std::vector<std::string> errors =
-      Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=blocked", "SET_PROP_LOGFILE=1"},
-          kvhost::kCanRecords);
-  EXPECT_EQ(errors, std::vector<std::string>{"<ERROR:LOG FILE: -20> \n"});
-}
-
-TEST_F(LogOverTcpTest, NameThatWouldLeaveTheServiceDirectoryLogsToTheDefaultName) {
-  const std::vector<std::string> errors = Run(
-      {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=..\\..\\outside", "SET_PROP_LOGFILE=1"},
-      kvhost::kCanRecords, 1);
-  EXPECT_EQ(errors, std::vector<std::string>{"<ERROR: no valid file name, file name KelvaneLog will be used>\n"});
+// A file that cannot be opened is reported once with the session; a name that would leave the
+// service directory is refused when set, and the session logs to the default name.
+TEST_F(LogOverTcpTest, BadFilesAndNamesAreReported) {
+  std::filesystem::create_directories(LogPath("blocked.txt"));
+  EXPECT_EQ(Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=blocked", "SET_PROP_LOGFILE=1"},
+                kvhost::kCanRecords),
+            std::vector<std::string>{"<ERROR:LOG FILE: -20> \n"});
+  EXPECT_EQ(Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=..\\..\\outside", "SET_PROP_LOGFILE=1"},
+                kvhost::kCanRecords, 1),
+            std::vector<std::string>{"<ERROR: no valid file name, file name KelvaneLog will be used>\n"});
   EXPECT_FALSE(std::filesystem::exists(drive_.Native("QV-RT\\outside.txt")));
   EXPECT_FALSE(std::filesystem::exists(drive_.Native("outside.txt")));
   EXPECT_EQ(Lines(LogFile("KelvaneLog.txt")).at(0), std::string(kCanTextLogHeader) + "\n");

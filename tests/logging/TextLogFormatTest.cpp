@@ -11,6 +11,7 @@
 namespace nKV_DLL300 {
 namespace {
 
+using kvtest::Counting;
 using kvtest::FrameSpec;
 
 enum class Bus { kCan, kLin, kLinChecksum, kFlexRay };
@@ -34,12 +35,6 @@ std::string Format(Bus bus, const RawFrameView& view, size_t cap = kTextLineCapa
     case Bus::kFlexRay: n = FormatFlexRayTextLine(out.data(), cap, view); break;
   }
   return std::string(out.data(), n);
-}
-
-std::vector<uint8_t> Counting(size_t n) {
-  std::vector<uint8_t> bytes(n);
-  for (size_t i = 0; i < n; ++i) bytes[i] = static_cast<uint8_t>(i);
-  return bytes;
 }
 
 const LineCase kLines[] = {
@@ -115,25 +110,22 @@ TEST(TextLogFormat, J1939PayloadOfEightHundredBytesIsWrittenWhole) {
   EXPECT_EQ(line.size(), 22 + 4 * 800 + 7u);
 }
 
-TEST(TextLogFormat, BufferBelowBoundWritesNothing) {
+// The longest lines stay within their bounds; a buffer one below the bound gets nothing.
+TEST(TextLogFormat, LinesStayWithinTheirBoundsAndNeedThemWhole) {
   const auto can = kvtest::Batch({{.identifier = 0x100, .payload = Counting(64)}});
-  const auto lin = kvtest::Batch({{.identifier = 0x10, .type = 0x40}});
   const auto fr = kvtest::Batch({{.identifier = 1, .type = 0x20, .payload = Counting(254)}});
+  const auto longCan = kvtest::Batch({{.timestamp = 0x7FFF'FFFF'FFFF'FFFFull, .identifier = 0x3FFF'FFFF,
+                                       .type = 0xC0, .info = 7, .payload = std::vector<uint8_t>(2047, 0xab),
+                                       .lengthByte = 0xFF}});
+  const auto longLin = kvtest::Batch({{.identifier = 0xFFFF'FFFF, .type = 0x42, .info = 0xff,
+                                       .payload = std::vector<uint8_t>(8, 1), .lengthByte = 255}});
+  EXPECT_LE(Format(Bus::kCan, kvtest::FirstView(longCan)).size(), CanTextLineMaxLength(2047));
+  EXPECT_LE(Format(Bus::kLinChecksum, kvtest::FirstView(longLin)).size(), kLinTextLineMaxLength);
   EXPECT_EQ(Format(Bus::kCan, kvtest::FirstView(can), CanTextLineMaxLength(64) - 1), "");
-  EXPECT_EQ(Format(Bus::kLin, kvtest::FirstView(lin), kLinTextLineMaxLength - 1), "");
+  EXPECT_EQ(Format(Bus::kLin, kvtest::FirstView(longLin), kLinTextLineMaxLength - 1), "");
   EXPECT_EQ(Format(Bus::kFlexRay, kvtest::FirstView(fr), FlexRayTextLineMaxLength(254) - 1), "");
   EXPECT_FALSE(Format(Bus::kCan, kvtest::FirstView(can), CanTextLineMaxLength(64)).empty());
   EXPECT_FALSE(Format(Bus::kFlexRay, kvtest::FirstView(fr), FlexRayTextLineMaxLength(254)).empty());
-}
-
-TEST(TextLogFormat, LongestLinesStayWithinTheirBounds) {
-  const auto can = kvtest::Batch({{.timestamp = 0x7FFF'FFFF'FFFF'FFFFull, .identifier = 0x3FFF'FFFF,
-                                   .type = 0xC0, .info = 7, .payload = std::vector<uint8_t>(2047, 0xab),
-                                   .lengthByte = 0xFF}});
-  const auto lin = kvtest::Batch({{.identifier = 0xFFFF'FFFF, .type = 0x42, .info = 0xff,
-                                   .payload = std::vector<uint8_t>(8, 1), .lengthByte = 255}});
-  EXPECT_LE(Format(Bus::kCan, kvtest::FirstView(can)).size(), CanTextLineMaxLength(2047));
-  EXPECT_LE(Format(Bus::kLinChecksum, kvtest::FirstView(lin)).size(), kLinTextLineMaxLength);
 }
 
 TEST(TextLogFormat, LinLengthAboveEightPrintsOnlyTheFrameBytes) {

@@ -13,7 +13,7 @@
 #include <thread>
 #include <vector>
 
-#include "tests/support/ServiceFixture.h"
+#include "tests/voralog/VoraSupport.h"
 
 namespace {
 
@@ -23,9 +23,8 @@ using nKV_DLL300::vorException;
 namespace fs = std::filesystem;
 
 constexpr char kDefaultPath[] = "C:\\Program Files\\Quovera\\Shared\\vora\\vora.dll";
-constexpr char kDefaultBelowDrive[] = "Program Files\\Quovera\\Shared\\vora\\vora.dll";
 constexpr char kRegistryBelowDrive[] = "Windows\\registry.ini";
-constexpr char kInstallerSection[] = "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\n";
+#define INSTALLER "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\n"
 
 // The code of the vorException that `action` throws, or 0 when it throws none.
 template <typename Action>
@@ -42,13 +41,8 @@ class MeasurementLibraryTest : public ::testing::Test {
  protected:
   void SetUp() override { unsetenv("OS"); }
 
-  // Copies `library` (the built vora.dll by default) to a place below the drive. The old file is
-  // removed first, so the loader sees a new file and not a cached one.
-  void Install(const std::string& belowDrive, const char* library = VORA_DLL_PATH) {
-    const fs::path target = drive_.Native(belowDrive);
-    fs::create_directories(target.parent_path());
-    fs::remove(target);
-    fs::copy_file(library, target);
+  void Install(const std::string& belowDrive = kvtest::kVoraBelowDrive, const char* library = VORA_DLL_PATH) {
+    kvtest::InstallLibrary(drive_, belowDrive, library);
   }
   void WriteRegistry(const std::string& text) { drive_.WriteFile(kRegistryBelowDrive, text); }
 
@@ -58,53 +52,62 @@ class MeasurementLibraryTest : public ::testing::Test {
 
 struct LocateCase {
   const char* what;
-  const char* os;        // nullptr: unset
-  const char* registry;  // nullptr: no registry file
+  const char* os;         // nullptr: unset
+  const char* registry;   // nullptr: no registry file
+  const char* installed;  // below the drive; nullptr: nowhere but the test's loader search path
   const char* path;
   int32_t platformCode;
+  bool loads;
 };
 
 void PrintTo(const LocateCase& c, std::ostream* os) { *os << c.what; }
 
 class LocateTest : public MeasurementLibraryTest, public ::testing::WithParamInterface<LocateCase> {};
 
-TEST_P(LocateTest, NamesTheLibraryFile) {
+// The library is named from the environment and the registry file, and loads only from there.
+TEST_P(LocateTest, NamesTheLibraryFileAndLoadsOnlyFromThere) {
   const LocateCase& c = GetParam();
   if (c.os != nullptr) setenv("OS", c.os, 1);
   if (c.registry != nullptr) WriteRegistry(c.registry);
+  if (c.installed != nullptr) Install(c.installed);
   library_.Locate();
   EXPECT_EQ(library_.path(), c.path);
   EXPECT_EQ(library_.platformCode(), c.platformCode);
+  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), c.loads ? 0 : kVorLibraryNotLoaded);
+  EXPECT_EQ(library_.loaded(), c.loads);
 }
 
-const std::string kLongValue(300, 'x');
-const std::string kLongRegistry = std::string(kInstallerSection) + "QVSHAREDDIR=C:\\" + kLongValue + "\n";
+const std::string kLongRegistry = std::string(INSTALLER) + "QVSHAREDDIR=C:\\" + std::string(300, 'x') + "\n";
+constexpr char kTools[] = INSTALLER "QVSHAREDDIR=C:\\Tools\\Shared\n";
+constexpr char kToolsPath[] = "C:\\Tools\\Shared\\vora\\vora.dll";
+constexpr char kOtherDrive[] = INSTALLER "QVSHAREDDIR=D:\\Shared\n";
+constexpr char kEmptyValue[] = INSTALLER "QVSHAREDDIR=\n";
+const char* const kDefault = kvtest::kVoraBelowDrive;
 
+// The real-time kernel's bare name is found through the loader search path of the test's environment.
 INSTANTIATE_TEST_SUITE_P(
     EnvironmentAndRegistry, LocateTest,
     ::testing::Values(
-        LocateCase{"NoRegistryFile", nullptr, nullptr, kDefaultPath, 0},
-        LocateCase{"RegistryValue", nullptr,
-                   "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\nQVSHAREDDIR=D:\\Shared\n",
-                   "D:\\Shared\\vora\\vora.dll", 0},
+        LocateCase{"DefaultDirectory", nullptr, nullptr, kDefault, kDefaultPath, 0, true},
+        LocateCase{"NoRegistryFileNothingInstalled", nullptr, nullptr, nullptr, kDefaultPath, 0, false},
+        LocateCase{"RegistryDirectory", nullptr, kTools, "Tools\\Shared\\vora\\vora.dll", kToolsPath, 0, true},
+        LocateCase{"DefaultDirectoryIgnoredWhenTheRegistryNamesAnother", nullptr, kTools, kDefault, kToolsPath, 0,
+                   false},
+        LocateCase{"RegistryDirectoryOnAnotherDrive", nullptr, kOtherDrive, "Shared\\vora\\vora.dll",
+                   "D:\\Shared\\vora\\vora.dll", 0, false},
         LocateCase{"KeyAndValueInOtherCase", nullptr,
-                   "[hkey_local_machine\\software\\quovera\\common\\installer]\nqvshareddir=C:\\Tools\n",
-                   "C:\\Tools\\vora\\vora.dll", 0},
-        LocateCase{"EmptyValueStillGetsTheSubdirectory", nullptr,
-                   "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\nQVSHAREDDIR=\n",
-                   "\\vora\\vora.dll", 0},
-        LocateCase{"KeyWithoutValue", nullptr,
-                   "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\nOTHER=C:\\x\n", kDefaultPath, 0},
-        LocateCase{"OtherKeyOnly", nullptr, "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Other]\nQVSHAREDDIR=C:\\x\n",
-                   kDefaultPath, 0},
-        LocateCase{"ValueTooLongForThePathBuffer", nullptr, kLongRegistry.c_str(), kDefaultPath, 0},
-        LocateCase{"DesktopOs", "Windows_NT", nullptr, kDefaultPath, 0},
-        LocateCase{"RealTimeKernelInMixedCase", "PhArLaP", nullptr, "vora.dll", 1},
-        LocateCase{"RealTimeKernelWithVersion", "PHARLAP ETS 2024",
-                   "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\nQVSHAREDDIR=D:\\Shared\n",
-                   "vora.dll", 1},
-        LocateCase{"ShorterThanTheKernelName", "PHARLA", nullptr, kDefaultPath, 0},
-        LocateCase{"EmptyOs", "", nullptr, kDefaultPath, 0}),
+                   "[hkey_local_machine\\software\\quovera\\common\\installer]\nqvshareddir=C:\\Tools\n", nullptr,
+                   "C:\\Tools\\vora\\vora.dll", 0, false},
+        LocateCase{"EmptyValueLooksInTheDriveRoot", nullptr, kEmptyValue, "vora\\vora.dll", "\\vora\\vora.dll", 0, true},
+        LocateCase{"KeyWithoutValue", nullptr, INSTALLER "OTHER=C:\\x\n", kDefault, kDefaultPath, 0, true},
+        LocateCase{"OtherKeyOnly", nullptr, "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Other]\nQVSHAREDDIR=C:\\x\n", nullptr,
+                   kDefaultPath, 0, false},
+        LocateCase{"ValueTooLongForThePathBuffer", nullptr, kLongRegistry.c_str(), nullptr, kDefaultPath, 0, false},
+        LocateCase{"DesktopOs", "Windows_NT", nullptr, nullptr, kDefaultPath, 0, false},
+        LocateCase{"RealTimeKernelInMixedCase", "PhArLaP", nullptr, nullptr, "vora.dll", 1, true},
+        LocateCase{"RealTimeKernelWithVersion", "PHARLAP ETS 2024", kOtherDrive, nullptr, "vora.dll", 1, true},
+        LocateCase{"ShorterThanTheKernelName", "PHARLA", nullptr, nullptr, kDefaultPath, 0, false},
+        LocateCase{"EmptyOs", "", nullptr, nullptr, kDefaultPath, 0, false}),
     [](const ::testing::TestParamInfo<LocateCase>& info) { return std::string(info.param.what); });
 
 TEST_F(MeasurementLibraryTest, PlatformIsDetectedOnceAndKept) {
@@ -116,80 +119,28 @@ TEST_F(MeasurementLibraryTest, PlatformIsDetectedOnceAndKept) {
   EXPECT_EQ(library_.path(), "vora.dll");
 }
 
-struct InstallCase {
-  const char* what;
-  const char* registry;  // nullptr: no registry file
-  const char* installedBelowDrive;
-  bool loads;
-};
-
-void PrintTo(const InstallCase& c, std::ostream* os) { *os << c.what; }
-
-class LoadTest : public MeasurementLibraryTest, public ::testing::WithParamInterface<InstallCase> {};
-
-TEST_P(LoadTest, LoadsOnlyFromTheLocatedPlace) {
-  const InstallCase& c = GetParam();
-  if (c.registry != nullptr) WriteRegistry(c.registry);
-  Install(c.installedBelowDrive);
-  library_.Locate();
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), c.loads ? 0 : kVorLibraryNotLoaded);
-  EXPECT_EQ(library_.loaded(), c.loads);
+// A missing library, and one without the Vor* entry points (the driver stand-in), are refused on
+// every call until the real one is installed.
+TEST_F(MeasurementLibraryTest, RefusedLibraryIsLoadedByALaterCallOnceInstalled) {
+  for (const char* first : {static_cast<const char*>(nullptr), TARVIX_PATH}) {
+    MeasurementLibrary library;
+    if (first != nullptr) Install(kvtest::kVoraBelowDrive, first);
+    library.Locate();
+    EXPECT_EQ(ThrownCode([&] { library.Load(); }), kVorLibraryNotLoaded);
+    EXPECT_EQ(ThrownCode([&] { library.Load(); }), kVorLibraryNotLoaded);
+    EXPECT_FALSE(library.loaded());
+    Install();
+    EXPECT_EQ(ThrownCode([&] { library.Load(); }), 0);
+    EXPECT_TRUE(library.loaded());
+    library.Unload();
+    fs::remove(drive_.Native(kvtest::kVoraBelowDrive));
+  }
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Installations, LoadTest,
-    ::testing::Values(
-        InstallCase{"DefaultDirectory", nullptr, kDefaultBelowDrive, true},
-        InstallCase{"RegistryDirectory",
-                    "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\nQVSHAREDDIR=C:\\Tools\\Shared\n",
-                    "Tools\\Shared\\vora\\vora.dll", true},
-        InstallCase{"DefaultDirectoryIgnoredWhenTheRegistryNamesAnother",
-                    "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\nQVSHAREDDIR=C:\\Tools\\Shared\n",
-                    kDefaultBelowDrive, false},
-        InstallCase{"EmptyRegistryValueLooksInTheDriveRoot",
-                    "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\nQVSHAREDDIR=\n",
-                    "vora\\vora.dll", true},
-        InstallCase{"RegistryDirectoryOnAnotherDrive",
-                    "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Quovera\\Common\\Installer]\nQVSHAREDDIR=D:\\Shared\n",
-                    "Shared\\vora\\vora.dll", false}),
-    [](const ::testing::TestParamInfo<InstallCase>& info) { return std::string(info.param.what); });
-
-// The test's environment puts the directory of the built library on the loader's search path.
-TEST_F(MeasurementLibraryTest, RealTimeKernelLoadsTheBareNameThroughTheLoaderSearch) {
-  setenv("OS", "PhArLaP", 1);
-  library_.Locate();
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), 0);
-  EXPECT_TRUE(library_.loaded());
-}
-
-TEST_F(MeasurementLibraryTest, MissingLibraryIsLoadedByALaterCallOnceInstalled) {
-  library_.Locate();
+// Unlocated, not loaded or unloaded, every entry point refuses; loaded, they write a file.
+TEST_F(MeasurementLibraryTest, EntryPointsWorkOnlyWhileLoaded) {
+  Install();
   EXPECT_EQ(ThrownCode([&] { library_.Load(); }), kVorLibraryNotLoaded);
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), kVorLibraryNotLoaded);
-  EXPECT_FALSE(library_.loaded());
-  Install(kDefaultBelowDrive);
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), 0);
-  EXPECT_TRUE(library_.loaded());
-}
-
-// A shared library without the Vor* entry points (the driver stand-in) is refused and unloaded.
-TEST_F(MeasurementLibraryTest, LibraryWithoutTheEntryPointsIsRefusedThenReplaced) {
-  Install(kDefaultBelowDrive, TARVIX_PATH);
-  library_.Locate();
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), kVorLibraryNotLoaded);
-  EXPECT_FALSE(library_.loaded());
-  Install(kDefaultBelowDrive);
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), 0);
-  EXPECT_TRUE(library_.loaded());
-}
-
-TEST_F(MeasurementLibraryTest, UnlocatedLibraryIsNotLoaded) {
-  Install(kDefaultBelowDrive);
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), kVorLibraryNotLoaded);
-}
-
-TEST_F(MeasurementLibraryTest, EveryEntryPointRefusesWhileNotLoaded) {
-  Install(kDefaultBelowDrive);
   library_.Locate();
   int32_t handle = -1;
   const std::vector<std::function<void()>> calls = {
@@ -200,28 +151,24 @@ TEST_F(MeasurementLibraryTest, EveryEntryPointRefusesWhileNotLoaded) {
       [&] { library_.FileBufFlush(3, 0); },
       [&] { library_.FileClose(0); }};
   for (const auto& call : calls) EXPECT_EQ(ThrownCode(call), kVorLibraryNotLoaded);
-  library_.Load();
-  library_.Unload();
-  EXPECT_FALSE(library_.loaded());
-  for (const auto& call : calls) EXPECT_EQ(ThrownCode(call), kVorLibraryNotLoaded);
   EXPECT_EQ(handle, -1);
-}
-
-TEST_F(MeasurementLibraryTest, LoadedLibraryWritesAFileThroughItsEntryPoints) {
-  Install(kDefaultBelowDrive);
-  library_.Locate();
   library_.Load();
   int32_t file = -1;
   EXPECT_EQ(library_.FileOpenExA("C:\\run.vora", 2, 2, 4713, &file), 0);
   ASSERT_NE(file, -1);
   EXPECT_EQ(library_.FileClose(file), 0);
   EXPECT_TRUE(fs::exists(drive_.Native("run.vora")));
+  library_.Unload();
+  EXPECT_FALSE(library_.loaded());
+  handle = -1;
+  for (const auto& call : calls) EXPECT_EQ(ThrownCode(call), kVorLibraryNotLoaded);
+  EXPECT_EQ(handle, -1);
 }
 
 // Loading twice (even from several threads at once) opens the file once: after one unload the
 // dynamic loader no longer holds it.
 TEST_F(MeasurementLibraryTest, ConcurrentFirstLoadsLoadTheLibraryOnce) {
-  Install(kDefaultBelowDrive);
+  Install();
   library_.Locate();
   constexpr int kThreads = 8;
   std::vector<std::thread> threads;
@@ -233,7 +180,7 @@ TEST_F(MeasurementLibraryTest, ConcurrentFirstLoadsLoadTheLibraryOnce) {
   EXPECT_EQ(codes, std::vector<int32_t>(kThreads, 0));
   library_.Load();
   EXPECT_EQ(ThrownCode([&] { library_.Unload(); }), 0);
-  const std::string native = drive_.Native(kDefaultBelowDrive).string();
+  const std::string native = drive_.Native(kvtest::kVoraBelowDrive).string();
   void* still = dlopen(native.c_str(), RTLD_NOW | RTLD_NOLOAD);
   EXPECT_EQ(still, nullptr) << "the library was opened more than once";
   if (still != nullptr) dlclose(still);

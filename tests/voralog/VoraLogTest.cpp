@@ -6,15 +6,16 @@
 #include <filesystem>
 #include <optional>
 #include <string>
+#include <tuple>
 #include <vector>
 
-#include "host/voradump/VoraReader.h"
 #include "logging/LogFile.h"
 #include "logging/LogFileName.h"
 #include "logging/LogWriters.h"
 #include "logging/MeasurementLibrary.h"
 #include "tests/logging/FrameBuilder.h"
 #include "tests/logging/LogSessionHarness.h"
+#include "tests/voralog/VoraSupport.h"
 
 namespace kvtest {
 namespace {
@@ -22,41 +23,23 @@ namespace {
 using namespace nKV_DLL300;
 namespace fs = std::filesystem;
 
-constexpr char kDefaultBelowDrive[] = "Program Files\\Quovera\\Shared\\vora\\vora.dll";
 constexpr char kHeader[] = "header";
 constexpr uint8_t kCanData = 0x00;
 constexpr uint8_t kCanFdData = 0x10;
 constexpr uint8_t kLinData = 0x40;
 constexpr uint8_t kFlexRayData = 0x20;
 
-std::vector<uint8_t> Bytes(size_t count, uint8_t first) {
-  std::vector<uint8_t> bytes(count);
-  for (size_t i = 0; i < count; ++i) bytes[i] = static_cast<uint8_t>(first + i);
-  return bytes;
-}
-
-// What a reader finds in one channel of a file.
-struct ChannelContents {
-  voradump::Channel channel;
-  std::vector<uint8_t> bytes;
-};
-
 class VoraLogTest : public LogSessionTest {
  protected:
   void SetUp() override {
     LogSessionTest::SetUp();
     LocateMeasurementLibrary();
+    InstallLibrary(drive_);
     settings().logFileType.store(kLogTypeMeasurementData);
   }
   void TearDown() override {
     LogSessionTest::TearDown();
     UnloadMeasurementLibrary();
-  }
-
-  void InstallLibrary() {
-    const fs::path target = drive_.Native(kDefaultBelowDrive);
-    fs::create_directories(target.parent_path());
-    fs::copy_file(VORA_DLL_PATH, target, fs::copy_options::overwrite_existing);
   }
 
   // One run: open, the batches through the writer of the session's bus, close.
@@ -75,24 +58,7 @@ class VoraLogTest : public LogSessionTest {
     }
   }
 
-  // The only channel of the file `name` in the service directory.
-  std::optional<ChannelContents> OnlyChannel(const std::string& name) {
-    std::string error;
-    std::unique_ptr<voradump::VoraReader> reader =
-        voradump::VoraReader::Open((ServiceDirectory() / name).string(), error);
-    if (!reader) {
-      ADD_FAILURE() << name << ": " << error;
-      return std::nullopt;
-    }
-    const std::vector<voradump::Group> groups = reader->Groups();
-    if (groups.size() != 1 || groups[0].channels.size() != 1) {
-      ADD_FAILURE() << name << ": not one group with one channel";
-      return std::nullopt;
-    }
-    ChannelContents contents{groups[0].channels[0], {}};
-    EXPECT_TRUE(reader->ReadBytes(contents.channel, contents.bytes));
-    return contents;
-  }
+  std::optional<ChannelContents> Channel(const std::string& name) { return OnlyChannel(ServiceDirectory() / name); }
 };
 
 struct LayoutCase {
@@ -112,7 +78,6 @@ class VoraLayoutTest : public VoraLogTest, public ::testing::WithParamInterface<
 // rounded payload for CAN FD and FlexRay.
 TEST_P(VoraLayoutTest, ChannelHoldsTheBinaryLogRecordsAndTheThreeProperties) {
   const LayoutCase& c = GetParam();
-  InstallLibrary();
   UseBus(c.bus);
   settings().canIoMode.store(c.canIoMode);
   settings().logFileName.Set("layout");
@@ -130,14 +95,12 @@ TEST_P(VoraLayoutTest, ChannelHoldsTheBinaryLogRecordsAndTheThreeProperties) {
   }
   expected.insert(expected.end(), expected.begin(), expected.end());
 
-  const std::optional<ChannelContents> contents = OnlyChannel("layout.vora");
+  const std::optional<ChannelContents> contents = Channel("layout.vora");
   ASSERT_TRUE(contents);
   EXPECT_EQ(contents->channel.group, "Bus");
   EXPECT_EQ(contents->channel.name, "Frames");
   EXPECT_EQ(contents->bytes, expected);
-  EXPECT_EQ(contents->channel.IntegerProperty(kVoraPropertyByteOrder), 0);
-  EXPECT_EQ(contents->channel.IntegerProperty(kVoraPropertyVersion), 512);
-  EXPECT_EQ(contents->channel.IntegerProperty(kVoraPropertyProtocol), c.protocol);
+  ExpectFrameProperties(contents->channel, c.protocol);
   EXPECT_TRUE(SentMessages().empty());
 }
 
@@ -145,60 +108,49 @@ INSTANTIATE_TEST_SUITE_P(
     Buses, VoraLayoutTest,
     ::testing::Values(
         LayoutCase{"ClassicCan", kBusTypeCan, 0,
-                   {{.identifier = 0x100, .type = kCanData, .payload = Bytes(8, 1)},
-                    {.identifier = 0x1A0, .type = kCanData, .payload = Bytes(3, 0xAA)},
+                   {{.identifier = 0x100, .type = kCanData, .payload = Counting(8, 1)},
+                    {.identifier = 0x1A0, .type = kCanData, .payload = Counting(3, 0xAA)},
                     {.identifier = 0x321, .type = 0x01}},
                    {24, 24, 24}, 0},
         LayoutCase{"CanFd", kBusTypeCan, 1,
-                   {{.identifier = 0x200, .type = kCanFdData, .payload = Bytes(64, 0)},
-                    {.identifier = 0x201, .type = kCanFdData, .payload = Bytes(12, 0xA0)},
-                    {.identifier = 0x080, .type = kCanData, .payload = Bytes(8, 0)}},
+                   {{.identifier = 0x200, .type = kCanFdData, .payload = Counting(64)},
+                    {.identifier = 0x201, .type = kCanFdData, .payload = Counting(12, 0xA0)},
+                    {.identifier = 0x080, .type = kCanData, .payload = Counting(8)}},
                    {80, 32, 24}, 0},
         LayoutCase{"Lin", kBusTypeLin, 0,
-                   {{.identifier = 0x11, .type = kLinData, .payload = Bytes(8, 0)},
+                   {{.identifier = 0x11, .type = kLinData, .payload = Counting(8)},
                     {.identifier = 0x10, .type = kLinData, .payload = {0x12, 0x34}},
                     {.identifier = 0x12, .type = 0x42}},
                    {24, 24, 24}, 2},
         LayoutCase{"FlexRay", kBusTypeFlexRay, 0,
-                   {{.identifier = 40, .type = kFlexRayData, .flags = 0x20, .payload = Bytes(32, 0)},
-                    {.identifier = 1, .type = kFlexRayData, .flags = 0x13, .payload = Bytes(16, 0)},
-                    {.identifier = 3, .type = 0x21, .payload = Bytes(8, 0)}},
+                   {{.identifier = 40, .type = kFlexRayData, .flags = 0x20, .payload = Counting(32)},
+                    {.identifier = 1, .type = kFlexRayData, .flags = 0x13, .payload = Counting(16)},
+                    {.identifier = 3, .type = 0x21, .payload = Counting(8)}},
                    {48, 32, 24}, 1}),
     [](const ::testing::TestParamInfo<LayoutCase>& info) { return std::string(info.param.what); });
 
-TEST_F(VoraLogTest, EchoFramesAreLoggedOnlyWhenTransmittedFramesAreWanted) {
-  InstallLibrary();
+// The names are taken as the host gave them (with none the channel is /''/''); echo frames are
+// logged only while transmitted frames are wanted; each run replaces the file of the one before.
+TEST_F(VoraLogTest, NamesEchoFramesAndRepeatedRuns) {
   const std::vector<uint8_t> batch =
-      Batch({{.identifier = 0x100, .payload = Bytes(8, 0)}, {.identifier = 0x7FF, .flags = 0x80, .payload = Bytes(8, 0)}});
-  for (uint8_t logTransmitted : {0, 1}) {
-    settings().logTransmittedFrames.store(logTransmitted);
-    RunWith({batch});
-    const std::optional<ChannelContents> contents = OnlyChannel(".vora");
-    ASSERT_TRUE(contents);
-    EXPECT_EQ(contents->bytes.size(), logTransmitted ? 48u : 24u);
-  }
-}
-
-// The names are taken as the host gave them; with none the channel is /''/''.
-TEST_F(VoraLogTest, GroupAndChannelNamesReachTheFileUnchanged) {
-  InstallLibrary();
-  for (const auto& [group, channel] : std::vector<std::pair<std::string, std::string>>{
-           {"", ""}, {"Body bus", "CAN1 @ 500k"}, {"a/b", "50%"}, {"it's", ".hidden"}}) {
+      Batch({{.identifier = 0x100, .payload = Counting(8)}, {.identifier = 0x7FF, .flags = 0x80, .payload = Counting(8)}});
+  for (const auto& [group, channel, logTransmitted] : std::vector<std::tuple<std::string, std::string, uint8_t>>{
+           {"", "", 0}, {"Body bus", "CAN1 @ 500k", 1}, {"a/b", "50%", 0}, {"it's", ".hidden", 1}}) {
     settings().voraGroupName.Set(group);
     settings().voraChannelName.Set(channel);
-    RunWith({Batch({{.identifier = 0x100, .payload = Bytes(8, 0)}})});
-    const std::optional<ChannelContents> contents = OnlyChannel(".vora");
+    settings().logTransmittedFrames.store(logTransmitted);
+    RunWith({batch});
+    const std::optional<ChannelContents> contents = Channel(".vora");
     ASSERT_TRUE(contents);
     EXPECT_EQ(contents->channel.group, group);
     EXPECT_EQ(contents->channel.name, channel);
-    EXPECT_EQ(contents->bytes.size(), 24u);
+    EXPECT_EQ(contents->bytes.size(), logTransmitted ? 48u : 24u) << group;
   }
   EXPECT_EQ(VoraChannelPath("", ""), "/''/''");
 }
 
 // A file the library cannot create (its directory is a file) is silent: the run logs nothing.
 TEST_F(VoraLogTest, FileTheLibraryCannotOpenIsSilentAndSkipsTheRun) {
-  InstallLibrary();
   settings().logFileName.Set("blocked");
   fs::create_directories(ServiceDirectory() / "blocked.vora");
   RunWith({Batch({{.identifier = 0x100}})});
@@ -209,28 +161,14 @@ TEST_F(VoraLogTest, FileTheLibraryCannotOpenIsSilentAndSkipsTheRun) {
 
 // The naming failure reports -20; the library is then asked for the empty path, which it refuses.
 TEST_F(VoraLogTest, ServiceDirectoryThatCannotBeMadeReportsOnlyTheNamingFailure) {
-  InstallLibrary();
   drive_.WriteFile("QV-RT\\tarvix", "not a directory");
   RunWith({Batch({{.identifier = 0x100}})});
   EXPECT_EQ(SentErrorTexts(), std::vector<std::string>{LogErrorText(kLogOpenFailed)});
 }
 
-TEST_F(VoraLogTest, SecondRunWithTheSameNameReplacesTheFile) {
-  InstallLibrary();
-  settings().logFileName.Set("again");
-  RunWith({Batch({{.identifier = 0x100}, {.identifier = 0x101}, {.identifier = 0x102}})});
-  settings().voraChannelName.Set("second");
-  RunWith({Batch({{.identifier = 0x200}})});
-  const std::optional<ChannelContents> contents = OnlyChannel("again.vora");
-  ASSERT_TRUE(contents);
-  EXPECT_EQ(contents->channel.name, "second");
-  EXPECT_EQ(contents->bytes.size(), 24u);
-}
-
 // Calls into a library that went away fail as the library's own failures do: once per batch, and
 // the close gives the handle up.
 TEST_F(VoraLogTest, LibraryUnloadedDuringTheRunReportsEachBatchAndTheClose) {
-  InstallLibrary();
   OpenLogFile(log(), kHeader);
   ASSERT_NE(log().voraFile, -1);
   UnloadMeasurementLibrary();

@@ -12,20 +12,16 @@
 #include <tuple>
 #include <vector>
 
-#include "host/voradump/VoraReader.h"
 #include "logging/BinaryLogFormat.h"
-#include "logging/BinaryRecordReader.h"
 #include "logging/MeasurementLibrary.h"
-#include "tests/session/CanSessionFixture.h"
+#include "tests/logging/LogRunFixture.h"
+#include "tests/voralog/VoraSupport.h"
 
 namespace kvtest {
 namespace {
 
 using namespace nKV_DLL300;
 namespace fs = std::filesystem;
-
-constexpr char kLogDirectory[] = "QV-RT\\tarvix\\kelvane\\";
-constexpr char kDefaultBelowDrive[] = "Program Files\\Quovera\\Shared\\vora\\vora.dll";
 
 // The standard output of a command line, or "" when it cannot run.
 std::string Output(const std::string& command) {
@@ -45,85 +41,15 @@ size_t Count(const std::string& text, const std::regex& pattern) {
                                            std::sregex_iterator()));
 }
 
-class VoraOverTcpTest : public CanSessionTest {
+class VoraOverTcpTest : public LogRunTest {
  protected:
   void SetUp() override {
-    CanSessionTest::SetUp();
+    LogRunTest::SetUp();
     LocateMeasurementLibrary();
   }
   void TearDown() override {
-    CanSessionTest::TearDown();
+    LogRunTest::TearDown();
     UnloadMeasurementLibrary();
-  }
-
-  void InstallLibrary() {
-    const fs::path target = drive_.Native(kDefaultBelowDrive);
-    fs::create_directories(target.parent_path());
-    fs::copy_file(VORA_DLL_PATH, target, fs::copy_options::overwrite_existing);
-  }
-
-  // Connects a host and sends `properties` (each answered); the texts of error replies are kept.
-  kvhost::HostClient Configured(const std::vector<std::string>& properties, std::vector<std::string>& errors) {
-    kvhost::HostClient host = ConnectHost();
-    for (const std::string& property : properties) {
-      std::optional<kvhost::HostMessage> reply = Command(host, property);
-      EXPECT_TRUE(reply) << property;
-      if (reply && reply->header.type == kvhost::kErrorText) errors.push_back(reply->text());
-    }
-    std::optional<kvhost::HostMessage> started = Command(host, "CMD_SESSION_START");
-    EXPECT_TRUE(started && started->text() == "<ACK: CMD_SESSION_START>\n");
-    return host;
-  }
-
-  // Waits for `periods` non-empty identifier-record messages of `recordType`, keeping the error
-  // texts seen meanwhile.
-  void WaitForRecords(kvhost::HostClient& host, uint8_t recordType, std::vector<std::string>& errors,
-                      int periods = 2) {
-    for (int seen = 0; seen < periods;) {
-      std::optional<kvhost::HostMessage> m = NextMessage(host, [&](const kvhost::HostMessage& m) {
-        if (m.header.type == kvhost::kErrorText) errors.push_back(m.text());
-        return m.header.type == recordType;
-      });
-      if (!m) {
-        ADD_FAILURE() << "no identifier records";
-        return;
-      }
-      if (!m->payload.empty()) ++seen;
-    }
-  }
-
-  void Terminate(kvhost::HostClient& host) {
-    EXPECT_TRUE(host.Send("CMD_SESSION_TERMINATE"));
-    EXPECT_TRUE(host.WaitForClose(kConditionDeadline));
-  }
-
-  // One session run with logging; the error texts it received.
-  std::vector<std::string> Run(const std::vector<std::string>& properties, uint8_t recordType) {
-    std::vector<std::string> errors;
-    kvhost::HostClient host = Configured(properties, errors);
-    WaitForRecords(host, recordType, errors);
-    Terminate(host);
-    return errors;
-  }
-
-  fs::path LogPath(const std::string& name) const { return drive_.Native(kLogDirectory + name); }
-
-  // The only channel of a log file, with its bytes.
-  std::optional<std::pair<voradump::Channel, std::vector<uint8_t>>> OnlyChannel(const std::string& name) {
-    std::string error;
-    std::unique_ptr<voradump::VoraReader> reader = voradump::VoraReader::Open(LogPath(name).string(), error);
-    if (!reader) {
-      ADD_FAILURE() << name << ": " << error;
-      return std::nullopt;
-    }
-    const std::vector<voradump::Group> groups = reader->Groups();
-    if (groups.size() != 1 || groups[0].channels.size() != 1) {
-      ADD_FAILURE() << name << ": not one group with one channel";
-      return std::nullopt;
-    }
-    std::vector<uint8_t> bytes;
-    EXPECT_TRUE(reader->ReadBytes(groups[0].channels[0], bytes));
-    return std::make_pair(groups[0].channels[0], bytes);
   }
 };
 
@@ -146,7 +72,7 @@ class VoraBusTest : public VoraOverTcpTest, public ::testing::WithParamInterface
 // h5dump agree on names, properties and size.
 TEST_P(VoraBusTest, LogHoldsTheBusRecordsReadableByEveryReader) {
   const BusCase& c = GetParam();
-  InstallLibrary();
+  InstallLibrary(drive_);
   std::vector<std::string> properties = c.properties;
   for (const char* p : {"SET_PROP_LOGFILE_NAME=run", "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE_VORA_GROUP_NAME=Bus",
                         "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=Frames", "SET_PROP_LOGFILE=1"}) {
@@ -154,27 +80,26 @@ TEST_P(VoraBusTest, LogHoldsTheBusRecordsReadableByEveryReader) {
   }
   EXPECT_TRUE(Run(properties, c.recordType).empty());
 
-  const auto channel = OnlyChannel("run.vora");
+  const auto channel = OnlyChannel(LogPath("run.vora"));
   ASSERT_TRUE(channel);
   const auto& [info, bytes] = *channel;
   EXPECT_EQ(info.group, "Bus");
   EXPECT_EQ(info.name, "Frames");
-  EXPECT_EQ(info.IntegerProperty("QV_network_frame_byte_order"), 0);
-  EXPECT_EQ(info.IntegerProperty("QV_network_frame_version"), 512);
-  EXPECT_EQ(info.IntegerProperty("QV_network_protocol"), c.protocol);
+  ExpectFrameProperties(info, c.protocol);
   ASSERT_GT(bytes.size(), 0u);
   EXPECT_TRUE(RecordsAreConsistent(bytes.data(), bytes.size(), c.layout, c.bus));
 
-  BinaryRecordReader reader(bytes.data(), bytes.size(), c.layout);
+  size_t remaining = 1;
+  const std::vector<RawFrameView> frames = ReadRecords(bytes.data(), bytes.size(), c.layout, &remaining);
+  const size_t records = frames.size();
   std::map<uint32_t, int> counted;
-  size_t records = 0;
-  for (RawFrameView frame; reader.next(frame); ++records) {
+  for (const RawFrameView& frame : frames) {
     const auto size = c.recordSizes.find(frame.header.identifier);
     ASSERT_NE(size, c.recordSizes.end()) << std::hex << frame.header.identifier;
     EXPECT_EQ(BinaryRecordSize(c.layout, frame.header), size->second) << std::hex << frame.header.identifier;
     ++counted[frame.header.identifier];
   }
-  EXPECT_EQ(reader.remaining(), 0u);
+  EXPECT_EQ(remaining, 0u);
   for (const auto& [identifier, size] : c.recordSizes) {
     if (std::find(c.rare.begin(), c.rare.end(), identifier) == c.rare.end()) {
       EXPECT_GT(counted[identifier], 0) << std::hex << identifier;
@@ -219,17 +144,17 @@ TEST_F(VoraOverTcpTest, MissingLibraryIsReportedOnceAndLoadedByALaterSessionOnce
                                                "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE=1"};
   EXPECT_EQ(Run(properties, kvhost::kCanRecords), std::vector<std::string>{"<ERROR:LOG FILE: -24> \n"});
   EXPECT_FALSE(fs::exists(LogPath("late.vora")));
-  InstallLibrary();
+  InstallLibrary(drive_);
   EXPECT_TRUE(Run(properties, kvhost::kCanRecords).empty());
-  const auto channel = OnlyChannel("late.vora");
+  const auto channel = OnlyChannel(LogPath("late.vora"));
   ASSERT_TRUE(channel);
-  EXPECT_GT(channel->second.size(), 0u);
-  EXPECT_EQ(channel->second.size() % 24, 0u);
+  EXPECT_GT(channel->bytes.size(), 0u);
+  EXPECT_EQ(channel->bytes.size() % 24, 0u);
 }
 
 // Two sessions load the library together and write their own files at the same time.
 TEST_F(VoraOverTcpTest, TwoSessionsLogAtOnceEachToItsOwnFile) {
-  InstallLibrary();
+  InstallLibrary(drive_);
   std::vector<std::string> errors;
   kvhost::HostClient can = Configured({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=can",
                                        "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=CAN1",
@@ -246,12 +171,12 @@ TEST_F(VoraOverTcpTest, TwoSessionsLogAtOnceEachToItsOwnFile) {
   EXPECT_TRUE(errors.empty());
   for (const auto& [file, name, protocol, bus] : {std::tuple{"can.vora", "CAN1", 0, RecordBus::kCan},
                                                   std::tuple{"lin.vora", "LIN1", 2, RecordBus::kLin}}) {
-    const auto channel = OnlyChannel(file);
+    const auto channel = OnlyChannel(LogPath(file));
     ASSERT_TRUE(channel) << file;
-    EXPECT_EQ(channel->first.name, name);
-    EXPECT_EQ(channel->first.IntegerProperty("QV_network_protocol"), protocol);
-    EXPECT_GT(channel->second.size(), 0u);
-    EXPECT_TRUE(RecordsAreConsistent(channel->second.data(), channel->second.size(), BinaryRecordLayout::kFixed24, bus))
+    EXPECT_EQ(channel->channel.name, name);
+    EXPECT_EQ(channel->channel.IntegerProperty("QV_network_protocol"), protocol);
+    EXPECT_GT(channel->bytes.size(), 0u);
+    EXPECT_TRUE(RecordsAreConsistent(channel->bytes.data(), channel->bytes.size(), BinaryRecordLayout::kFixed24, bus))
         << file;
   }
 }
