@@ -56,10 +56,7 @@ std::vector<FrameSpec> MixedCanFrames() {
 
 std::string CountingHex(int n) {
   std::string hex;
-  for (int i = 0; i < n; ++i) {
-    hex += "0123456789abcdef"[i >> 4];
-    hex += "0123456789abcdef"[i & 15];
-  }
+  for (int i = 0; i < n; ++i) hex += {"0123456789abcdef"[i >> 4], "0123456789abcdef"[i & 15]};
   return hex;
 }
 
@@ -179,22 +176,14 @@ TEST_F(Kvlog, HelpShowsExamplesFirst) {
   EXPECT_LT(run.out.find("Examples:"), run.out.find("Options:"));
 }
 
-}  // namespace
-
-namespace {
-
 TEST(KvlogMeasurementFile, CanChannelsBecomeCandumpLinesAndOtherBusesAreLeftOut) {
   voratest::VoraDll dll;
   ASSERT_TRUE(dll.complete());
   voratest::TempDir dir;
   const std::string path = dir / "run.vora";
-  int32_t file = -1, can = -1, lin = -1;
+  int32_t file = -1;
   ASSERT_EQ(dll.FileOpenExA(path.c_str(), 2, 2, 4713, &file), 0);
-  ASSERT_EQ(dll.ObjCreateA("/'Bus'/'CAN1'", file, &can), 0);
-  ASSERT_EQ(dll.ObjCreateA("/'Bus'/'LIN1'", file, &lin), 0);
-  const int32_t canProtocol = 0, linProtocol = 2;
-  dll.PropSetA("QV_network_protocol", 3, &canProtocol, file, can);
-  dll.PropSetA("QV_network_protocol", 3, &linProtocol, file, lin);
+  const int32_t can = dll.OpenChannel(file, "/'Bus'/'CAN1'", 0), lin = dll.OpenChannel(file, "/'Bus'/'LIN1'", 2);
   const auto batch = kvtest::Batch({{.identifier = 0x1A0, .payload = {0xaa, 0xbb, 0xcc}}});
   uint8_t record[24];
   ASSERT_EQ(CopyBinaryRecord(record, sizeof record, kvtest::FirstView(batch), BinaryRecordLayout::kFixed24), 24u);

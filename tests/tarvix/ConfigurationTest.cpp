@@ -1,10 +1,8 @@
 // TARVIX_SIM_CONFIG descriptions: errors leave no hardware, replay of candump logs, bus captures.
 #include <gtest/gtest.h>
 
-#include <cstdio>
 #include <filesystem>
 #include <fstream>
-#include <sstream>
 
 #include "driver/FrameTypes.h"
 #include "driver/Properties.h"
@@ -27,26 +25,6 @@ class ConfigurationTest : public TarvixTest {
     std::filesystem::remove_all(dir_);
   }
   void Write(const std::string& name, const std::string& text) { std::ofstream(dir_ / name) << text; }
-  std::string ReadBack(const std::string& name) {
-    std::ifstream in(dir_ / name);
-    std::stringstream s;
-    s << in.rdbuf();
-    return s.str();
-  }
-  static size_t InterfaceCount() {
-    kxRef system = 0;
-    EXPECT_EQ(kxSystemOpen(&system), 0);
-    uint32_t devices[64] = {};
-    EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, devices), 0);
-    size_t n = 0;
-    for (uint32_t d = 0; d < 64 && devices[d]; ++d) {
-      uint32_t interfaces[16] = {};
-      EXPECT_EQ(kxGetProperty(devices[d], driver::kPropDeviceInterfaces, sizeof interfaces, interfaces), 0);
-      for (uint32_t i = 0; i < 16 && interfaces[i]; ++i) ++n;
-    }
-    kxSystemClose(system);
-    return n;
-  }
   std::filesystem::path dir_;
 };
 
@@ -65,7 +43,7 @@ TEST_F(ConfigurationTest, BrokenDescriptionsGiveAClearErrorAndNoHardware) {
     std::string error;
     EXPECT_FALSE(LoadConfiguration(json, dir_.string(), &error)) << json;
     EXPECT_NE(error.find(message), std::string::npos) << json << " gave: " << error;
-    EXPECT_EQ(InterfaceCount(), 0u) << json;
+    EXPECT_TRUE(ListInterfaces().empty()) << json;
     kxRef s = 0;
     EXPECT_EQ(kxCreateSession(":can:", "", "", "CAN1", 6, &s), driver::kInterfaceNotFound);
   }
@@ -80,13 +58,11 @@ TEST_F(ConfigurationTest, ReplayCarriesEveryFrameKindOfALog) {
         "(1700000000.004000) can0 201##0A0A1\n"
         "(1700000000.005000) can0 20000080#0000000000000000\n"
         "(1700000000.006000) can1 7FF#FF\n");
-  std::string error;
-  ASSERT_TRUE(LoadConfiguration(R"({"buses":[{"name":"r","dataBitRate":2000000,
+  Load(R"({"buses":[{"name":"r","dataBitRate":2000000,
       "replay":[{"file":"in.log","logInterface":"can0","loop":true}]}],
-      "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"r","canFd":true}]}]})", dir_.string(), &error)) << error;
+      "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"r","canFd":true}]}]})", dir_.string());
   const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
-  const uint8_t errors[2] = {1, 0};
-  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, errors), 0);
+  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
   // The log loops; the session may join mid-round, so one whole round is looked for.
   const auto all = ReadUntil(s, [](const auto& f) { return f.size() >= 12; });
   ASSERT_GE(all.size(), 12u);
@@ -109,19 +85,17 @@ TEST_F(ConfigurationTest, ReplayCarriesEveryFrameKindOfALog) {
 }
 
 TEST_F(ConfigurationTest, CaptureFileHoldsEveryFrameTheBusCarried) {
-  std::string error;
-  ASSERT_TRUE(LoadConfiguration(R"({"buses":[{"name":"cap","capture":"cap.log","traffic":[
+  Load(R"({"buses":[{"name":"cap","capture":"cap.log","traffic":[
       {"id":"0x010","length":2,"periodMs":1,"payload":"ctr AB"},
       {"id":"0x1F","extended":true,"kind":"remote","periodMs":5}]}],
-      "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"cap"}]}]})", dir_.string(), &error)) << error;
+      "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"cap"}]}]})", dir_.string());
   const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
   const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 20; });
   ASSERT_EQ(kxClear(s), 0);
   ResetToDefaults();  // closes the capture file
-  std::istringstream lines(ReadBack("cap.log"));
-  std::string line;
+  std::ifstream in(dir_ / "cap.log");
   std::vector<std::string> logged;
-  while (std::getline(lines, line)) logged.push_back(line);
+  for (std::string line; std::getline(in, line);) logged.push_back(line);
   ASSERT_GE(logged.size(), frames.size());
   bool remote = false;
   bool data = false;

@@ -1,13 +1,15 @@
-// Each kind of database: built-in, subordinate, named (SimDB) and in-memory, and their checks.
+// The system object (versions, device and interface lists) and each kind of database: built-in,
+// subordinate, named (SimDB) and in-memory, and their checks.
 #include <gtest/gtest.h>
 
 #include "driver/Properties.h"
+#include "driver/Status.h"
 #include "tests/tarvix/TarvixTestSupport.h"
 
 namespace tarvix::test {
 namespace {
 
-class DatabaseKindsTest : public TarvixTest {};
+using DatabaseKindsTest = TarvixTest;
 
 struct OpenCase {
   const char* database;
@@ -110,6 +112,53 @@ TEST_F(DatabaseKindsTest, SameNameOpenedTwiceStaysUntilTheLastClose) {
   EXPECT_EQ(kxdbCreateObject(b, driver::kClassCluster, "Cluster", &again), 0);
   EXPECT_EQ(again, cluster);
   EXPECT_EQ(kxdbCloseDatabase(b, 0), 0);
+}
+
+
+using HardwareListingTest = TarvixTest;
+
+TEST_F(HardwareListingTest, DefaultHardwareListsTenInterfacesInDeviceOrderWithDefaultVersions) {
+  const std::vector<Listed> expected = {
+      {"CAN1", 1, 0, 0},     {"CAN2", 2, 0, 0},     {"CAN3", 3, 0, 1}, {"CAN4", 4, 0, 1},
+      {"CAN5", 5, 0, 1},     {"CAN6", 6, 0, 1},     {"LIN1", 1, 2, 0}, {"LIN2", 2, 2, 0},
+      {"FlexRay1", 1, 1, 0}, {"FlexRay2", 2, 1, 0},
+  };
+  const std::vector<Listed> got = ListInterfaces();
+  ASSERT_EQ(got.size(), expected.size());
+  for (size_t i = 0; i < got.size(); ++i) {
+    EXPECT_EQ(got[i].name, expected[i].name);
+    EXPECT_EQ(std::tie(got[i].port, got[i].protocol, got[i].canFd),
+              std::tie(expected[i].port, expected[i].protocol, expected[i].canFd)) << got[i].name;
+  }
+  const std::pair<uint32_t, uint32_t> versions[] = {
+      {driver::kPropSystemVersionMajor, 21}, {driver::kPropSystemVersionMinor, 5},
+      {driver::kPropSystemVersionUpdate, 0}, {driver::kPropSystemVersionPhase, 3},
+      {driver::kPropSystemVersionPacked, 0x15503000}};
+  for (const auto& [id, value] : versions) EXPECT_EQ(SystemValue(id), value) << std::hex << id;
+}
+
+TEST_F(HardwareListingTest, ListReadsCheckRoomReferencesAndTerminators) {
+  kxRef system = 0;
+  ASSERT_EQ(kxSystemOpen(&system), 0);
+  uint32_t two[2] = {};
+  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof two, two), driver::kBufferTooSmall);
+  uint32_t devices[64] = {};
+  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, 255, devices), driver::kWrongPropertySize);
+  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, nullptr), driver::kBufferMissing);
+  ASSERT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, devices), 0);
+  EXPECT_EQ(kxGetProperty(devices[0], driver::kPropSystemVersionMajor, 4, two), driver::kUnknownProperty);
+  uint32_t word = 0;
+  EXPECT_EQ(kxSetProperty(system, driver::kPropSystemVersionMajor, 4, &word), driver::kPropertyReadOnly);
+  EXPECT_EQ(kxGetProperty(0x7777, driver::kPropSystemVersionMajor, 4, &word), driver::kInvalidReference);
+  uint32_t interfaces[16] = {};
+  ASSERT_EQ(kxGetProperty(devices[2], driver::kPropDeviceInterfaces, sizeof interfaces, interfaces), 0);
+  char name[16];
+  EXPECT_EQ(kxGetProperty(interfaces[0], driver::kPropInterfaceName, 8, name), driver::kBufferTooSmall)
+      << "FlexRay1 needs 9 bytes";
+  EXPECT_EQ(kxGetProperty(interfaces[0], driver::kPropInterfaceName, 9, name), 0);
+  EXPECT_STREQ(name, "FlexRay1");
+  EXPECT_EQ(kxSystemClose(system), 0);
+  EXPECT_EQ(kxSystemClose(system), driver::kInvalidReference) << "a closed system is gone";
 }
 
 }  // namespace

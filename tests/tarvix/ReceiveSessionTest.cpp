@@ -1,9 +1,10 @@
 // Receive sessions on CAN buses: default traffic, frame layout, time stamps, bus time, arbitration,
-// wrong bit rate, read time-out and the bounded queue.
+// wrong bit rate, read time-out, the bounded queue, and poll threads sharing the driver.
 #include <gtest/gtest.h>
 
-#include <algorithm>
+#include <atomic>
 #include <chrono>
+#include <thread>
 
 #include "driver/FrameTypes.h"
 #include "driver/Properties.h"
@@ -16,15 +17,7 @@ namespace {
 using driver::kExtendedIdFlag;
 
 constexpr uint64_t kUnixEpochAsFileTime = 116444736000000000ULL;
-constexpr uint8_t kErrorsOn[2] = {1, 0};
-
-class ReceiveSessionTest : public TarvixTest {
- protected:
-  void Load(const std::string& json) {
-    std::string error;
-    ASSERT_TRUE(LoadConfiguration(json, ".", &error)) << error;
-  }
-};
+using ReceiveSessionTest = TarvixTest;
 
 uint64_t NowAsFileTime() {
   const auto ns = std::chrono::duration_cast<std::chrono::nanoseconds>(
@@ -38,15 +31,11 @@ TEST_F(ReceiveSessionTest, SubordinateSessionSeesTheBodyBusTraffic) {
   const auto frames = ReadUntil(s, [](const auto& f) {
     return CountId(f, 0, driver::kFrameCanBusError) >= 1 && CountId(f, 0x100, 0) >= 3;
   });
-  const auto find = [&](uint32_t id, uint8_t type) {
-    return *std::find_if(frames.begin(), frames.end(),
-                         [&](const Frame& f) { return f.identifier == id && f.type == type; });
-  };
   ASSERT_GE(CountId(frames, 0x100, 0), 3u);
   ASSERT_GE(CountId(frames, 0, driver::kFrameCanBusError), 1u);
-  EXPECT_EQ(find(0x1A0, 0).payload, (std::vector<uint8_t>{0xAA, 0xBB, 0xCC}));
-  EXPECT_EQ(find(0x321, driver::kFrameCanRemote).length, 0u);
-  EXPECT_EQ(find(0x18FEF100 | kExtendedIdFlag, 0).payload,
+  EXPECT_EQ(First(frames, 0x1A0, 0).payload, (std::vector<uint8_t>{0xAA, 0xBB, 0xCC}));
+  EXPECT_EQ(First(frames, 0x321, driver::kFrameCanRemote).length, 0u);
+  EXPECT_EQ(First(frames, 0x18FEF100 | kExtendedIdFlag, 0).payload,
             (std::vector<uint8_t>{0x00, 0x11, 0x22, 0x33, 0x44, 0x55, 0x66, 0x77}));
   std::vector<uint8_t> counters;
   for (const Frame& f : frames) {
@@ -106,22 +95,17 @@ TEST_F(ReceiveSessionTest, SmallBufferGetsWholeFramesOnly) {
 TEST_F(ReceiveSessionTest, FdBusCarriesItsFourFrames) {
   const kxRef s = Open(driver::kDatabaseSubordinate, "CAN6");
   const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 0x080, 0) >= 2; });
-  const auto first = [&](uint32_t id, uint8_t type) {
-    auto it = std::find_if(frames.begin(), frames.end(), [&](const Frame& f) { return f.identifier == id && f.type == type; });
-    EXPECT_NE(it, frames.end()) << std::hex << id;
-    return it == frames.end() ? Frame{} : *it;
-  };
-  const Frame brs = first(0x200, driver::kFrameCanFdBrsData);
+  const Frame brs = First(frames, 0x200, driver::kFrameCanFdBrsData);
   ASSERT_EQ(brs.length, 64u);
   for (uint32_t i = 0; i < 64; ++i) EXPECT_EQ(brs.payload[i], i);
-  const Frame fd = first(0x201, driver::kFrameCanFdData);
+  const Frame fd = First(frames, 0x201, driver::kFrameCanFdData);
   ASSERT_EQ(fd.length, 12u);
   EXPECT_EQ(fd.payload[0], 0xA0);
   EXPECT_EQ(fd.payload[11], 0xAB);
-  const Frame ext = first(0x1ABCDE00 | kExtendedIdFlag, driver::kFrameCanFdBrsData);
+  const Frame ext = First(frames, 0x1ABCDE00 | kExtendedIdFlag, driver::kFrameCanFdBrsData);
   ASSERT_EQ(ext.length, 16u);
   EXPECT_EQ(ext.payload[15], 0xFF);
-  EXPECT_EQ(first(0x080, 0).length, 8u);
+  EXPECT_EQ(First(frames, 0x080, 0).length, 8u);
 }
 
 TEST_F(ReceiveSessionTest, SaturatedBusCarriesWhatBitLengthsAllowAndNoMore) {
@@ -164,32 +148,27 @@ TEST_F(ReceiveSessionTest, CompetingFramesGoOutByIdentifierPriority) {
   EXPECT_EQ(frames[start + 4].identifier, 0x1FFFFFFF | kExtendedIdFlag);
 }
 
-TEST_F(ReceiveSessionTest, WrongBitRateSeesBusErrorFramesInsteadOfTraffic) {
+TEST_F(ReceiveSessionTest, SessionsThatCannotDecodeTheBusSeeBusErrorFrames) {
   const kxRef s = Open(driver::kDatabaseCan, "CAN1");
   ASSERT_EQ(kxStop(s, driver::kScopeInterfaceOnly), 0);
   ASSERT_EQ(Set<uint64_t>(s, driver::kPropBaudRate, 250000), 0);
   ASSERT_EQ(kxStart(s, driver::kScopeNormal), 0);
-  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
+  const kxRef classic = Open(driver::kDatabaseCan, "CAN5");
+  for (const kxRef r : {s, classic}) ASSERT_EQ(kxSetProperty(r, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
   const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 20; });
   ASSERT_GE(frames.size(), 20u);
   for (const Frame& f : frames) {
-    EXPECT_EQ(f.type, driver::kFrameCanBusError);
-    EXPECT_EQ(f.identifier, 0u);
-    EXPECT_EQ(f.length, 0u);
+    EXPECT_EQ(std::tie(f.type, f.identifier, f.length), std::make_tuple(driver::kFrameCanBusError, 0u, 0u)) << "wrong bit rate";
   }
   uint32_t state = 0;
   uint32_t fault = 1;
   ASSERT_EQ(kxReadState(s, driver::kStateCan, 4, &state, &fault), 0);
   EXPECT_GT(state >> 24, 0u) << "receive errors are counted";
   EXPECT_EQ(fault, 0u);
-}
-
-TEST_F(ReceiveSessionTest, ClassicSessionOnFdBusSeesFdFramesAsErrors) {
-  const kxRef s = Open(driver::kDatabaseCan, "CAN5");
-  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
-  const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 0x080, 0) >= 2; });
-  EXPECT_EQ(CountId(frames, 0x200, driver::kFrameCanFdBrsData), 0u);
-  EXPECT_GT(CountId(frames, 0, driver::kFrameCanBusError), 0u);
+  // A classic session on an FD bus sees the FD frames as errors.
+  const auto mixed = ReadUntil(classic, [](const auto& f) { return CountId(f, 0x080, 0) >= 2; });
+  EXPECT_EQ(CountId(mixed, 0x200, driver::kFrameCanFdBrsData), 0u);
+  EXPECT_GT(CountId(mixed, 0, driver::kFrameCanBusError), 0u);
 }
 
 TEST_F(ReceiveSessionTest, OverflowDropsTheOldestFramesAndWarnsOnce) {
@@ -212,6 +191,44 @@ TEST_F(ReceiveSessionTest, OverflowDropsTheOldestFramesAndWarnsOnce) {
   for (size_t i = 1; i < frames.size(); ++i) {
     EXPECT_EQ(uint8_t(frames[i - 1].payload[0] + 1), frames[i].payload[0]) << "the newest frames remain";
   }
+}
+
+
+TEST_F(ReceiveSessionTest, PollThreadsAndAServiceThreadShareTheDriver) {
+  struct Poller {
+    const char* interfaceName;
+    uint32_t stateId;
+    uint32_t stateSize;
+  };
+  const Poller pollers[] = {{"CAN1", driver::kStateCan, 4}, {"CAN2", driver::kStateCan, 4},
+                            {"LIN1", driver::kStateLin, 8}, {"FlexRay1", driver::kStateFlexRay, 4}};
+  std::atomic<int> finished{0};
+  std::vector<std::thread> threads;
+  for (const Poller& p : pollers) {
+    threads.emplace_back([&finished, p] {
+      const kxRef s = Open(driver::kDatabaseSubordinate, p.interfaceName);
+      const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 30; });
+      EXPECT_GE(frames.size(), 30u) << p.interfaceName;
+      uint8_t state[8] = {};
+      uint32_t fault = 0;
+      EXPECT_EQ(kxReadState(s, p.stateId, p.stateSize, state, &fault), 0);
+      EXPECT_EQ(kxClear(s), 0);
+      ++finished;
+    });
+  }
+  // Meanwhile the service thread lists the hardware and opens and closes sessions.
+  while (finished.load() < 4) {
+    kxRef system = 0;
+    ASSERT_EQ(kxSystemOpen(&system), 0);
+    uint32_t devices[64] = {};
+    EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, devices), 0);
+    EXPECT_EQ(kxSystemClose(system), 0);
+    const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
+    EXPECT_EQ(Set<uint8_t>(s, driver::kPropEcho, 1), 0);
+    EXPECT_EQ(kxClear(s), 0);
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
+  }
+  for (auto& t : threads) t.join();
 }
 
 }  // namespace

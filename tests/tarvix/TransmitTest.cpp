@@ -99,10 +99,9 @@ TEST_F(TransmitTest, WritesAreCheckedAgainstTheSession) {
   const auto r = Record(1);
   EXPECT_EQ(kxWriteFrame(rx, r.data(), 24, 10.0), driver::kWrongSessionMode);
   EXPECT_EQ(kxWriteFrame(out, r.data(), 23, 10.0), driver::kInvalidFrame);
-  const auto tooLong = Record(1, 9);
-  std::vector<uint8_t> padded(tooLong);
-  padded.resize(32, 0);
-  EXPECT_EQ(kxWriteFrame(out, padded.data(), 32, 10.0), driver::kInvalidFrame) << "classic frames hold 8 bytes";
+  auto tooLong = Record(1, 9);
+  tooLong.resize(32, 0);
+  EXPECT_EQ(kxWriteFrame(out, tooLong.data(), 32, 10.0), driver::kInvalidFrame) << "classic frames hold 8 bytes";
   uint8_t buffer[64];
   uint32_t bytes = 0;
   EXPECT_EQ(kxReadFrame(out, buffer, sizeof buffer, 0.0, &bytes), driver::kWrongSessionMode);

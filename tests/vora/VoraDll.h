@@ -16,43 +16,38 @@
 
 namespace voratest {
 
+#define VORA_ENTRY_POINTS(X) \
+  X(SetOS) X(SetAPIFlags) X(FileOpenExA) X(ObjCreateA) X(PropSetA) X(ObjRawSet) X(FileBufFlush) X(FileClose)
+
 // The entry points resolved by name from a dlopen of vora.dll; unloads it when destroyed.
 struct VoraDll {
-  void* handle = nullptr;
-  VorSetOSFn SetOS = nullptr;
-  VorSetAPIFlagsFn SetAPIFlags = nullptr;
-  VorFileOpenExAFn FileOpenExA = nullptr;
-  VorObjCreateAFn ObjCreateA = nullptr;
-  VorPropSetAFn PropSetA = nullptr;
-  VorObjRawSetFn ObjRawSet = nullptr;
-  VorFileBufFlushFn FileBufFlush = nullptr;
-  VorFileCloseFn FileClose = nullptr;
+  void* handle = dlopen(VORA_DLL_PATH, RTLD_NOW | RTLD_LOCAL);
+#define VORA_MEMBER(name) Vor##name##Fn name = handle ? reinterpret_cast<Vor##name##Fn>(dlsym(handle, "Vor" #name)) : nullptr;
+  VORA_ENTRY_POINTS(VORA_MEMBER)
+#undef VORA_MEMBER
 
-  VoraDll() {
-    handle = dlopen(VORA_DLL_PATH, RTLD_NOW | RTLD_LOCAL);
-    if (handle == nullptr) return;
-    Resolve(SetOS, "VorSetOS");
-    Resolve(SetAPIFlags, "VorSetAPIFlags");
-    Resolve(FileOpenExA, "VorFileOpenExA");
-    Resolve(ObjCreateA, "VorObjCreateA");
-    Resolve(PropSetA, "VorPropSetA");
-    Resolve(ObjRawSet, "VorObjRawSet");
-    Resolve(FileBufFlush, "VorFileBufFlush");
-    Resolve(FileClose, "VorFileClose");
-  }
   ~VoraDll() { Unload(); }
   void Unload() {
     if (handle != nullptr) dlclose(handle);
     handle = nullptr;
   }
   bool complete() const {
-    return SetOS && SetAPIFlags && FileOpenExA && ObjCreateA && PropSetA && ObjRawSet && FileBufFlush && FileClose;
+#define VORA_PRESENT(name) &&name != nullptr
+    return handle != nullptr VORA_ENTRY_POINTS(VORA_PRESENT);
+#undef VORA_PRESENT
   }
 
- private:
-  template <typename Fn>
-  void Resolve(Fn& fn, const char* name) {
-    fn = reinterpret_cast<Fn>(dlsym(handle, name));
+  // The controller's channel: the object and its three properties; the channel's handle.
+  int32_t OpenChannel(int32_t file, const std::string& objectPath, int32_t protocol, bool withProtocol = true) {
+    int32_t channel = -1;
+    EXPECT_EQ(ObjCreateA(objectPath.c_str(), file, &channel), 0) << objectPath;
+    const int32_t byteOrder = 0, version = 512;
+    EXPECT_EQ(PropSetA("QV_network_frame_byte_order", 3, &byteOrder, file, channel), 0);
+    EXPECT_EQ(PropSetA("QV_network_frame_version", 3, &version, file, channel), 0);
+    if (withProtocol) {
+      EXPECT_EQ(PropSetA("QV_network_protocol", 3, &protocol, file, channel), 0);
+    }
+    return channel;
   }
 };
 

@@ -24,12 +24,7 @@ class VoraDump : public testing::Test {
   // A channel as the controller writes it: three properties, one record per frame.
   void AddChannel(const std::string& objectPath, int32_t protocol, const std::vector<FrameSpec>& frames,
                   BinaryRecordLayout layout, bool withProtocol = true) {
-    int32_t channel = -1;
-    ASSERT_EQ(dll.ObjCreateA(objectPath.c_str(), file, &channel), 0);
-    const int32_t byteOrder = 0, version = 512;
-    dll.PropSetA("QV_network_frame_byte_order", 3, &byteOrder, file, channel);
-    dll.PropSetA("QV_network_frame_version", 3, &version, file, channel);
-    if (withProtocol) dll.PropSetA("QV_network_protocol", 3, &protocol, file, channel);
+    const int32_t channel = dll.OpenChannel(file, objectPath, protocol, withProtocol);
     for (const FrameSpec& f : frames) {
       const auto batch = kvtest::Batch({f});
       uint8_t record[4096];

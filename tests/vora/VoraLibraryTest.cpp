@@ -3,13 +3,13 @@
 #include <gtest/gtest.h>
 
 #include <array>
-#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include "tests/kvlog/ToolRunner.h"
 #include "tests/vora/VoraDll.h"
 
 namespace {
@@ -37,11 +37,10 @@ class VoraLibrary : public testing::Test {
   void OpenChannel(const std::string& path, const char* objectPath, int32_t protocol) {
     ASSERT_EQ(dll.SetOS(0), 0);
     ASSERT_EQ(dll.FileOpenExA(path.c_str(), kReplaceMode, kReadWrite, kRevision, &file), 0);
-    ASSERT_EQ(dll.ObjCreateA(objectPath, file, &channel), 0);
-    const int32_t byteOrder = 0, version = 512;
-    ASSERT_EQ(dll.PropSetA("QV_network_frame_byte_order", kInt32, &byteOrder, file, channel), 0);
-    ASSERT_EQ(dll.PropSetA("QV_network_frame_version", kInt32, &version, file, channel), 0);
-    ASSERT_EQ(dll.PropSetA("QV_network_protocol", kInt32, &protocol, file, channel), 0);
+    channel = dll.OpenChannel(file, objectPath, protocol);
+  }
+  void Write(const std::array<uint8_t, kLinRecord>& r) {
+    ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
   }
   void FlushAndClose() {
     EXPECT_EQ(dll.FileBufFlush(kFlushAll, file), 0);
@@ -60,7 +59,7 @@ TEST_F(VoraLibrary, ChannelHoldsEveryRecordAndThePropertiesAsAttributes) {
   std::vector<uint8_t> expected;
   for (uint32_t i = 0; i < 5000; ++i) {  // more than the library buffers at once
     const auto r = Record(0, i);
-    ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
+    Write(r);
     expected.insert(expected.end(), r.begin(), r.end());
   }
   FlushAndClose();
@@ -74,8 +73,7 @@ TEST_F(VoraLibrary, ChannelHoldsEveryRecordAndThePropertiesAsAttributes) {
 TEST_F(VoraLibrary, ReplaceModeDropsTheEarlierFileContents) {
   const std::string path = dir / "run.vora";
   OpenChannel(path, "/'Old'/'CAN1'", 0);
-  const auto r = Record(1, 1);
-  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
+  Write(Record(1, 1));
   FlushAndClose();
 
   OpenChannel(path, "/'New'/'CAN1'", 0);
@@ -89,7 +87,7 @@ TEST_F(VoraLibrary, OpenExistingAppendsToTheChannelAndSameObjectKeepsItsHandle) 
   const std::string path = dir / "run.vora";
   OpenChannel(path, "/'G'/'C'", 1);
   const auto first = Record(2, 0), second = Record(2, 1);
-  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, first.data(), file, channel), 0);
+  Write(first);
   int32_t again = -1;
   ASSERT_EQ(dll.ObjCreateA("/'G'/'C'", file, &again), 0);
   EXPECT_EQ(again, channel);
@@ -97,7 +95,7 @@ TEST_F(VoraLibrary, OpenExistingAppendsToTheChannelAndSameObjectKeepsItsHandle) 
 
   ASSERT_EQ(dll.FileOpenExA(path.c_str(), 0, kReadWrite, kRevision, &file), 0);
   ASSERT_EQ(dll.ObjCreateA("/'G'/'C'", file, &channel), 0);
-  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, second.data(), file, channel), 0);
+  Write(second);
   FlushAndClose();
 
   std::vector<uint8_t> expected(first.begin(), first.end());
@@ -154,15 +152,14 @@ TEST_F(VoraLibrary, CallsWithBadHandlesTypesOrPathsChangeNothing) {
   EXPECT_EQ(ReadBytes(path, "/G/C"), std::vector<uint8_t>{});
 }
 
-TEST_F(VoraLibrary, NamesWithQuotesSlashesOrNothingAreStoredEncoded) {
+TEST_F(VoraLibrary, NamesAreStoredEncodedAndControllerPathsLandInTheDriveDirectory) {
   const std::string path = dir / "run.vora";
   OpenChannel(path, "/'it's/50%'/''", 0);
   FlushAndClose();
   EXPECT_EQ(ReadBytes(path, "/it's%2F50%25/%"), std::vector<uint8_t>{});
   EXPECT_EQ(ReadIntAttribute(path, "/it's%2F50%25/%", "QV_network_frame_version"), 512);
-}
 
-TEST_F(VoraLibrary, ControllerPathIsWrittenInsideTheDriveDirectory) {
+  // The controller's path lands inside the drive directory.
   setenv("KELVANERT_DRIVE_C", dir.path.c_str(), 1);
   std::filesystem::create_directories(dir.path / "QV-RT" / "kelvane");
   OpenChannel("c:\\QV-RT\\kelvane\\run.vora", "/''/''", 0);
@@ -204,7 +201,7 @@ TEST_F(VoraLibrary, UnloadingWithAFileOpenWritesAndClosesIt) {
   const std::string path = dir / "run.vora";
   OpenChannel(path, "/'G'/'C'", 0);
   const auto r = Record(4, 4);
-  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
+  Write(r);
   dll.Unload();
   EXPECT_EQ(ReadBytes(path, "/G/C"), std::vector<uint8_t>(r.begin(), r.end()));
 }
@@ -213,17 +210,12 @@ TEST_F(VoraLibrary, H5dumpReadsGroupsChannelsAndProperties) {
   if (!std::filesystem::exists(H5DUMP_PATH)) GTEST_SKIP() << "h5dump is not installed";
   const std::string path = dir / "run.vora";
   OpenChannel(path, "/'Bus'/'CAN1'", 0);
-  const auto r = Record(5, 0);
-  ASSERT_EQ(dll.ObjRawSet(kBytes, kLinRecord, r.data(), file, channel), 0);
+  Write(Record(5, 0));
   FlushAndClose();
 
-  const std::string command = std::string(H5DUMP_PATH) + " '" + path + "' 2>&1";
-  FILE* pipe = popen(command.c_str(), "r");
-  ASSERT_NE(pipe, nullptr);
-  std::string out;
-  char buffer[4096];
-  for (size_t n; (n = fread(buffer, 1, sizeof buffer, pipe)) > 0;) out.append(buffer, n);
-  EXPECT_EQ(pclose(pipe), 0) << out;
+  const auto run = kvtest::RunTool(std::string(H5DUMP_PATH) + " '" + path + "'", dir.path);
+  const std::string& out = run.out;
+  EXPECT_EQ(run.exitCode, 0) << run.err;
   EXPECT_NE(out.find("GROUP \"Bus\""), std::string::npos) << out;
   EXPECT_NE(out.find("DATASET \"CAN1\""), std::string::npos) << out;
   EXPECT_NE(out.find("H5T_STD_U8LE"), std::string::npos) << out;
