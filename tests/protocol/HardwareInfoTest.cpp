@@ -1,10 +1,9 @@
 // Listing the driver's devices into hardware records and reading its version values.
-#include "protocol/HardwareInfo.h"
-
 #include <gtest/gtest.h>
 
 #include <cstring>
 
+#include "protocol/HardwareInfo.h"
 #include "tests/support/FakeDriverSystem.h"
 
 namespace nKV_DLL300 {
@@ -23,7 +22,7 @@ TEST(HardwareInfoTest, DefaultHardwareGivesTenRecordsInDriverOrder) {
   FakeDriverSystem driver = FakeDriverSystem::DefaultHardware();
   std::vector<HardwareRecord> table;
   EXPECT_EQ(buildHardwareTable(driver, table), 0);
-  const char* names[] = {"CAN1", "CAN2", "CAN3", "CAN4", "CAN5",
+  const char* names[] = {"CAN1", "CAN2", "CAN3", "CAN4",     "CAN5",
                          "CAN6", "LIN1", "LIN2", "FlexRay1", "FlexRay2"};
   ASSERT_EQ(table.size(), std::size(names));
   for (size_t i = 0; i < table.size(); ++i) EXPECT_EQ(NameOf(table[i]), names[i]);
@@ -33,23 +32,16 @@ TEST(HardwareInfoTest, DefaultHardwareGivesTenRecordsInDriverOrder) {
   EXPECT_EQ(driver.openCount, driver.closeCount);
 }
 
-TEST(HardwareInfoTest, TwoDevicesOfTwoInterfacesListTheFirstDeviceFirst) {
-  FakeDriverSystem driver;
-  driver.devices = {{{"A1", 1, 0, 0}, {"A2", 2, 0, 0}}, {{"B1", 1, 0, 0}, {"B2", 2, 0, 0}}};
-  std::vector<HardwareRecord> table;
-  EXPECT_EQ(buildHardwareTable(driver, table), 0);
-  ASSERT_EQ(table.size(), 4u);
-  EXPECT_EQ(NameOf(table[0]), "A1");
-  EXPECT_EQ(NameOf(table[1]), "A2");
-  EXPECT_EQ(NameOf(table[2]), "B1");
-  EXPECT_EQ(NameOf(table[3]), "B2");
-}
-
-TEST(HardwareInfoTest, NoDevicesGiveAnEmptyTable) {
+TEST(HardwareInfoTest, TwoDevicesOfTwoInterfacesListTheFirstDeviceFirstAndNoneGiveNoRecords) {
   FakeDriverSystem driver;
   std::vector<HardwareRecord> table(3);
   EXPECT_EQ(buildHardwareTable(driver, table), 0);
   EXPECT_TRUE(table.empty());
+  driver.devices = {{{"A1", 1, 0, 0}, {"A2", 2, 0, 0}}, {{"B1", 1, 0, 0}, {"B2", 2, 0, 0}}};
+  EXPECT_EQ(buildHardwareTable(driver, table), 0);
+  const char* names[] = {"A1", "A2", "B1", "B2"};
+  ASSERT_EQ(table.size(), std::size(names));
+  for (size_t i = 0; i < table.size(); ++i) EXPECT_EQ(NameOf(table[i]), names[i]);
 }
 
 TEST(HardwareInfoTest, NonCanInterfaceHasZeroAtOffset24AndNoNoiseAfterThePort) {
@@ -64,21 +56,19 @@ TEST(HardwareInfoTest, NonCanInterfaceHasZeroAtOffset24AndNoNoiseAfterThePort) {
   for (size_t offset = 24; offset < sizeof bytes; ++offset) EXPECT_EQ(bytes[offset], 0) << offset;
 }
 
-TEST(HardwareInfoTest, FailurePartWayKeepsTheCompletedRecords) {
-  FakeDriverSystem driver = FakeDriverSystem::DefaultHardware();
-  driver.failingProperties[0x00130007] = kDriverError;  // the first CAN interface fails
-  std::vector<HardwareRecord> table;
-  EXPECT_EQ(buildHardwareTable(driver, table), kDriverError);
-  EXPECT_TRUE(table.empty());
-  EXPECT_EQ(driver.openCount, driver.closeCount);
-}
-
-TEST(HardwareInfoTest, FailingSystemOpenGivesAnEmptyTableAndItsStatus) {
-  FakeDriverSystem driver = FakeDriverSystem::DefaultHardware();
-  driver.failOpenStatus = kDriverError;
-  std::vector<HardwareRecord> table(2);
-  EXPECT_EQ(buildHardwareTable(driver, table), kDriverError);
-  EXPECT_TRUE(table.empty());
+// A failing interface part way, or a failing system open, leaves no records and the status.
+TEST(HardwareInfoTest, DriverFailureGivesAnEmptyTableAndItsStatus) {
+  for (bool failOpen : {false, true}) {
+    FakeDriverSystem driver = FakeDriverSystem::DefaultHardware();
+    if (failOpen)
+      driver.failOpenStatus = kDriverError;
+    else
+      driver.failingProperties[0x00130007] = kDriverError;  // the first CAN interface fails
+    std::vector<HardwareRecord> table(2);
+    EXPECT_EQ(buildHardwareTable(driver, table), kDriverError) << failOpen;
+    EXPECT_TRUE(table.empty()) << failOpen;
+    EXPECT_EQ(driver.openCount, driver.closeCount) << failOpen;
+  }
 }
 
 TEST(HardwareInfoTest, VersionValuesAreReadInOrderAndZeroedOnFailure) {

@@ -33,7 +33,7 @@ struct Row {
 const std::string kSetPort = "SET_PROP_SESSION_PORTNAME=";
 const std::string kLongTail(220, 'x');  // makes replies longer than 200 characters
 const std::string kNoValidName = "<ERROR: no valid file name, file name KelvaneLog will be used>\n";
-const ExpectedReply kKelvaneLogAck = Ack("<ACK: SET_PROP_LOGFILE_NAME KelvaneLog> \n");
+const ExpectedReply kKelvaneLogAck = "<ACK: SET_PROP_LOGFILE_NAME KelvaneLog> \n";
 
 // Failures name the row, not its bytes.
 void PrintTo(const Row& row, std::ostream* out) { *out << row.name; }
@@ -43,38 +43,47 @@ Row One(std::string name, std::string message, std::vector<ExpectedReply> replie
   return {std::move(name), {{std::move(message), std::move(replies)}}, std::move(stored)};
 }
 
+// A switch that takes 0 and 1: 2 is a range error, then 1 is acknowledged.
+Row Switch(std::string name, const std::string& property, StoredCheck stored = {}) {
+  return {std::move(name),
+          {{property + "=2", {"<ERROR: " + property + ": Value range error>\n"}},
+           {property + "=1", {"<ACK: " + property + " 1> \n"}}},
+          std::move(stored)};
+}
+
 const SessionSettings& S(const HostConnection& c) { return c.settings; }
+// A stored check on the connection's settings, e.g. STORED(baudRate == 500000).
+#define STORED(condition) [](const HostConnection& c) { return c.settings.condition; }
 
 std::vector<Row> PortNameRows() {
   return {
       One("PortNameCanSetsBusTypeAndInterfaceName", kSetPort + "CAN3",
-          {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN3>")},
+          {"<ACK: SET_PROP_SESSION_PORTNAME CAN3>"},
           [](auto& c) {
             return c.busType == 1 && S(c).portName.Get() == "CAN3" &&
                    S(c).interfaceName.Get() == "CAN3@qv_corle_tarvix";
           }),
-      One("PortNameLinSetsBusTypeTwo", kSetPort + "LIN1",
-          {Ack("<ACK: SET_PROP_SESSION_PORTNAME LIN1>")}, [](auto& c) { return c.busType == 2; }),
+      One("PortNameLinSetsBusTypeTwo", kSetPort + "LIN1", {"<ACK: SET_PROP_SESSION_PORTNAME LIN1>"},
+          [](auto& c) { return c.busType == 2; }),
       One("PortNameFlexRaySetsBusTypeThree", kSetPort + "FlexRay2",
-          {Ack("<ACK: SET_PROP_SESSION_PORTNAME FlexRay2>")},
-          [](auto& c) { return c.busType == 3; }),
-      One("PortNameFlexWithoutRayIsWrong", kSetPort + "Flex1", {Error("<ERROR: WRONG PORT NAME>\n")},
+          {"<ACK: SET_PROP_SESSION_PORTNAME FlexRay2>"}, [](auto& c) { return c.busType == 3; }),
+      One("PortNameFlexWithoutRayIsWrong", kSetPort + "Flex1", {"<ERROR: WRONG PORT NAME>\n"},
           [](auto& c) { return c.busType == 0; }),
       {"PortNameUnknownKeepsBusTypeButStoresTheNames",
-       {{kSetPort + "CAN1", {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN1>")}},
-        {kSetPort + "ETH1", {Error("<ERROR: WRONG PORT NAME>\n")}}},
+       {{kSetPort + "CAN1", {"<ACK: SET_PROP_SESSION_PORTNAME CAN1>"}},
+        {kSetPort + "ETH1", {"<ERROR: WRONG PORT NAME>\n"}}},
        [](auto& c) {
          return c.busType == 1 && S(c).portName.Get() == "ETH1" &&
                 S(c).interfaceName.Get() == "ETH1@qv_corle_tarvix";
        }},
       One("PortNameEmptyIsAnErrorAndStoresTheSuffixAlone", kSetPort,
-          {Error("<ERROR: SET_PROP_SESSION_PORTNAME: empty paramter>\n")},
+          {"<ERROR: SET_PROP_SESSION_PORTNAME: empty paramter>\n"},
           [](auto& c) { return c.busType == 0 && S(c).interfaceName.Get() == "@qv_corle_tarvix"; }),
       One("PortNameKeepsAHostLineEndInTheValue", kSetPort + "CAN1\n",
-          {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN1\n>")},
-          [](auto& c) { return S(c).interfaceName.Get() == "CAN1\n@qv_corle_tarvix"; }),
+          {"<ACK: SET_PROP_SESSION_PORTNAME CAN1\n>"},
+          STORED(interfaceName.Get() == "CAN1\n@qv_corle_tarvix")),
       One("PortNameLongerThan200CharactersIsAnsweredInFull", kSetPort + "CAN" + kLongTail,
-          {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN" + kLongTail + ">")}),
+          {"<ACK: SET_PROP_SESSION_PORTNAME CAN" + kLongTail + ">"}),
   };
 }
 
@@ -83,52 +92,42 @@ std::vector<Row> PlainRows() {
   const std::string key = "SET_PROP_SESSION_KEY_SLOT=";
   return {
       One("BaudRateIsStoredAndAcknowledged", baud + "500000",
-          {Ack("<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n")},
-          [](auto& c) { return S(c).baudRate == 500000; }),
+          {"<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n"}, STORED(baudRate == 500000)),
       One("BaudRateSkipsLeadingBlanksAndTakesAPlusSign", baud + " \t+250000kbit",
-          {Ack("<ACK: SET_PROP_SESSION_BAUDRATE 250000> \n")}),
+          {"<ACK: SET_PROP_SESSION_BAUDRATE 250000> \n"}),
       One("BaudRateMinusOneWrapsToTheLargest64BitValue", baud + "-1",
-          {Ack("<ACK: SET_PROP_SESSION_BAUDRATE 18446744073709551615> \n")}),
+          {"<ACK: SET_PROP_SESSION_BAUDRATE 18446744073709551615> \n"}),
       {"BaudRateThatCannotBeReadKeepsTheOldValue",
-       {{baud + "500000", {Ack("<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n")}},
-        {baud + "abc", {Ack("<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n")}}},
-       [](auto& c) { return S(c).baudRate == 500000; }},
+       {{baud + "500000", {"<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n"}},
+        {baud + "abc", {"<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n"}}},
+       STORED(baudRate == 500000)},
       One("TxTimeDataUsesTheOldAcknowledgementName", "SET_PROP_TX_TIME_DATA=200",
-          {Ack("<ACK: SETPROP_TXTIMECAN 200> \n")}, [](auto& c) { return S(c).txTimeData == 200; }),
+          {"<ACK: SETPROP_TXTIMECAN 200> \n"}, STORED(txTimeData == 200)),
       One("TxTimeDataNegativeIsStoredAsItsUnsignedBits", "SET_PROP_TX_TIME_DATA=-5",
-          {Ack("<ACK: SETPROP_TXTIMECAN -5> \n")},
-          [](auto& c) { return S(c).txTimeData == 0xFFFFFFFBu; }),
+          {"<ACK: SETPROP_TXTIMECAN -5> \n"}, STORED(txTimeData == 0xFFFFFFFBu)),
       One("DataLogIdsMaxUsesTheMemorySizeName", "SET_PROP_DATA_LOG_IDS_MAX=5000",
-          {Ack("<ACK: SET_PROP_MEM_SIZE_ID 5000> \n")},
-          [](auto& c) { return S(c).dataLogIdsMax == 5000; }),
-      One("KeySlotHexadecimal", key + "0x10", {Ack("<ACK: SET_PROP_SESSION_KEY_SLOT 16> \n")},
-          [](auto& c) { return S(c).keySlot == 16; }),
-      One("KeySlotLeadingZeroIsOctal", key + "010", {Ack("<ACK: SET_PROP_SESSION_KEY_SLOT 8> \n")},
-          [](auto& c) { return S(c).keySlot == 8; }),
+          {"<ACK: SET_PROP_MEM_SIZE_ID 5000> \n"}, STORED(dataLogIdsMax == 5000)),
+      One("KeySlotHexadecimal", key + "0x10", {"<ACK: SET_PROP_SESSION_KEY_SLOT 16> \n"},
+          STORED(keySlot == 16)),
+      One("KeySlotLeadingZeroIsOctal", key + "010", {"<ACK: SET_PROP_SESSION_KEY_SLOT 8> \n"},
+          STORED(keySlot == 8)),
       One("KeySlotAllBitsIsAcknowledgedAsMinusOne", key + "0xFFFFFFFF",
-          {Ack("<ACK: SET_PROP_SESSION_KEY_SLOT -1> \n")},
-          [](auto& c) { return S(c).keySlot == 0xFFFFFFFFu; }),
+          {"<ACK: SET_PROP_SESSION_KEY_SLOT -1> \n"}, STORED(keySlot == 0xFFFFFFFFu)),
       One("KeySlotTooLargeGivesAllBits", key + "99999999999",
-          {Ack("<ACK: SET_PROP_SESSION_KEY_SLOT -1> \n")},
-          [](auto& c) { return S(c).keySlot == 0xFFFFFFFFu; }),
+          {"<ACK: SET_PROP_SESSION_KEY_SLOT -1> \n"}, STORED(keySlot == 0xFFFFFFFFu)),
       One("CanFdBaudRate", "SET_PROP_SESSION_CANFD_BAUDRATE=2000000",
-          {Ack("<ACK: SET_PROP_SESSION_CANFD_BAUDRATE 2000000> \n")},
-          [](auto& c) { return S(c).canFdBaudRate == 2000000; }),
+          {"<ACK: SET_PROP_SESSION_CANFD_BAUDRATE 2000000> \n"}, STORED(canFdBaudRate == 2000000)),
       One("IsoFdModeHasTwoBlanksBeforeTheValue", "SET_PROP_SESSION_ISOFD_MODE=1",
-          {Ack("<ACK: SET_PROP_SESSION_ISOFD_MODE  1> \n")},
-          [](auto& c) { return S(c).isoFdMode == 1; }),
+          {"<ACK: SET_PROP_SESSION_ISOFD_MODE  1> \n"}, STORED(isoFdMode == 1)),
       One("NodeAddressIsAcknowledgedWithoutItsValue", "SET_PROP_SESSION_NODE_ADDRESS=33",
-          {Ack("<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n")},
-          [](auto& c) { return S(c).nodeAddress == 33; }),
+          {"<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n"}, STORED(nodeAddress == 33)),
       One("NodeAddress256AsAByteIsZero", "SET_PROP_SESSION_NODE_ADDRESS=256",
-          {Ack("<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n")},
-          [](auto& c) { return S(c).nodeAddress == 0; }),
+          {"<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n"}, STORED(nodeAddress == 0)),
       One("NodeAddressMinusOneAsAByteIs255", "SET_PROP_SESSION_NODE_ADDRESS=-1",
-          {Ack("<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n")},
-          [](auto& c) { return S(c).nodeAddress == 255; }),
+          {"<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n"}, STORED(nodeAddress == 255)),
       One("NodeNameTakesAFull64BitValue", "SET_PROP_SESSION_NODE_NAME=12345678901234567890",
-          {Ack("<ACK: SET_PROP_SESSION_NODE_NAME 12345678901234567890> \n")},
-          [](auto& c) { return S(c).nodeName == 12345678901234567890ull; }),
+          {"<ACK: SET_PROP_SESSION_NODE_NAME 12345678901234567890> \n"},
+          STORED(nodeName == 12345678901234567890ull)),
   };
 }
 
@@ -136,23 +135,22 @@ std::vector<Row> StoreOnlyValidRows() {
   const std::string io = "SET_PROP_SESSION_CAN_IOMODE=";
   const std::string app = "SET_PROP_SESSION_APPLICATION_PROTOCOL=";
   const std::string ioError = "<ERROR: SET_PROP_SESSION_CAN_IOMODE: Value range error>\n";
-  const std::string appError = "<ERROR: SET_PROP_SESSION_APPLICATION_PROTOCOL: Value range error>\n";
+  const std::string appError =
+      "<ERROR: SET_PROP_SESSION_APPLICATION_PROTOCOL: Value range error>\n";
   return {
-      One("CanIoModeTwoIsStored", io + "2", {Ack("<ACK: SET_PROP_SESSION_IOMODE 2> \n")},
-          [](auto& c) { return S(c).canIoMode == 2; }),
+      One("CanIoModeTwoIsStored", io + "2", {"<ACK: SET_PROP_SESSION_IOMODE 2> \n"},
+          STORED(canIoMode == 2)),
       {"CanIoModeOutOfRangeGivesTheErrorThenTheAcknowledgementAndKeepsTheOldMode",
-       {{io + "1", {Ack("<ACK: SET_PROP_SESSION_IOMODE 1> \n")}},
-        {io + "5", {Error(ioError), Ack("<ACK: SET_PROP_SESSION_IOMODE 5> \n")}}},
-       [](auto& c) { return S(c).canIoMode == 1; }},
+       {{io + "1", {"<ACK: SET_PROP_SESSION_IOMODE 1> \n"}},
+        {io + "5", {ioError, "<ACK: SET_PROP_SESSION_IOMODE 5> \n"}}},
+       STORED(canIoMode == 1)},
       One("CanIoModeMinusOneIsOutOfRange", io + "-1",
-          {Error(ioError), Ack("<ACK: SET_PROP_SESSION_IOMODE -1> \n")},
-          [](auto& c) { return S(c).canIoMode == 0; }),
+          {ioError, "<ACK: SET_PROP_SESSION_IOMODE -1> \n"}, STORED(canIoMode == 0)),
       One("ApplicationProtocolOneIsStored", app + "1",
-          {Ack("<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 1> \n")},
-          [](auto& c) { return S(c).applicationProtocol == 1; }),
+          {"<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 1> \n"}, STORED(applicationProtocol == 1)),
       One("ApplicationProtocolTwoGivesTheErrorThenTheAcknowledgement", app + "2",
-          {Error(appError), Ack("<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 2> \n")},
-          [](auto& c) { return S(c).applicationProtocol == 0; }),
+          {appError, "<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 2> \n"},
+          STORED(applicationProtocol == 0)),
   };
 }
 
@@ -161,122 +159,96 @@ std::vector<Row> CheckedRows() {
   const std::string statError = "<ERROR: SET_PROP_TX_TIME_STATISTIC: Value range error>\n";
   const std::string xcvrError = "<ERROR: SET_PROP_SESSION_TRANSCEIVER_TYPE: Value range error>\n";
   return {
-      One("LogFileOneIsAcknowledged", "SET_PROP_LOGFILE=1", {Ack("<ACK: SET_PROP_LOGFILE 1> \n")},
-          [](auto& c) { return S(c).logFileEnabled == 1; }),
-      One("LogFileTwoIsARangeErrorAndStaysStored", "SET_PROP_LOGFILE=2", {Error(logError)},
-          [](auto& c) { return S(c).logFileEnabled == 2; }),
+      One("LogFileOneIsAcknowledged", "SET_PROP_LOGFILE=1", {"<ACK: SET_PROP_LOGFILE 1> \n"},
+          STORED(logFileEnabled == 1)),
+      One("LogFileTwoIsARangeErrorAndStaysStored", "SET_PROP_LOGFILE=2", {logError},
+          STORED(logFileEnabled == 2)),
       One("LogFile256IsAcknowledgedAsZero", "SET_PROP_LOGFILE=256",
-          {Ack("<ACK: SET_PROP_LOGFILE 0> \n")}),
-      One("LogFileMinusOneIsByte255AndARangeError", "SET_PROP_LOGFILE=-1", {Error(logError)},
-          [](auto& c) { return S(c).logFileEnabled == 255; }),
+          {"<ACK: SET_PROP_LOGFILE 0> \n"}),
+      One("LogFileMinusOneIsByte255AndARangeError", "SET_PROP_LOGFILE=-1", {logError},
+          STORED(logFileEnabled == 255)),
       One("LogFileTypeTwoIsTheHighestAccepted", "SET_PROP_LOGFILE_TYPE=2",
-          {Ack("<ACK: SET_PROP_LOGFILE_TYPE 2> \n")},
-          [](auto& c) { return S(c).logFileType == 2; }),
+          {"<ACK: SET_PROP_LOGFILE_TYPE 2> \n"}, STORED(logFileType == 2)),
       One("LogFileTypeThreeIsARangeError", "SET_PROP_LOGFILE_TYPE=3",
-          {Error("<ERROR: SET_PROP_LOGFILE_TYPE: Value range error>\n")},
-          [](auto& c) { return S(c).logFileType == 3; }),
-      One("TxTimeStatistic999IsARangeError", "SET_PROP_TX_TIME_STATISTIC=999", {Error(statError)},
-          [](auto& c) { return S(c).txTimeStatistic == 999; }),
+          {"<ERROR: SET_PROP_LOGFILE_TYPE: Value range error>\n"}, STORED(logFileType == 3)),
+      One("TxTimeStatistic999IsARangeError", "SET_PROP_TX_TIME_STATISTIC=999", {statError},
+          STORED(txTimeStatistic == 999)),
       One("TxTimeStatistic1000IsAcknowledged", "SET_PROP_TX_TIME_STATISTIC=1000",
-          {Ack("<ACK: SET_PROP_TX_TIME_STATISTIC 1000> \n")}),
+          {"<ACK: SET_PROP_TX_TIME_STATISTIC 1000> \n"}),
       One("TxTimeStatisticMinusOneIsAcknowledgedByTheUnsignedCheck",
-          "SET_PROP_TX_TIME_STATISTIC=-1", {Ack("<ACK: SET_PROP_TX_TIME_STATISTIC -1> \n")}),
+          "SET_PROP_TX_TIME_STATISTIC=-1", {"<ACK: SET_PROP_TX_TIME_STATISTIC -1> \n"}),
       One("TransceiverTypeFourIsTheHighestAccepted", "SET_PROP_SESSION_TRANSCEIVER_TYPE=4",
-          {Ack("<ACK: SET_PROP_SESSION_TRANSCEIVER_TYPE 4> \n")}),
-      One("TransceiverTypeFiveIsARangeError", "SET_PROP_SESSION_TRANSCEIVER_TYPE=5",
-          {Error(xcvrError)}),
+          {"<ACK: SET_PROP_SESSION_TRANSCEIVER_TYPE 4> \n"}),
+      One("TransceiverTypeFiveIsARangeError", "SET_PROP_SESSION_TRANSCEIVER_TYPE=5", {xcvrError}),
       One("TransceiverTypeMinusOneIsARangeError", "SET_PROP_SESSION_TRANSCEIVER_TYPE=-1",
-          {Error(xcvrError)}),
-      One("ShowNullFramesOne", "SET_PROP_SESSION_SHOW_NULL_FRAMES=1",
-          {Ack("<ACK: SET_PROP_SESSION_SHOW_NULL_FRAMES 1> \n")}),
-      One("ShowNullFramesTwo", "SET_PROP_SESSION_SHOW_NULL_FRAMES=2",
-          {Error("<ERROR: SET_PROP_SESSION_SHOW_NULL_FRAMES: Value range error>\n")}),
-      One("NoResponseFramesOne", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1",
-          {Ack("<ACK: SET_PROP_SESSION_NO_RESPONSE_FRAMES 1> \n")},
-          [](auto& c) { return S(c).noResponseFrames == 1; }),
-      One("NoResponseFramesTwo", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=2",
-          {Error("<ERROR: SET_PROP_SESSION_NO_RESPONSE_FRAMES: Value range error>\n")}),
-      One("LogChecksumOne", "SET_PROP_SESSION_LOG_CHECKSUM=1",
-          {Ack("<ACK: SET_PROP_SESSION_LOG_CHECKSUM 1> \n")},
-          [](auto& c) { return S(c).logChecksum == 1; }),
-      One("LogChecksumTwo", "SET_PROP_SESSION_LOG_CHECKSUM=2",
-          {Error("<ERROR: SET_PROP_SESSION_LOG_CHECKSUM: Value range error>\n")}),
+          {xcvrError}),
+      Switch("ShowNullFramesTakesOnlyZeroOrOne", "SET_PROP_SESSION_SHOW_NULL_FRAMES"),
+      Switch("NoResponseFramesTakesOnlyZeroOrOne", "SET_PROP_SESSION_NO_RESPONSE_FRAMES",
+             STORED(noResponseFrames == 1)),
+      Switch("LogChecksumTakesOnlyZeroOrOne", "SET_PROP_SESSION_LOG_CHECKSUM",
+             STORED(logChecksum == 1)),
   };
 }
 
 std::vector<Row> SessionLockedRows() {
   return {
-      One("LogTransmittedFramesOne", "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=1",
-          {Ack("<ACK: SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES 1> \n")},
-          [](auto& c) { return S(c).logTransmittedFrames == 1; }),
-      One("LogTransmittedFramesTwo", "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=2",
-          {Error("<ERROR: SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES: Value range error>\n")}),
+      Switch("LogTransmittedFramesTakesOnlyZeroOrOne", "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES",
+             STORED(logTransmittedFrames == 1)),
       One("TerminationOne", "SET_PROP_SESSION_TERMINATION=1",
-          {Ack("<ACK: SET_PROP_SESSION_TERMINATION 1> \n")},
-          [](auto& c) { return S(c).termination == 1; }),
+          {"<ACK: SET_PROP_SESSION_TERMINATION 1> \n"}, STORED(termination == 1)),
       One("TerminationMinusOneFailsTheUnsignedCheckAndStaysStored",
           "SET_PROP_SESSION_TERMINATION=-1",
-          {Error("<ERROR: SET_PROP_SESSION_TERMINATION: Value range error>\n")},
-          [](auto& c) { return S(c).termination == 0xFFFFFFFFu; }),
+          {"<ERROR: SET_PROP_SESSION_TERMINATION: Value range error>\n"},
+          STORED(termination == 0xFFFFFFFFu)),
       One("RunModeNormal", "SET_PROP_SESSION_RUNMODE=NORMAL",
-          {Ack("<ACK: SET_PROP_SESSION_RUNMODE NORMAL> \n")},
-          [](auto& c) { return S(c).runMode.Get() == "NORMAL"; }),
+          {"<ACK: SET_PROP_SESSION_RUNMODE NORMAL> \n"}, STORED(runMode.Get() == "NORMAL")),
       One("RunModeWordAnywhereInTheText", "SET_PROP_SESSION_RUNMODE=XNORMALX",
-          {Ack("<ACK: SET_PROP_SESSION_RUNMODE XNORMALX> \n")}),
+          {"<ACK: SET_PROP_SESSION_RUNMODE XNORMALX> \n"}),
       One("RunModeWithoutAKnownWordIsARangeErrorAndStaysStored", "SET_PROP_SESSION_RUNMODE=MASTER",
-          {Error("<ERROR: SET_PROP_SESSION_RUNMODE: Value range error>\n")},
-          [](auto& c) { return S(c).runMode.Get() == "MASTER"; }),
-      One("ListenOnlyOne", "SET_PROP_SESSION_LISTEN_ONLY=1",
-          {Ack("<ACK: SET_PROP_SESSION_LISTEN_ONLY 1> \n")},
-          [](auto& c) { return S(c).listenOnly == 1; }),
-      One("ListenOnlyTwo", "SET_PROP_SESSION_LISTEN_ONLY=2",
-          {Error("<ERROR: SET_PROP_SESSION_LISTEN_ONLY: Value range error>\n")}),
-      One("LogBusErrorFramesOne", "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1",
-          {Ack("<ACK: SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES 1> \n")},
-          [](auto& c) { return S(c).logBusErrorFrames == 1; }),
-      One("LogBusErrorFramesTwo", "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=2",
-          {Error("<ERROR: SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES: Value range error>\n")}),
+          {"<ERROR: SET_PROP_SESSION_RUNMODE: Value range error>\n"},
+          STORED(runMode.Get() == "MASTER")),
+      Switch("ListenOnlyTakesOnlyZeroOrOne", "SET_PROP_SESSION_LISTEN_ONLY",
+             STORED(listenOnly == 1)),
+      Switch("LogBusErrorFramesTakesOnlyZeroOrOne", "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES",
+             STORED(logBusErrorFrames == 1)),
       One("AliasKeepsEverythingAfterTheFirstEquals", "SET_PROP_SESSION_ALIAS=a=b",
-          {Ack("<ACK: SET_PROP_SESSION_ALIAS a=b> \n")},
-          [](auto& c) { return S(c).alias.Get() == "a=b"; }),
-      One("AliasEmptyIsAcknowledged", "SET_PROP_SESSION_ALIAS=",
-          {Ack("<ACK: SET_PROP_SESSION_ALIAS > \n")}),
+          {"<ACK: SET_PROP_SESSION_ALIAS a=b> \n"}, STORED(alias.Get() == "a=b")),
+      One("AliasEmptyIsAcknowledged",
+          "SET_PROP_SESSION_ALIAS=", {"<ACK: SET_PROP_SESSION_ALIAS > \n"}),
       One("AliasLongerThan200CharactersIsAnsweredInFull", "SET_PROP_SESSION_ALIAS=" + kLongTail,
-          {Ack("<ACK: SET_PROP_SESSION_ALIAS " + kLongTail + "> \n")}),
-      One("Cluster", "SET_PROP_SESSION_CLUSTER=Body", {Ack("<ACK: SET_PROP_SESSION_CLUSTER Body> \n")},
-          [](auto& c) { return S(c).cluster.Get() == "Body"; }),
+          {"<ACK: SET_PROP_SESSION_ALIAS " + kLongTail + "> \n"}),
+      One("Cluster", "SET_PROP_SESSION_CLUSTER=Body", {"<ACK: SET_PROP_SESSION_CLUSTER Body> \n"},
+          STORED(cluster.Get() == "Body")),
   };
 }
 
 std::vector<Row> LogNameRows() {
   const std::string name = "SET_PROP_LOGFILE_NAME=";
-  auto isDefault = [](auto& c) { return S(c).logFileName.Get() == "KelvaneLog"; };
+  auto isDefault = STORED(logFileName.Get() == "KelvaneLog");
   return {
       One("LogFileNameIsStored", name + "drive1.run2",
-          {Ack("<ACK: SET_PROP_LOGFILE_NAME drive1.run2> \n")},
-          [](auto& c) { return S(c).logFileName.Get() == "drive1.run2"; }),
-      One("LogFileNameEmptyGivesTheErrorThenTheDefaultName", name,
-          {Error(kNoValidName), kKelvaneLogAck}, isDefault),
+          {"<ACK: SET_PROP_LOGFILE_NAME drive1.run2> \n"},
+          STORED(logFileName.Get() == "drive1.run2")),
+      One("LogFileNameEmptyGivesTheErrorThenTheDefaultName", name, {kNoValidName, kKelvaneLogAck},
+          isDefault),
       One("LogFileNameWithBackslashIsNoValidName", name + "..\\..\\evil",
-          {Error(kNoValidName), kKelvaneLogAck}, isDefault),
-      One("LogFileNameWithSlashIsNoValidName", name + "sub/evil",
-          {Error(kNoValidName), kKelvaneLogAck}, isDefault),
-      One("LogFileNameDotIsNoValidName", name + ".", {Error(kNoValidName), kKelvaneLogAck},
+          {kNoValidName, kKelvaneLogAck}, isDefault),
+      One("LogFileNameWithSlashIsNoValidName", name + "sub/evil", {kNoValidName, kKelvaneLogAck},
           isDefault),
-      One("LogFileNameDotDotIsNoValidName", name + "..", {Error(kNoValidName), kKelvaneLogAck},
-          isDefault),
+      One("LogFileNameDotIsNoValidName", name + ".", {kNoValidName, kKelvaneLogAck}, isDefault),
+      One("LogFileNameDotDotIsNoValidName", name + "..", {kNoValidName, kKelvaneLogAck}, isDefault),
       One("LogFileNameLongerThan200CharactersIsAnsweredInFull", name + kLongTail,
-          {Ack("<ACK: SET_PROP_LOGFILE_NAME " + kLongTail + "> \n")}),
+          {"<ACK: SET_PROP_LOGFILE_NAME " + kLongTail + "> \n"}),
       One("VoraGroupNameHasNoLineEnd", "SET_PROP_LOGFILE_VORA_GROUP_NAME=Drive",
-          {Ack("<ACK: SET_PROP_LOGFILE_VORA_GROUP_NAME Drive>")},
-          [](auto& c) { return S(c).voraGroupName.Get() == "Drive"; }),
+          {"<ACK: SET_PROP_LOGFILE_VORA_GROUP_NAME Drive>"},
+          STORED(voraGroupName.Get() == "Drive")),
       One("VoraGroupNameEmpty", "SET_PROP_LOGFILE_VORA_GROUP_NAME=",
-          {Error("<ERROR: SET_PROP_LOGFILE_VORA_GROUP_NAME: empty paramter>\n")}),
+          {"<ERROR: SET_PROP_LOGFILE_VORA_GROUP_NAME: empty paramter>\n"}),
       One("VoraChannelNameHasNoLineEnd", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=Frames",
-          {Ack("<ACK: SET_PROP_LOGFILE_VORA_CHANNEL_NAME Frames>")},
-          [](auto& c) { return S(c).voraChannelName.Get() == "Frames"; }),
+          {"<ACK: SET_PROP_LOGFILE_VORA_CHANNEL_NAME Frames>"},
+          STORED(voraChannelName.Get() == "Frames")),
       One("VoraChannelNameEmpty", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=",
-          {Error("<ERROR: SET_PROP_LOGFILE_VORA_CHANNEL_NAME: empty paramter>\n")}),
+          {"<ERROR: SET_PROP_LOGFILE_VORA_CHANNEL_NAME: empty paramter>\n"}),
   };
 }
 
@@ -291,7 +263,7 @@ std::vector<Row> AllRows() {
 
 // A message whose known reply proves that nothing else was sent before it.
 const std::string kSentinel = "SET_PROP_FOO=1";
-const ExpectedReply kSentinelReply = Error("<ERROR: unknown SETPROP command>\n");
+const ExpectedReply kSentinelReply = "<ERROR: unknown SETPROP command>\n";
 
 class PropertyRepliesTest : public ServiceFixture, public ::testing::WithParamInterface<Row> {
  protected:

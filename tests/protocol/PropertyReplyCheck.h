@@ -11,13 +11,15 @@
 
 namespace kvtest {
 
+// The exact payload bytes of a reply; an error text travels as type 5, any other as type 3.
 struct ExpectedReply {
-  uint8_t type;      // kvhost::kText or kvhost::kErrorText
-  std::string text;  // exact payload bytes
+  ExpectedReply(std::string reply)
+      : type(reply.rfind("<ERROR", 0) == 0 ? kvhost::kErrorText : kvhost::kText),
+        text(std::move(reply)) {}
+  ExpectedReply(const char* reply) : ExpectedReply(std::string(reply)) {}
+  uint8_t type;
+  std::string text;
 };
-
-inline ExpectedReply Ack(std::string text) { return {kvhost::kText, std::move(text)}; }
-inline ExpectedReply Error(std::string text) { return {kvhost::kErrorText, std::move(text)}; }
 
 // What header bytes 12 to 19 must carry: zeros, or a session's identifier count and status.
 struct SessionShown {

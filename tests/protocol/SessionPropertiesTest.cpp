@@ -5,19 +5,18 @@
 #include <string>
 #include <vector>
 
-#include "bus/CBusSystem.h"
 #include "host/HostClient.h"
 #include "platform/net/Socket.h"
 #include "protocol/Dispatcher.h"
 #include "service/HostConnection.h"
 #include "service/Listener.h"
 #include "tests/protocol/PropertyReplyCheck.h"
+#include "tests/support/FakeSession.h"
 
 namespace kvtest {
 namespace {
 
 namespace net = platform::net;
-using nKV_DLL300::CBusSystem;
 using nKV_DLL300::HostConnection;
 
 constexpr std::chrono::milliseconds kDeadline = std::chrono::seconds(10);
@@ -25,18 +24,6 @@ constexpr uint16_t kSessionIdCount = 0x1234;
 constexpr int32_t kSessionStatus = -21;
 constexpr SessionShown kShown{kSessionIdCount, kSessionStatus};
 constexpr SessionShown kHidden{};
-
-// A session that does nothing: it only gives the header its identifier count and status.
-class IdleSession : public CBusSystem {
- public:
-  IdleSession(HostConnection* owner, uint32_t kind) : CBusSystem(owner, kind) {}
-  int32_t pollOnce() override { return 0; }
-  int32_t stop() override { return 0; }
-  void startPollThread() override {}
-  int32_t clearDriverSession() override { return 0; }
-  int32_t pollLoop() override { return 0; }
-  void reportBusState(uint64_t) override {}
-};
 
 // A connection over loopback TCP whose handlers run on the test thread, so the test can give it
 // a session directly. The host side reads the replies.
@@ -58,7 +45,7 @@ class SessionPropertiesTest : public ::testing::Test {
 
   void StartSession(uint32_t busType) {
     connection_->busType.store(busType);
-    auto session = std::make_unique<IdleSession>(connection_.get(), busType);
+    auto session = std::make_unique<FakeSession>(connection_.get(), calls_, busType);
     session->idCount.store(kSessionIdCount);
     session->lastStatus.store(kSessionStatus);
     connection_->session = std::move(session);
@@ -74,11 +61,12 @@ class SessionPropertiesTest : public ::testing::Test {
   }
   // Proves that nothing was sent since the last checked reply.
   void ExpectNothingMore() {
-    ExpectReplies("SET_PROP_FOO=1", {Error("<ERROR: unknown SETPROP command>\n")}, kHidden);
+    ExpectReplies("SET_PROP_FOO=1", {"<ERROR: unknown SETPROP command>\n"}, kHidden);
   }
 
   net::SocketHandle listener_ = net::kInvalidSocket;
   kvhost::HostClient host_;
+  FakeSession::Calls calls_;  // a session that only gives the header its count and status
   std::unique_ptr<HostConnection> connection_;
   uint32_t sequence_ = 0;
 };
@@ -89,42 +77,40 @@ struct LockedProperty {
 };
 
 const LockedProperty kLockedProperties[] = {
-    {"SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES", "1"}, {"SET_PROP_SESSION_TERMINATION", "1"},
-    {"SET_PROP_SESSION_RUNMODE", "NORMAL"},           {"SET_PROP_SESSION_LISTEN_ONLY", "1"},
-    {"SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES", "1"},   {"SET_PROP_SESSION_ALIAS", "SimDB"},
+    {"SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES", "1"},
+    {"SET_PROP_SESSION_TERMINATION", "1"},
+    {"SET_PROP_SESSION_RUNMODE", "NORMAL"},
+    {"SET_PROP_SESSION_LISTEN_ONLY", "1"},
+    {"SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES", "1"},
+    {"SET_PROP_SESSION_ALIAS", "SimDB"},
     {"SET_PROP_SESSION_CLUSTER", "Body"},
 };
 
+// A refused value is still stored for the next session.
 TEST_F(SessionPropertiesTest, SessionSettingsAreRefusedNamingTheBusOfTheSession) {
   const std::pair<uint32_t, std::string> buses[] = {{1, "CAN"}, {2, "LIN"}, {3, "FR"}};
   for (const auto& [busType, word] : buses) {
     StartSession(busType);
     for (const LockedProperty& property : kLockedProperties) {
       ExpectReplies(property.name + "=" + property.value,
-                    {Error("<ERROR: " + property.name + ": " + word + " Session yet created>\n")},
-                    kShown);
+                    {"<ERROR: " + property.name + ": " + word + " Session yet created>\n"}, kShown);
     }
   }
   ExpectNothingMore();
-}
-
-TEST_F(SessionPropertiesTest, RefusedValueIsStillStoredForTheNextSession) {
-  StartSession(1);
-  ExpectReplies("SET_PROP_SESSION_TERMINATION=1",
-                {Error("<ERROR: SET_PROP_SESSION_TERMINATION: CAN Session yet created>\n")},
-                kShown);
-  ExpectReplies("SET_PROP_SESSION_RUNMODE=NORMAL",
-                {Error("<ERROR: SET_PROP_SESSION_RUNMODE: CAN Session yet created>\n")}, kShown);
-  EXPECT_EQ(connection_->settings.termination.load(), 1u);
-  EXPECT_EQ(connection_->settings.runMode.Get(), "NORMAL");
+  const nKV_DLL300::SessionSettings& stored = connection_->settings;
+  EXPECT_EQ(stored.logTransmittedFrames.load(), 1);
+  EXPECT_EQ(stored.termination.load(), 1u);
+  EXPECT_EQ(stored.runMode.Get(), "NORMAL");
+  EXPECT_EQ(stored.alias.Get(), "SimDB");
+  EXPECT_EQ(stored.cluster.Get(), "Body");
 }
 
 TEST_F(SessionPropertiesTest, RangeErrorComesBeforeTheRefusalAndShowsNoSession) {
   StartSession(2);
   ExpectReplies("SET_PROP_SESSION_LISTEN_ONLY=7",
-                {Error("<ERROR: SET_PROP_SESSION_LISTEN_ONLY: Value range error>\n")}, kHidden);
+                {"<ERROR: SET_PROP_SESSION_LISTEN_ONLY: Value range error>\n"}, kHidden);
   ExpectReplies("SET_PROP_SESSION_RUNMODE=MASTER",
-                {Error("<ERROR: SET_PROP_SESSION_RUNMODE: Value range error>\n")}, kHidden);
+                {"<ERROR: SET_PROP_SESSION_RUNMODE: Value range error>\n"}, kHidden);
   EXPECT_EQ(connection_->settings.listenOnly.load(), 7);
   ExpectNothingMore();
 }
@@ -139,62 +125,51 @@ TEST_F(SessionPropertiesTest, SessionOfNoKnownBusGetsNoReplyButTheValueIsStored)
 // Replies marked "with session" carry the session's count and status in bytes 12 to 19; all
 // others carry zeros although the connection has a session.
 TEST_F(SessionPropertiesTest, HeaderShowsTheSessionOnlyInRepliesThatCarryIt) {
+  const std::string range = ": Value range error>\n";
+  const std::pair<std::string, std::vector<ExpectedReply>> shown[] = {
+      {"SET_PROP_SESSION_KEY_SLOT=3", {"<ACK: SET_PROP_SESSION_KEY_SLOT 3> \n"}},
+      {"SET_PROP_SESSION_CANFD_BAUDRATE=2", {"<ACK: SET_PROP_SESSION_CANFD_BAUDRATE 2> \n"}},
+      {"SET_PROP_SESSION_ISOFD_MODE=1", {"<ACK: SET_PROP_SESSION_ISOFD_MODE  1> \n"}},
+      {"SET_PROP_SESSION_NODE_ADDRESS=5", {"<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n"}},
+      {"SET_PROP_SESSION_NODE_NAME=9", {"<ACK: SET_PROP_SESSION_NODE_NAME 9> \n"}},
+      {"SET_PROP_SESSION_TRANSCEIVER_TYPE=9",
+       {"<ERROR: SET_PROP_SESSION_TRANSCEIVER_TYPE" + range}},
+      {"SET_PROP_SESSION_SHOW_NULL_FRAMES=1", {"<ACK: SET_PROP_SESSION_SHOW_NULL_FRAMES 1> \n"}},
+      {"SET_PROP_SESSION_NO_RESPONSE_FRAMES=3",
+       {"<ERROR: SET_PROP_SESSION_NO_RESPONSE_FRAMES" + range}},
+      {"SET_PROP_SESSION_LOG_CHECKSUM=0", {"<ACK: SET_PROP_SESSION_LOG_CHECKSUM 0> \n"}},
+      {"SET_PROP_SESSION_CAN_IOMODE=3",
+       {"<ERROR: SET_PROP_SESSION_CAN_IOMODE" + range, "<ACK: SET_PROP_SESSION_IOMODE 3> \n"}},
+      {"SET_PROP_SESSION_APPLICATION_PROTOCOL=1",
+       {"<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 1> \n"}},
+  };
+  const std::pair<std::string, ExpectedReply> hidden[] = {
+      {"SET_PROP_SESSION_BAUDRATE=500000", "<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n"},
+      {"SET_PROP_TX_TIME_DATA=100", "<ACK: SETPROP_TXTIMECAN 100> \n"},
+      {"SET_PROP_DATA_LOG_IDS_MAX=10", "<ACK: SET_PROP_MEM_SIZE_ID 10> \n"},
+      {"SET_PROP_LOGFILE=3", "<ERROR: SET_PROP_LOGFILE" + range},
+      {"SET_PROP_LOGFILE_TYPE=1", "<ACK: SET_PROP_LOGFILE_TYPE 1> \n"},
+      {"SET_PROP_TX_TIME_STATISTIC=2000", "<ACK: SET_PROP_TX_TIME_STATISTIC 2000> \n"},
+      {"SET_PROP_LOGFILE_VORA_GROUP_NAME=G", "<ACK: SET_PROP_LOGFILE_VORA_GROUP_NAME G>"},
+      {"SET_PROP_SESSION_PORTNAME=CAN2", "<ACK: SET_PROP_SESSION_PORTNAME CAN2>"},
+  };
   StartSession(1);
-  ExpectReplies("SET_PROP_SESSION_KEY_SLOT=3", {Ack("<ACK: SET_PROP_SESSION_KEY_SLOT 3> \n")},
-                kShown);
-  ExpectReplies("SET_PROP_SESSION_CANFD_BAUDRATE=2000000",
-                {Ack("<ACK: SET_PROP_SESSION_CANFD_BAUDRATE 2000000> \n")}, kShown);
-  ExpectReplies("SET_PROP_SESSION_ISOFD_MODE=1",
-                {Ack("<ACK: SET_PROP_SESSION_ISOFD_MODE  1> \n")}, kShown);
-  ExpectReplies("SET_PROP_SESSION_NODE_ADDRESS=5", {Ack("<ACK: SET_PROP_SESSION_NODE_ADDRESS>\n")},
-                kShown);
-  ExpectReplies("SET_PROP_SESSION_NODE_NAME=9", {Ack("<ACK: SET_PROP_SESSION_NODE_NAME 9> \n")},
-                kShown);
-  ExpectReplies("SET_PROP_SESSION_TRANSCEIVER_TYPE=9",
-                {Error("<ERROR: SET_PROP_SESSION_TRANSCEIVER_TYPE: Value range error>\n")}, kShown);
-  ExpectReplies("SET_PROP_SESSION_SHOW_NULL_FRAMES=1",
-                {Ack("<ACK: SET_PROP_SESSION_SHOW_NULL_FRAMES 1> \n")}, kShown);
-  ExpectReplies("SET_PROP_SESSION_NO_RESPONSE_FRAMES=3",
-                {Error("<ERROR: SET_PROP_SESSION_NO_RESPONSE_FRAMES: Value range error>\n")},
-                kShown);
-  ExpectReplies("SET_PROP_SESSION_LOG_CHECKSUM=0", {Ack("<ACK: SET_PROP_SESSION_LOG_CHECKSUM 0> \n")},
-                kShown);
-  ExpectReplies("SET_PROP_SESSION_CAN_IOMODE=3",
-                {Error("<ERROR: SET_PROP_SESSION_CAN_IOMODE: Value range error>\n"),
-                 Ack("<ACK: SET_PROP_SESSION_IOMODE 3> \n")},
-                kShown);
-  ExpectReplies("SET_PROP_SESSION_APPLICATION_PROTOCOL=1",
-                {Ack("<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 1> \n")}, kShown);
-
-  ExpectReplies("SET_PROP_SESSION_BAUDRATE=500000",
-                {Ack("<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n")}, kHidden);
-  ExpectReplies("SET_PROP_TX_TIME_DATA=100", {Ack("<ACK: SETPROP_TXTIMECAN 100> \n")}, kHidden);
-  ExpectReplies("SET_PROP_DATA_LOG_IDS_MAX=10", {Ack("<ACK: SET_PROP_MEM_SIZE_ID 10> \n")},
-                kHidden);
-  ExpectReplies("SET_PROP_LOGFILE=3", {Error("<ERROR: SET_PROP_LOGFILE: Value range error>\n")},
-                kHidden);
-  ExpectReplies("SET_PROP_LOGFILE_TYPE=1", {Ack("<ACK: SET_PROP_LOGFILE_TYPE 1> \n")}, kHidden);
-  ExpectReplies("SET_PROP_TX_TIME_STATISTIC=2000",
-                {Ack("<ACK: SET_PROP_TX_TIME_STATISTIC 2000> \n")}, kHidden);
-  ExpectReplies("SET_PROP_LOGFILE_VORA_GROUP_NAME=G",
-                {Ack("<ACK: SET_PROP_LOGFILE_VORA_GROUP_NAME G>")}, kHidden);
-  ExpectReplies("SET_PROP_SESSION_PORTNAME=CAN2", {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN2>")},
-                kHidden);
+  for (const auto& [text, replies] : shown) ExpectReplies(text, replies, kShown);
+  for (const auto& [text, reply] : hidden) ExpectReplies(text, {reply}, kHidden);
   ExpectNothingMore();
 }
 
 TEST_F(SessionPropertiesTest, LogFileNameIsRefusedOnlyWhileASessionLogs) {
-  ExpectReplies("SET_PROP_LOGFILE=1", {Ack("<ACK: SET_PROP_LOGFILE 1> \n")}, kHidden);
-  ExpectReplies("SET_PROP_LOGFILE_NAME=first", {Ack("<ACK: SET_PROP_LOGFILE_NAME first> \n")},
-                kHidden);
+  ExpectReplies("SET_PROP_LOGFILE=1", {"<ACK: SET_PROP_LOGFILE 1> \n"}, kHidden);
+  ExpectReplies("SET_PROP_LOGFILE_NAME=first", {"<ACK: SET_PROP_LOGFILE_NAME first> \n"}, kHidden);
   StartSession(1);
   ExpectReplies("SET_PROP_LOGFILE_NAME=second",
-                {Error("<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n")}, kHidden);
-  ExpectReplies("SET_PROP_LOGFILE_NAME=",
-                {Error("<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n")}, kHidden);
+                {"<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n"}, kHidden);
+  ExpectReplies("SET_PROP_LOGFILE_NAME=", {"<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n"},
+                kHidden);
   EXPECT_EQ(connection_->settings.logFileName.Get(), "first");
-  ExpectReplies("SET_PROP_LOGFILE=0", {Ack("<ACK: SET_PROP_LOGFILE 0> \n")}, kHidden);
-  ExpectReplies("SET_PROP_LOGFILE_NAME=second", {Ack("<ACK: SET_PROP_LOGFILE_NAME second> \n")},
+  ExpectReplies("SET_PROP_LOGFILE=0", {"<ACK: SET_PROP_LOGFILE 0> \n"}, kHidden);
+  ExpectReplies("SET_PROP_LOGFILE_NAME=second", {"<ACK: SET_PROP_LOGFILE_NAME second> \n"},
                 kHidden);
   ExpectNothingMore();
 }
@@ -202,16 +177,15 @@ TEST_F(SessionPropertiesTest, LogFileNameIsRefusedOnlyWhileASessionLogs) {
 // A live session keeps the bus it was made for: a port of another bus is stored for the next
 // session, while refusals and transmit keep following the live session.
 TEST_F(SessionPropertiesTest, PortOfAnotherBusIsTakenForTheNextSessionWhileOneRuns) {
-  ExpectReplies("SET_PROP_SESSION_PORTNAME=CAN1", {Ack("<ACK: SET_PROP_SESSION_PORTNAME CAN1>")},
+  ExpectReplies("SET_PROP_SESSION_PORTNAME=CAN1", {"<ACK: SET_PROP_SESSION_PORTNAME CAN1>"},
                 kHidden);
   StartSession(1);
-  ExpectReplies("SET_PROP_SESSION_PORTNAME=LIN1", {Ack("<ACK: SET_PROP_SESSION_PORTNAME LIN1>")},
+  ExpectReplies("SET_PROP_SESSION_PORTNAME=LIN1", {"<ACK: SET_PROP_SESSION_PORTNAME LIN1>"},
                 kHidden);
   EXPECT_EQ(connection_->busType.load(), 2u);
   EXPECT_EQ(connection_->settings.interfaceName.Get(), "LIN1@qv_corle_tarvix");
   ExpectReplies("SET_PROP_SESSION_TERMINATION=1",
-                {Error("<ERROR: SET_PROP_SESSION_TERMINATION: CAN Session yet created>\n")},
-                kShown);
+                {"<ERROR: SET_PROP_SESSION_TERMINATION: CAN Session yet created>\n"}, kShown);
   ExpectNothingMore();
 }
 

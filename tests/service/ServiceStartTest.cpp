@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <vector>
 
 #include "tests/support/ServiceFixture.h"
 
@@ -29,31 +30,38 @@ TEST_F(ServiceStartTest, PortThatIsNotANumberLetsTheSystemChoose) {
   EXPECT_TRUE(host.connected());
 }
 
-TEST_F(ServiceStartTest, MissingServiceDirectoryIsCreatedSilently) {
-  testing::internal::CaptureStderr();
-  StartService(kSetUpOnly);
-  std::string console = testing::internal::GetCapturedStderr();
-  EXPECT_TRUE(std::filesystem::is_directory(drive_.Native("QV-RT\\tarvix\\kelvane")));
-  EXPECT_EQ(console, "");
-}
+struct ConsoleRow {
+  const char* what;
+  const char* file;  // written before the start, nullptr: nothing
+  const char* contents;
+  std::vector<std::string> words;  // each must be in the console; none: the console stays empty
+};
 
-TEST_F(ServiceStartTest, UnusableServiceDirectoryFallsBackToTheDefaultPortWithOneLine) {
-  drive_.WriteFile("QV-RT", "a file where the directory should be");
-  testing::internal::CaptureStderr();
-  StartService(kSetUpOnly);
-  std::string console = testing::internal::GetCapturedStderr();
-  EXPECT_NE(console.find("kelvane"), std::string::npos) << console;
-  EXPECT_NE(console.find("13456"), std::string::npos) << console;
-  EXPECT_EQ(std::count(console.begin(), console.end(), '\n'), 1) << console;
-}
-
-TEST_F(ServiceStartTest, FirstWordWithoutEqualsIsReportedOnTheConsole) {
-  drive_.WriteFile(kConfigFile, "13456 PORT=2000");
-  testing::internal::CaptureStderr();
-  StartService(kSetUpOnly);
-  std::string console = testing::internal::GetCapturedStderr();
-  EXPECT_NE(console.find("name=port"), std::string::npos) << console;
-  EXPECT_EQ(std::count(console.begin(), console.end(), '\n'), 1) << console;
+TEST_F(ServiceStartTest, SetUpProblemsAreReportedOnTheConsoleInOneLine) {
+  const ConsoleRow rows[] = {
+      {"missing directory is created silently", nullptr, nullptr, {}},
+      {"unusable directory: default port",
+       "QV-RT",
+       "a file where the directory should be",
+       {"kelvane", "13456"}},
+      {"first word without =", kConfigFile, "13456 PORT=2000", {"name=port"}},
+  };
+  for (const ConsoleRow& row : rows) {
+    SCOPED_TRACE(row.what);
+    if (row.file) drive_.WriteFile(row.file, row.contents);
+    testing::internal::CaptureStderr();
+    StartService(kSetUpOnly);
+    std::string console = testing::internal::GetCapturedStderr();
+    StopService();
+    for (const std::string& word : row.words)
+      EXPECT_NE(console.find(word), std::string::npos) << console;
+    EXPECT_EQ(std::count(console.begin(), console.end(), '\n'), row.words.empty() ? 0 : 1)
+        << console;
+    if (row.file == nullptr) {
+      EXPECT_TRUE(std::filesystem::is_directory(drive_.Native("QV-RT\\tarvix\\kelvane")));
+    }
+    std::filesystem::remove_all(drive_.Native("QV-RT"));
+  }
 }
 
 }  // namespace

@@ -56,6 +56,24 @@ std::optional<kvhost::HostMessage> CanSessionTest::Command(kvhost::HostClient& h
   }, kReplyDeadline);
 }
 
+std::optional<kvhost::HostMessage> CanSessionTest::ExpectReply(kvhost::HostClient& host,
+                                                               const std::string& command,
+                                                               const std::string& text,
+                                                               uint8_t type) {
+  auto reply = Command(host, command);
+  EXPECT_TRUE(reply.has_value()) << "no reply to " << command;
+  if (reply) {
+    EXPECT_EQ(reply->text(), text) << command;
+    EXPECT_EQ(reply->header.type, type) << command;
+  }
+  return reply;
+}
+
+void CanSessionTest::ExpectStartFails(kvhost::HostClient& host, const std::string& text) {
+  ExpectReply(host, "CMD_SESSION_START", text, kvhost::kErrorText);
+  EXPECT_TRUE(host.WaitForClose(kReplyDeadline));
+}
+
 std::optional<RecordMessage> CanSessionTest::RecordsWhere(
     kvhost::HostClient& host, const std::function<bool(const RecordMessage&)>& accept) {
   std::optional<RecordMessage> found;
@@ -93,11 +111,7 @@ kvhost::HostClient CanSessionTest::StartedHost(
   nKV_DLL300::HostConnection& connection = ConnectionAt(slot);
   UsePort(connection, port);
   if (configure) configure(connection.settings);
-  auto reply = Command(host, "CMD_SESSION_START");
-  EXPECT_TRUE(reply.has_value());
-  if (reply) {
-    EXPECT_EQ(reply->text(), "<ACK: CMD_SESSION_START>\n");
-  }
+  ExpectReply(host, "CMD_SESSION_START", "<ACK: CMD_SESSION_START>\n");
   return host;
 }
 

@@ -30,6 +30,9 @@ struct RecordMessage {
   const kvhost::IdentifierRecord* find(uint32_t identifier, uint8_t type = kTypeData) const;
 };
 
+// A record message that holds all four identifiers of the default body bus.
+inline bool AllFour(const RecordMessage& m) { return m.records.size() == 4; }
+
 class CanSessionTest : public ServiceFixture {
  protected:
   void SetUp() override;
@@ -46,6 +49,13 @@ class CanSessionTest : public ServiceFixture {
   std::optional<kvhost::HostMessage> NextMessage(
       kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
       std::chrono::milliseconds timeout = kConditionDeadline);
+  // Sends `command` and checks that its text reply is `text` of `type`; returns the reply.
+  std::optional<kvhost::HostMessage> ExpectReply(kvhost::HostClient& host,
+                                                 const std::string& command,
+                                                 const std::string& text,
+                                                 uint8_t type = kvhost::kText);
+  // Sends CMD_SESSION_START, expects the error `text` and the end of the connection.
+  void ExpectStartFails(kvhost::HostClient& host, const std::string& text);
   // The next CAN record message (decoded and checked against its header's count).
   std::optional<RecordMessage> NextRecords(kvhost::HostClient& host);
   // The next record message for which `accept` holds.

@@ -1,12 +1,11 @@
 // The session life cycle and poll loop skeleton in-process, against the simulated driver.
-#include "bus/CTableSession.h"
-
 #include <gtest/gtest.h>
 
 #include <memory_resource>
 
 #include "bus/BusStatistics.h"
 #include "bus/CPollCANDataThread.h"
+#include "bus/CTableSession.h"
 #include "driver/Sessions.h"
 #include "driver/Status.h"
 #include "driver/tarvix.h"
@@ -57,109 +56,94 @@ size_t CallsOf(const std::string& operation) {
 
 class SessionBaseTest : public ::testing::Test {
  protected:
-  void SetUp() override { tarvix::ResetToDefaults(); }
-  void TearDown() override { tarvix::ResetToDefaults(); }
+  void SetUp() override {
+    tarvix::ResetToDefaults();
+    session = std::make_unique<MinimalSession>(&connection);
+    ASSERT_EQ(session->open(), 0);
+  }
+  void TearDown() override {
+    session.reset();
+    tarvix::ResetToDefaults();
+  }
 
   // Without a socket every send fails quietly; the session's state is what these tests watch.
   HostConnection connection{platform::net::kInvalidSocket, ConnectionSetup{}};
+  std::unique_ptr<MinimalSession> session;
 };
 
-TEST_F(SessionBaseTest, PollThreadFoldsTheBusTrafficIntoTheTable) {
-  MinimalSession session(&connection);
-  ASSERT_EQ(session.open(), 0);
-  session.startPollThread();
+TEST_F(SessionBaseTest, PollThreadFoldsTheBusTrafficIntoTheTableAndStopAfterStopClearsNothing) {
+  session->startPollThread();
   // 0x100, 0x1A0, 0x321 and 0x18FEF100 run on the body bus.
-  EXPECT_TRUE(WaitUntil([&] { return session.idCount.load() == 4; }));
-  EXPECT_EQ(session.stop(), 0);
-  EXPECT_EQ(session.driverSession, 0u);
-}
-
-TEST_F(SessionBaseTest, StopAfterStopReturnsZeroAndClearsNothingMore) {
-  MinimalSession session(&connection);
-  ASSERT_EQ(session.open(), 0);
-  session.startPollThread();
-  ASSERT_EQ(session.stop(), 0);
+  EXPECT_TRUE(WaitUntil([&] { return session->idCount.load() == 4; }));
+  EXPECT_EQ(session->stop(), 0);
+  EXPECT_EQ(session->driverSession, 0u);
   tarvix::StartRecording();
-  EXPECT_EQ(session.stop(), 0);
+  EXPECT_EQ(session->stop(), 0);
   EXPECT_EQ(CallsOf("kxClear"), 0u);
 }
 
 TEST_F(SessionBaseTest, FailingClearKeepsTheReferenceAndRecordsTheCode) {
-  MinimalSession session(&connection);
-  ASSERT_EQ(session.open(), 0);
-  const uint32_t reference = session.driverSession;
-  session.startPollThread();
+  const uint32_t reference = session->driverSession;
+  session->startPollThread();
   tarvix::InjectStatus("kxClear", "", driver::kInvalidReference, false);
-  EXPECT_EQ(session.stop(), driver::kInvalidReference);
-  EXPECT_EQ(session.driverSession, reference);
-  EXPECT_EQ(session.lastStatus.load(), driver::kInvalidReference);
-  EXPECT_EQ(session.clearDriverSession(), 0);  // the reference is still there to be cleared
-  EXPECT_EQ(session.driverSession, 0u);
+  EXPECT_EQ(session->stop(), driver::kInvalidReference);
+  EXPECT_EQ(session->driverSession, reference);
+  EXPECT_EQ(session->lastStatus.load(), driver::kInvalidReference);
+  EXPECT_EQ(session->clearDriverSession(), 0);  // the reference is still there to be cleared
+  EXPECT_EQ(session->driverSession, 0u);
 }
 
 TEST_F(SessionBaseTest, PausedSessionReturnsAtOnceWithoutReading) {
-  MinimalSession session(&connection);
-  ASSERT_EQ(session.open(), 0);
-  session.pollActive.store(false);
+  session->pollActive.store(false);
   tarvix::StartRecording();
-  EXPECT_EQ(session.pollOnce(), 0);
+  EXPECT_EQ(session->pollOnce(), 0);
   EXPECT_EQ(CallsOf("kxReadFrame"), 0u);
 }
 
 TEST_F(SessionBaseTest, StoppedPollingEndsTheLoopAndKeepsTheThreadAndDriverSession) {
-  MinimalSession session(&connection);
-  ASSERT_EQ(session.open(), 0);
-  session.startPollThread();
-  ASSERT_TRUE(WaitUntil([&] { return session.idCount.load() > 0; }));
-  session.pollActive.store(false);  // what CMD_SESSION_STOP does
+  session->startPollThread();
+  ASSERT_TRUE(WaitUntil([&] { return session->idCount.load() > 0; }));
+  session->pollActive.store(false);  // what CMD_SESSION_STOP does
   // The loop ends after its current pass; the thread goes on calling pollOnce, which reads nothing.
-  ASSERT_TRUE(WaitUntil([&] { return session.loopsEnded.load() == 1; }));
+  ASSERT_TRUE(WaitUntil([&] { return session->loopsEnded.load() == 1; }));
   tarvix::StartRecording();
   EXPECT_EQ(CallsOf("kxReadFrame"), 0u);
-  EXPECT_EQ(session.loopsEnded.load(), 1);
-  EXPECT_TRUE(session.threadRunning.load());
-  EXPECT_NE(session.driverSession, 0u);
-  EXPECT_EQ(session.stop(), 0);
+  EXPECT_EQ(session->loopsEnded.load(), 1);
+  EXPECT_TRUE(session->threadRunning.load());
+  EXPECT_NE(session->driverSession, 0u);
+  EXPECT_EQ(session->stop(), 0);
 }
 
 TEST_F(SessionBaseTest, TableThatCannotBeAllocatedLeavesTheLoopIdleWithMinus22) {
-  MinimalSession session(&connection);
-  ASSERT_EQ(session.open(), 0);
-  session.tableResource = std::pmr::null_memory_resource();
+  session->tableResource = std::pmr::null_memory_resource();
   tarvix::StartRecording();
-  session.startPollThread();
-  EXPECT_TRUE(WaitUntil([&] { return session.lastStatus.load() == kStatusTableNotAllocated; }));
-  EXPECT_EQ(session.stop(), 0);
+  session->startPollThread();
+  EXPECT_TRUE(WaitUntil([&] { return session->lastStatus.load() == kStatusTableNotAllocated; }));
+  EXPECT_EQ(session->stop(), 0);
   EXPECT_EQ(CallsOf("kxReadFrame"), 0u);
-  EXPECT_EQ(session.idCount.load(), 0u);
+  EXPECT_EQ(session->idCount.load(), 0u);
 }
 
 TEST_F(SessionBaseTest, FailingReadIsRecordedAndPollingGoesOn) {
-  MinimalSession session(&connection);
-  ASSERT_EQ(session.open(), 0);
   tarvix::InjectStatus("kxReadFrame", "", driver::kInvalidFrame, false);
-  session.startPollThread();
-  EXPECT_TRUE(WaitUntil([&] { return session.lastStatus.load() == driver::kInvalidFrame; }));
-  EXPECT_TRUE(WaitUntil([&] { return session.idCount.load() == 4; }));
-  EXPECT_EQ(session.stop(), 0);
+  session->startPollThread();
+  EXPECT_TRUE(WaitUntil([&] { return session->lastStatus.load() == driver::kInvalidFrame; }));
+  EXPECT_TRUE(WaitUntil([&] { return session->idCount.load() == 4; }));
+  EXPECT_EQ(session->stop(), 0);
 }
 
 TEST_F(SessionBaseTest, NothingToReadIsNeverRecorded) {
-  MinimalSession session(&connection);
-  ASSERT_EQ(session.open(), 0);
   tarvix::InjectStatus("kxReadFrame", "", kReadNothingYet, true);
   tarvix::StartRecording();
-  session.startPollThread();
+  session->startPollThread();
   ASSERT_TRUE(WaitUntil([&] { return CallsOf("kxReadFrame") > 20; }));
-  session.pollActive.store(false);
+  session->pollActive.store(false);
   // The loop ends with the read's status, which run() does record: only then may it show.
-  EXPECT_TRUE(WaitUntil([&] { return session.lastStatus.load() == kReadNothingYet; }));
-  EXPECT_EQ(session.stop(), 0);
+  EXPECT_TRUE(WaitUntil([&] { return session->lastStatus.load() == kReadNothingYet; }));
+  EXPECT_EQ(session->stop(), 0);
 }
 
 TEST_F(SessionBaseTest, DestroyingARunningSessionEndsItsThreadAndClearsTheDriverSession) {
-  auto session = std::make_unique<MinimalSession>(&connection);
-  ASSERT_EQ(session->open(), 0);
   const uint32_t reference = session->driverSession;
   session->startPollThread();
   ASSERT_TRUE(WaitUntil([&] { return session->idCount.load() > 0; }));
