@@ -174,20 +174,5 @@ TEST_F(SessionPropertiesTest, LogFileNameIsRefusedOnlyWhileASessionLogs) {
   ExpectNothingMore();
 }
 
-// A live session keeps the bus it was made for: a port of another bus is stored for the next
-// session, while refusals and transmit keep following the live session.
-TEST_F(SessionPropertiesTest, PortOfAnotherBusIsTakenForTheNextSessionWhileOneRuns) {
-  ExpectReplies("SET_PROP_SESSION_PORTNAME=CAN1", {"<ACK: SET_PROP_SESSION_PORTNAME CAN1>"},
-                kHidden);
-  StartSession(1);
-  ExpectReplies("SET_PROP_SESSION_PORTNAME=LIN1", {"<ACK: SET_PROP_SESSION_PORTNAME LIN1>"},
-                kHidden);
-  EXPECT_EQ(connection_->busType.load(), 2u);
-  EXPECT_EQ(connection_->settings.interfaceName.Get(), "LIN1@qv_corle_tarvix");
-  ExpectReplies("SET_PROP_SESSION_TERMINATION=1",
-                {"<ERROR: SET_PROP_SESSION_TERMINATION: CAN Session yet created>\n"}, kShown);
-  ExpectNothingMore();
-}
-
 }  // namespace
 }  // namespace kvtest

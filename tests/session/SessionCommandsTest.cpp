@@ -63,7 +63,8 @@ TEST_F(CanSessionTest, CommandsWithoutASessionAnswerWithTheirTexts) {
   EXPECT_TRUE(host.WaitForClose(kReplyDeadline));
 }
 
-// A port name of another bus set meanwhile keeps the running session's kind for refusals.
+// A port name of another bus set meanwhile is stored for the next session; refusals keep
+// following the running one.
 TEST_F(CanSessionTest, CommandsOnARunningSessionAnswerWithTheirTexts) {
   const std::string canRefusal = "<ERROR: SET_PROP_SESSION_LISTEN_ONLY: CAN Session yet created>\n";
   const std::string started = "<ERROR: CAN session is already started>\n";
@@ -79,6 +80,8 @@ TEST_F(CanSessionTest, CommandsOnARunningSessionAnswerWithTheirTexts) {
   expect("CMD_SESSION_READ_LAST_ERROR", "<CAN Error: 0>  <TCP Error: 0> \n", kvhost::kText, 4);
   expect("SET_PROP_SESSION_PORTNAME=LIN1", "<ACK: SET_PROP_SESSION_PORTNAME LIN1>", kvhost::kText,
          0);
+  EXPECT_EQ(ConnectionAt(0).busType.load(), 2u) << "the port is kept for the next session";
+  EXPECT_EQ(ConnectionAt(0).settings.interfaceName.Get(), "LIN1@qv_corle_tarvix");
   expect("SET_PROP_SESSION_LISTEN_ONLY=1", canRefusal, kvhost::kErrorText, 4);
   expect("CMD_SESSION_START", started, kvhost::kErrorText, 4);
   expect("CMD_TX_START", "<ACK: CMD_TX_START>\n", kvhost::kText, 4);
