@@ -14,50 +14,37 @@ namespace {
 
 constexpr uint64_t kHostBaudRate = 9600;
 
-struct DatabaseCase {
-  const char* name;
-  const char* cluster;
-  uint64_t clusterBaudRate;
-  // Creates the session on the connection and opens it on the interface.
-  std::function<int32_t(HostConnection&)> open;
-};
-void PrintTo(const DatabaseCase& c, std::ostream* os) { *os << c.name; }
-
-class DatabaseModeTest : public ::testing::TestWithParam<DatabaseCase> {
- protected:
-  void SetUp() override { tarvix::ResetToDefaults(); }
-  void TearDown() override { tarvix::ResetToDefaults(); }
-
-  // Without a socket every send fails quietly; only the settings are watched here.
-  HostConnection connection{platform::net::kInvalidSocket, ConnectionSetup{}};
-};
-
 // The settings' baud rate afterwards is the cluster's: the log writers and the host's later
 // sessions see the rate the bus really runs at, not the one the host guessed.
-TEST_P(DatabaseModeTest, ClusterBaudRateReplacesTheHostsValue) {
-  SessionSettings& settings = connection.settings;
-  settings.runMode.Set("NORMAL");
-  settings.alias.Set("SimDB");
-  settings.cluster.Set(GetParam().cluster);
-  settings.baudRate.store(kHostBaudRate);
-  EXPECT_EQ(GetParam().open(connection), 0);
-  EXPECT_EQ(settings.baudRate.load(), GetParam().clusterBaudRate);
+TEST(DatabaseModeTest, ClusterBaudRateReplacesTheHostsValue) {
+  struct Case {
+    const char* cluster;
+    uint64_t clusterBaudRate;
+    std::function<int32_t(HostConnection&)> open;  // creates the session and opens it
+  };
+  const Case cases[] = {
+      {"LIN", 19200,
+       [](HostConnection& c) { return CLIN(&c).openLinSession("LIN1@qv_corle_tarvix", kHostBaudRate); }},
+      {"FlexRay", 10000000,
+       [](HostConnection& c) { return CFlexRay(&c).openFlexRaySession("FlexRay1@qv_corle_tarvix", 0); }},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.cluster);
+    tarvix::ResetToDefaults();
+    {
+      // Without a socket every send fails quietly; only the settings are watched here.
+      HostConnection connection{platform::net::kInvalidSocket, ConnectionSetup{}};
+      SessionSettings& settings = connection.settings;
+      settings.runMode.Set("NORMAL");
+      settings.alias.Set("SimDB");
+      settings.cluster.Set(c.cluster);
+      settings.baudRate.store(kHostBaudRate);
+      EXPECT_EQ(c.open(connection), 0);
+      EXPECT_EQ(settings.baudRate.load(), c.clusterBaudRate);
+    }
+    tarvix::ResetToDefaults();
+  }
 }
-
-INSTANTIATE_TEST_SUITE_P(
-    Buses, DatabaseModeTest,
-    ::testing::Values(
-        DatabaseCase{"LIN", "LIN", 19200,
-                     [](HostConnection& c) {
-                       CLIN session(&c);
-                       return session.openLinSession("LIN1@qv_corle_tarvix", kHostBaudRate);
-                     }},
-        DatabaseCase{"FlexRay", "FlexRay", 10000000,
-                     [](HostConnection& c) {
-                       CFlexRay session(&c);
-                       return session.openFlexRaySession("FlexRay1@qv_corle_tarvix", 0);
-                     }}),
-    [](const auto& info) { return std::string(info.param.name); });
 
 }  // namespace
 }  // namespace nKV_DLL300

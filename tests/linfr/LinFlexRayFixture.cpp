@@ -72,31 +72,6 @@ std::optional<BusRecords> LinFlexRayTest::RecordsWhere(
   return found;
 }
 
-std::optional<kvhost::LinStatisticsView> LinFlexRayTest::LinStatisticsWhere(
-    kvhost::HostClient& host, const std::function<bool(const kvhost::LinStatisticsView&)>& accept) {
-  std::optional<kvhost::LinStatisticsView> found;
-  NextMessage(host, [&](const kvhost::HostMessage& m) {
-    if (m.header.type != kvhost::kStatistics) return false;
-    found = kvhost::DecodeLinStatistics(m.payload);
-    EXPECT_TRUE(found.has_value()) << "LIN statistics of " << m.payload.size() << " bytes";
-    return !found || accept(*found);
-  });
-  return found;
-}
-
-std::optional<kvhost::FlexRayStatisticsView> LinFlexRayTest::FlexRayStatisticsWhere(
-    kvhost::HostClient& host,
-    const std::function<bool(const kvhost::FlexRayStatisticsView&)>& accept) {
-  std::optional<kvhost::FlexRayStatisticsView> found;
-  NextMessage(host, [&](const kvhost::HostMessage& m) {
-    if (m.header.type != kvhost::kStatistics) return false;
-    found = kvhost::DecodeFlexRayStatistics(m.payload);
-    EXPECT_TRUE(found.has_value()) << "FlexRay statistics of " << m.payload.size() << " bytes";
-    return !found || accept(*found);
-  });
-  return found;
-}
-
 kvhost::HostClient LinFlexRayTest::HostWith(const std::vector<std::string>& properties,
                                             std::optional<kvhost::HostMessage>* startReply) {
   kvhost::HostClient host = ConnectHost();
@@ -120,6 +95,18 @@ std::vector<tarvix::CallRecord> CallsOn(const std::string& interfaceName) {
   std::vector<tarvix::CallRecord> calls;
   for (tarvix::CallRecord& call : tarvix::RecordedCalls()) {
     if (call.interfaceName == interfaceName) calls.push_back(std::move(call));
+  }
+  return calls;
+}
+
+std::vector<std::pair<std::string, uint32_t>> StartCalls(const std::string& interfaceName) {
+  std::vector<std::pair<std::string, uint32_t>> calls;
+  for (const tarvix::CallRecord& call : CallsOn(interfaceName)) {
+    // The hardware table read at accept comes before the start.
+    if (calls.empty() && call.operation != "kxCreateSession") continue;
+    if (call.operation == "kxReadFrame" || call.operation == "kxReadState") continue;
+    if (call.operation == "kxClear") break;
+    calls.emplace_back(call.operation, call.id);
   }
   return calls;
 }

@@ -46,10 +46,25 @@ class LinFlexRayTest : public ServiceFixture {
                                          const std::function<bool(const BusRecords&)>& accept);
   // The next statistics message of a LIN or FlexRay session for which `accept` holds.
   std::optional<kvhost::LinStatisticsView> LinStatisticsWhere(
-      kvhost::HostClient& host, const std::function<bool(const kvhost::LinStatisticsView&)>& accept);
+      kvhost::HostClient& host, const std::function<bool(const kvhost::LinStatisticsView&)>& accept) {
+    return StatisticsWhere(host, kvhost::DecodeLinStatistics, accept);
+  }
   std::optional<kvhost::FlexRayStatisticsView> FlexRayStatisticsWhere(
-      kvhost::HostClient& host,
-      const std::function<bool(const kvhost::FlexRayStatisticsView&)>& accept);
+      kvhost::HostClient& host, const std::function<bool(const kvhost::FlexRayStatisticsView&)>& accept) {
+    return StatisticsWhere(host, kvhost::DecodeFlexRayStatistics, accept);
+  }
+  template <typename Decode, typename View>
+  std::optional<View> StatisticsWhere(kvhost::HostClient& host, Decode decode,
+                                      const std::function<bool(const View&)>& accept) {
+    std::optional<View> found;
+    NextMessage(host, [&](const kvhost::HostMessage& m) {
+      if (m.header.type != kvhost::kStatistics) return false;
+      found = decode(m.payload);
+      EXPECT_TRUE(found.has_value()) << "statistics of " << m.payload.size() << " bytes";
+      return !found || accept(*found);
+    });
+    return found;
+  }
 
   // Connects a host, sends `properties` one by one (each acknowledged) and CMD_SESSION_START;
   // returns the host and the reply to the start.
@@ -61,6 +76,9 @@ class LinFlexRayTest : public ServiceFixture {
 
 // The driver calls recorded since StartRecording on `interfaceName` ("LIN1", "FlexRay1").
 std::vector<tarvix::CallRecord> CallsOn(const std::string& interfaceName);
+// The driver calls of the start from the creation on, in order, without the reads and state reads
+// of the poll thread.
+std::vector<std::pair<std::string, uint32_t>> StartCalls(const std::string& interfaceName);
 // The recorded kxSetProperty calls of property `id` on `interfaceName`.
 std::vector<tarvix::CallRecord> SetPropertyCalls(const std::string& interfaceName, uint32_t id);
 

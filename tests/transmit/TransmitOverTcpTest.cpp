@@ -1,5 +1,6 @@
 // A host defines, starts, updates and stops a frame on CAN3; a second host watches CAN4 on the
-// same quiet test bus and sees exactly that frame.
+// same quiet test bus and sees exactly that frame. Transmit messages by session kind: acknowledged on
+// CAN, acknowledged and nothing else on LIN and FlexRay, dropped unanswered without a CAN session.
 #include <gtest/gtest.h>
 
 #include <string>
@@ -22,6 +23,19 @@ constexpr double kUnitsPerSecond = 1e7;  // record time stamps count 100 ns
 // Record messages that pass while a stopped frame must not be counted again (at 100 ms each,
 // far longer than the 50 ms repetition).
 constexpr int kQuietMessages = 6;
+
+const std::vector<std::string> kTxProperties = {
+    "SET_TX_PROP_PAYLOAD_LENGTH=8", "SET_TX_PROP_EXTENDED_ID=1", "SET_TX_PROP_FRAME_TYPE=0",
+    "SET_TX_PROP_TIMING_TYPE=1",    "SET_TX_PROP_CYCLIC_RATE=0,5", "SET_TX_PROP_PAYLOAD=1,2",
+    "SET_TX_PROP_IDENTIFIER=16"};
+
+// True when the driver was asked to build or use a transmit database or output session.
+bool AnyTransmitCall() {
+  for (const tarvix::CallRecord& call : tarvix::RecordedCalls()) {
+    if (call.operation.starts_with("kxdb") || call.operation == "kxWriteFrame") return true;
+  }
+  return false;
+}
 
 class TransmitTest : public CanSessionTest {
  protected:
@@ -47,14 +61,27 @@ class TransmitTest : public CanSessionTest {
     for (const std::string& message : messages) {
       auto reply = Command(host, message);
       ASSERT_TRUE(reply.has_value()) << message;
+      EXPECT_EQ(reply->header.type, kvhost::kText);
       EXPECT_EQ(reply->text(), "<ACK: " + message.substr(0, message.find('=')) + ">\n");
     }
   }
+  void Expect(kvhost::HostClient& host, const std::string& command) { Define(host, {command}); }
 
-  void Expect(kvhost::HostClient& host, const std::string& command) {
-    auto reply = Command(host, command);
-    ASSERT_TRUE(reply.has_value()) << command;
-    EXPECT_EQ(reply->text(), "<ACK: " + command + ">\n");
+  // Sends every transmit property; none may be answered, so the next text is the error query's.
+  void ExpectTxPropertiesDropped(kvhost::HostClient& host, const std::string& lastErrorPrefix) {
+    for (const std::string& message : kTxProperties) SendAndWaitDispatched(host, message);
+    auto reply = Command(host, "CMD_SESSION_READ_LAST_ERROR");
+    ASSERT_TRUE(reply.has_value());
+    EXPECT_TRUE(reply->text().starts_with(lastErrorPrefix)) << reply->text();
+  }
+
+  // Connects a host and names its port over TCP (bus kind from the name); checks the reply.
+  kvhost::HostClient HostOnPort(const std::string& port) {
+    kvhost::HostClient host = ConnectHost();
+    auto reply = Command(host, "SET_PROP_SESSION_PORTNAME=" + port);
+    EXPECT_TRUE(reply.has_value());
+    if (reply) EXPECT_EQ(reply->text(), "<ACK: SET_PROP_SESSION_PORTNAME " + port + ">");
+    return host;
   }
 
   // The first record of `identifier` in a message of `host` for which `accept` holds.
@@ -139,7 +166,7 @@ TEST_F(TransmitTest, EventFrameGoesOutOncePerStartWithItsIdentifierLengthAndPayl
   EXPECT_EQ(third->payload, (Bytes{0, 0, 0, 0, 0}));
 }
 
-TEST_F(TransmitTest, CyclicFrameRepeatsFollowsPayloadUpdatesAndEndsWithStop) {
+TEST_F(TransmitTest, CyclicFrameRepeatsFollowsUpdatesIsReplacedByASecondStartAndEndsWithStop) {
   kvhost::HostClient sender = Transmitter();
   kvhost::HostClient monitor = Monitor();
   DefineCyclic(sender);
@@ -161,17 +188,7 @@ TEST_F(TransmitTest, CyclicFrameRepeatsFollowsPayloadUpdatesAndEndsWithStop) {
                 return r.payload == Bytes{9, 8, 7, 0, 0};
               }).has_value());
 
-  Expect(sender, "CMD_TX_STOP");
-  ExpectCountStops(monitor);
-}
-
-TEST_F(TransmitTest, SecondStartReplacesTheRunningFrameInsteadOfAddingOne) {
-  kvhost::HostClient sender = Transmitter();
-  kvhost::HostClient monitor = Monitor();
-  DefineCyclic(sender);
-  Expect(sender, "CMD_TX_START");
-  ASSERT_TRUE(SeenCount(monitor, 3).has_value());
-
+  // A second start replaces the running frame instead of adding one; the stop ends it.
   Define(sender, {"SET_TX_PROP_IDENTIFIER=292"});
   Expect(sender, "CMD_TX_START");
   ASSERT_TRUE(SeenCount(monitor, 3, kTxId + 1).has_value());
@@ -239,10 +256,13 @@ TEST_F(TransmitTest, OwnSessionSeesItsFrameOnlyWhenLoggingTransmittedFrames) {
   }
 }
 
+// Terminate, a closed socket and a lost heartbeat each stop a cyclic frame. The watchdog runs only
+// after 10 s in which no host sent anything, so the monitor stays silent too and is ended with the
+// sender; a fresh monitor then finds the bus quiet.
 TEST_F(TransmitTest, EndingTheSessionStopsACyclicFrame) {
-  enum class End { kTerminate, kCloseSocket };
-  for (End end : {End::kTerminate, End::kCloseSocket}) {
-    SCOPED_TRACE(end == End::kTerminate ? "terminate" : "closed socket");
+  enum class End { kTerminate, kCloseSocket, kHeartbeatLoss };
+  for (End end : {End::kTerminate, End::kCloseSocket, End::kHeartbeatLoss}) {
+    SCOPED_TRACE(static_cast<int>(end));
     tarvix::ResetToDefaults();
     StartService();
     kvhost::HostClient sender = Transmitter();
@@ -254,32 +274,48 @@ TEST_F(TransmitTest, EndingTheSessionStopsACyclicFrame) {
     if (end == End::kTerminate) {
       Expect(sender, "CMD_SESSION_TERMINATE");
       EXPECT_TRUE(sender.WaitForClose(kConditionDeadline));
-    } else {
+    } else if (end == End::kCloseSocket) {
       sender.Close();
       ASSERT_TRUE(WaitUntil([&] { return service().statistics().connectionsEnded.load() >= 1; }));
+    } else {
+      auto farewell = NextMessage(sender, [](const kvhost::HostMessage& m) {
+        return m.header.type == kvhost::kErrorText;
+      }, 3 * kConditionDeadline);
+      ASSERT_TRUE(farewell.has_value());
+      EXPECT_EQ(farewell->text(), "<ERROR: Heartbeat message missing| TCP Client disconnect> \n");
+      ASSERT_TRUE(WaitUntil([&] { return service().statistics().connectionsEnded.load() >= 2; }));
+      kvhost::HostClient watcher = Monitor(0);
+      for (int i = 0; i < kQuietMessages; ++i) EXPECT_EQ(NextCount(watcher), 0u);
+      continue;
     }
     ExpectCountStops(monitor);
   }
 }
 
-// The watchdog runs only after 10 s in which no host sent anything, so the monitor stays silent
-// too and is ended with the sender; a fresh monitor then finds the bus quiet.
-TEST_F(TransmitTest, HeartbeatLossStopsACyclicFrame) {
-  kvhost::HostClient sender = Transmitter();
-  kvhost::HostClient monitor = Monitor();
-  DefineCyclic(sender);
-  Expect(sender, "CMD_TX_START");
-  ASSERT_TRUE(SeenCount(monitor, 3).has_value());
+TEST_F(TransmitTest, TransmitPropertiesAreAcknowledgedOnlyOnACanSession) {
+  kvhost::HostClient host = StartedHost(0, "CAN3");
+  Define(host, kTxProperties);
+  kvhost::HostClient portOnly = HostOnPort("CAN2");  // a CAN port, but no session yet
+  ExpectTxPropertiesDropped(portOnly, "<TCP Error: ");
+}
 
-  auto farewell = NextMessage(sender, [](const kvhost::HostMessage& m) {
-    return m.header.type == kvhost::kErrorText;
-  }, 3 * kConditionDeadline);
-  ASSERT_TRUE(farewell.has_value());
-  EXPECT_EQ(farewell->text(), "<ERROR: Heartbeat message missing| TCP Client disconnect> \n");
-  ASSERT_TRUE(WaitUntil([&] { return service().statistics().connectionsEnded.load() >= 2; }));
-
-  kvhost::HostClient watcher = Monitor(0);
-  for (int i = 0; i < kQuietMessages; ++i) EXPECT_EQ(NextCount(watcher), 0u);
+TEST_F(TransmitTest, LinAndFlexRaySessionsOnlyAcknowledgeTransmitCommands) {
+  const std::pair<const char*, const char*> cases[] = {{"LIN1", "<LIN Error: "},
+                                                       {"FlexRay1", "<FlexRay Error: "}};
+  for (const auto& [port, lastErrorPrefix] : cases) {
+    SCOPED_TRACE(port);
+    tarvix::ResetToDefaults();
+    StartService();
+    kvhost::HostClient host = HostOnPort(port);
+    if (std::string(port) == "LIN1") ASSERT_TRUE(Command(host, "SET_PROP_SESSION_BAUDRATE=19200").has_value());
+    Expect(host, "CMD_SESSION_START");
+    tarvix::StartRecording();
+    Expect(host, "CMD_TX_START");
+    Expect(host, "CMD_TX_STOP");
+    ExpectTxPropertiesDropped(host, lastErrorPrefix);
+    tarvix::StopRecording();
+    EXPECT_FALSE(AnyTransmitCall());
+  }
 }
 
 }  // namespace
