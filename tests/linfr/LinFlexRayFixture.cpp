@@ -26,28 +26,6 @@ void LinFlexRayTest::TearDown() {
   tarvix::ResetToDefaults();
 }
 
-std::optional<kvhost::HostMessage> LinFlexRayTest::NextMessage(
-    kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
-    std::chrono::milliseconds timeout) {
-  const auto deadline = std::chrono::steady_clock::now() + timeout;
-  for (;;) {
-    const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
-        deadline - std::chrono::steady_clock::now());
-    if (left.count() <= 0) return std::nullopt;
-    std::optional<kvhost::HostMessage> message = host.Receive(left);
-    if (!message) return std::nullopt;
-    if (accept(*message)) return message;
-  }
-}
-
-std::optional<kvhost::HostMessage> LinFlexRayTest::Command(kvhost::HostClient& host,
-                                                           const std::string& command) {
-  EXPECT_TRUE(host.Send(command)) << host.error();
-  return NextMessage(host, [](const kvhost::HostMessage& m) {
-    return m.header.type == kvhost::kText || m.header.type == kvhost::kErrorText;
-  }, kReplyDeadline);
-}
-
 void LinFlexRayTest::Set(kvhost::HostClient& host, const std::string& assignment) {
   auto reply = Command(host, assignment);
   ASSERT_TRUE(reply.has_value()) << "no reply to " << assignment;

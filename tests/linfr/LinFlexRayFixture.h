@@ -33,12 +33,6 @@ class LinFlexRayTest : public ServiceFixture {
 
   // Sends one property message ("NAME=value") and expects its acknowledgement.
   void Set(kvhost::HostClient& host, const std::string& assignment);
-  // Sends `command` and returns the next text reply (type 3 or 5), skipping records and statistics.
-  std::optional<kvhost::HostMessage> Command(kvhost::HostClient& host, const std::string& command);
-  // The next message for which `accept` holds, within `timeout`; others are skipped.
-  std::optional<kvhost::HostMessage> NextMessage(
-      kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
-      std::chrono::milliseconds timeout = kConditionDeadline);
 
   // The next record message of the given type (1 LIN, 2 FlexRay) for which `accept` holds; each
   // message must hold exactly the records its header counts.

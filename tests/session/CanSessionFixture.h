@@ -43,12 +43,6 @@ class CanSessionTest : public ServiceFixture {
   // What SET_PROP_SESSION_PORTNAME stores for a CAN port: port name, interface name, bus type.
   void UsePort(nKV_DLL300::HostConnection& connection, const std::string& port);
 
-  // Sends `command` and returns the next text reply (type 3 or 5), skipping records and statistics.
-  std::optional<kvhost::HostMessage> Command(kvhost::HostClient& host, const std::string& command);
-  // The next message for which `accept` holds, within `timeout`; others are skipped.
-  std::optional<kvhost::HostMessage> NextMessage(
-      kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
-      std::chrono::milliseconds timeout = kConditionDeadline);
   // Sends `command` and checks that its text reply is `text` of `type`; returns the reply.
   std::optional<kvhost::HostMessage> ExpectReply(kvhost::HostClient& host,
                                                  const std::string& command,

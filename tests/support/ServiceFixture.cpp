@@ -128,4 +128,26 @@ void ServiceFixture::SendAndWaitDispatched(kvhost::HostClient& host, const std::
       << "the service did not take the message " << text;
 }
 
+std::optional<kvhost::HostMessage> ServiceFixture::NextMessage(
+    kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
+    std::chrono::milliseconds timeout) {
+  const auto deadline = std::chrono::steady_clock::now() + timeout;
+  for (;;) {
+    const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
+        deadline - std::chrono::steady_clock::now());
+    if (left.count() <= 0) return std::nullopt;
+    std::optional<kvhost::HostMessage> message = host.Receive(left);
+    if (!message) return std::nullopt;
+    if (accept(*message)) return message;
+  }
+}
+
+std::optional<kvhost::HostMessage> ServiceFixture::Command(kvhost::HostClient& host,
+                                                           const std::string& command) {
+  EXPECT_TRUE(host.Send(command)) << host.error();
+  return NextMessage(host, [](const kvhost::HostMessage& m) {
+    return m.header.type == kvhost::kText || m.header.type == kvhost::kErrorText;
+  }, kReplyDeadline);
+}
+
 }  // namespace kvtest

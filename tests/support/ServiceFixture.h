@@ -69,6 +69,12 @@ class ServiceFixture : public ::testing::Test {
   kvhost::HostClient ConnectQuietly();
   // Sends `text` and returns the next message within the reply deadline.
   std::optional<kvhost::HostMessage> Exchange(kvhost::HostClient& host, const std::string& text);
+  // Sends `command` and returns the next text reply (type 3 or 5), skipping records and statistics.
+  std::optional<kvhost::HostMessage> Command(kvhost::HostClient& host, const std::string& command);
+  // The next message for which `accept` holds, within `timeout`; others are skipped.
+  std::optional<kvhost::HostMessage> NextMessage(
+      kvhost::HostClient& host, const std::function<bool(const kvhost::HostMessage&)>& accept,
+      std::chrono::milliseconds timeout = kConditionDeadline);
   // Sends `text` and waits until the service has dispatched it (nothing is read).
   void SendAndWaitDispatched(kvhost::HostClient& host, const std::string& text);
 
