@@ -6,7 +6,7 @@ CTEST_JOBS ?= $(shell echo $$(( $(JOBS) * 2 )))
 CMAKE_FLAGS ?=
 
 DEBIAN_PACKAGES := cmake g++ make pkg-config libgtest-dev libgmock-dev libbenchmark-dev \
-                   nlohmann-json3-dev libhdf5-dev hdf5-tools clang libclang-rt-14-dev python3 python3-can tmux
+                   nlohmann-json3-dev libhdf5-dev hdf5-tools clang clang-format libclang-rt-14-dev python3 python3-can tmux
 
 SUDO := $(shell [ "$$(id -u)" = 0 ] || echo sudo)
 

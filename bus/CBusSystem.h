@@ -117,7 +117,7 @@ class CBusSystem {
 
  private:
   std::unique_ptr<nQVAPAL000::tThreadController> pollThreadController;  // service thread
-  std::unique_ptr<nQVAPAL000::iThread> pollThread;                       // service thread
+  std::unique_ptr<nQVAPAL000::iThread> pollThread;                      // service thread
 };
 
 }  // namespace nKV_DLL300

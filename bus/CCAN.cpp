@@ -21,7 +21,9 @@ CCAN::~CCAN() { endForDestruction(); }
 
 void CCAN::startPollThread() { startPollThreadWith(std::make_unique<CPollCANDataThread>(this)); }
 
-const char* CCAN::logHeaderLine() const { return "Timestamp\tID\tPayload\tPayload Length\tType\tName"; }
+const char* CCAN::logHeaderLine() const {
+  return "Timestamp\tID\tPayload\tPayload Length\tType\tName";
+}
 
 void CCAN::prepareLoop() {
   const SessionSettings& settings = connection->settings;

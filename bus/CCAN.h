@@ -68,8 +68,8 @@ class CCAN : public CTableSession<CanIdentifierRules, CanBusStatistics, kCanRead
   // A failing step: kept as lastStatus and returned.
   int32_t fail(int32_t status);
 
-  CanFrameTimes frameTimes;    // poll thread; tables and bus time of the current window
-  bool classicFrames = true;   // poll thread: every frame of this loop is 24 bytes
+  CanFrameTimes frameTimes;   // poll thread; tables and bus time of the current window
+  bool classicFrames = true;  // poll thread: every frame of this loop is 24 bytes
 };
 
 }  // namespace nKV_DLL300

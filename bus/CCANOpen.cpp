@@ -67,9 +67,9 @@ int32_t CCAN::openCanSession(const std::string& interfaceName, uint64_t baudRate
 
 int32_t CCAN::openSubordinate(const std::string& interfaceName) {
   readInterfaceIoMode(interfaceName);
-  const int32_t status = kxCreateSession(SubordinateDatabase(connection->settings), "", "",
-                                         interfaceName.c_str(), driver::kModeReceiveStream,
-                                         &driverSession);
+  const int32_t status =
+      kxCreateSession(SubordinateDatabase(connection->settings), "", "", interfaceName.c_str(),
+                      driver::kModeReceiveStream, &driverSession);
   return status < 0 ? fail(status) : status;
 }
 
@@ -120,7 +120,8 @@ int32_t CCAN::setInterfaceProperties(uint32_t termination) {
   if (status < 0) return fail(status);
   // An interface whose transceiver is of type 1 keeps it, whatever the host asked for.
   uint32_t transceiver = 0;
-  (void)kxGetProperty(driverSession, driver::kPropTransceiverType, sizeof transceiver, &transceiver);
+  (void)kxGetProperty(driverSession, driver::kPropTransceiverType, sizeof transceiver,
+                      &transceiver);
   if (transceiver != kTransceiverKeptType) transceiver = settings.transceiverType.load();
   status = SetProperty(driverSession, driver::kPropTransceiverType, transceiver);
   if (status < 0) return fail(status);
@@ -161,7 +162,8 @@ void CCAN::readInterfaceIoMode(const std::string& interfaceName) {
 
 int32_t CCAN::claimJ1939Address() {
   const SessionSettings& settings = connection->settings;
-  addressClaimStatus = SetProperty(driverSession, driver::kPropJ1939NodeName, settings.nodeName.load());
+  addressClaimStatus =
+      SetProperty(driverSession, driver::kPropJ1939NodeName, settings.nodeName.load());
   if (addressClaimStatus == 0) {
     addressClaimStatus = SetProperty(driverSession, driver::kPropJ1939NodeAddress,
                                      uint32_t{settings.nodeAddress.load()});
@@ -169,8 +171,8 @@ int32_t CCAN::claimJ1939Address() {
   uint32_t claimed = driver::kJ1939NullAddress;
   for (uint32_t retries = 0; addressClaimStatus == 0;) {
     SleepFor(kClaimPollMs);
-    addressClaimStatus = kxGetProperty(driverSession, driver::kPropJ1939NodeAddress,
-                                       sizeof claimed, &claimed);
+    addressClaimStatus =
+        kxGetProperty(driverSession, driver::kPropJ1939NodeAddress, sizeof claimed, &claimed);
     if (claimed < driver::kJ1939NullAddress) break;
     if (++retries > kClaimMaxRetries) break;
   }

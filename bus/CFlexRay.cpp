@@ -66,7 +66,8 @@ int32_t CFlexRay::openDatabase(const std::string& interfaceName, uint32_t termin
   if (status < 0) return status;
   status = SetProperty(driverSession, driver::kPropFlexRayTermination, termination);
   if (status < 0) return status;
-  status = SetProperty(driverSession, driver::kPropFlexRayNullFrames, settings.showNullFrames.load());
+  status =
+      SetProperty(driverSession, driver::kPropFlexRayNullFrames, settings.showNullFrames.load());
   if (status < 0) return status;
   const uint32_t keySlot = settings.keySlot.load();
   if (keySlot != kNoKeySlot) {
@@ -80,7 +81,8 @@ int32_t CFlexRay::openDatabase(const std::string& interfaceName, uint32_t termin
 }
 
 const char* CFlexRay::logHeaderLine() const {
-  return "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle Number\tChannel\tStartup\tSync\tPreamble";
+  return "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle "
+         "Number\tChannel\tStartup\tSync\tPreamble";
 }
 
 uint32_t CFlexRay::batchFrameCount(uint32_t bytes) const {
@@ -98,11 +100,13 @@ void CFlexRay::countFrame(const RawFrameView& frame, bool inWindow) {
 void CFlexRay::readStates() {
   uint32_t faultCode = 0;
   uint32_t state = 0;
-  int32_t status = kxReadState(driverSession, driver::kStateFlexRay, sizeof state, &state, &faultCode);
+  int32_t status =
+      kxReadState(driverSession, driver::kStateFlexRay, sizeof state, &state, &faultCode);
   if (status != 0) return recordStatus(status);
   decodeState(statistics, state, faultCode);
   uint32_t words[6] = {};
-  status = kxReadState(driverSession, driver::kStateFlexRayCounters, sizeof words, words, &faultCode);
+  status =
+      kxReadState(driverSession, driver::kStateFlexRayCounters, sizeof words, words, &faultCode);
   if (status != 0) return recordStatus(status);
   storeStatisticsWords(statistics, words, faultCode);
   uint32_t channels = 0;

@@ -51,8 +51,9 @@ int32_t CLIN::openLinSession(const std::string& interfaceName, uint64_t baudRate
 }
 
 int32_t CLIN::openSubordinate(const std::string& interfaceName) {
-  const int32_t status = kxCreateSession(driver::kDatabaseSubordinate, "", "", interfaceName.c_str(),
-                                         driver::kModeReceiveStream, &driverSession);
+  const int32_t status =
+      kxCreateSession(driver::kDatabaseSubordinate, "", "", interfaceName.c_str(),
+                      driver::kModeReceiveStream, &driverSession);
   return status < 0 ? fail(status) : status;
 }
 
@@ -88,7 +89,8 @@ int32_t CLIN::openBuiltIn(const std::string& interfaceName, uint64_t baudRate) {
 
 int32_t CLIN::setReceiveProperties() {
   const SessionSettings& settings = connection->settings;
-  int32_t status = SetProperty(driverSession, driver::kPropEcho, settings.logTransmittedFrames.load());
+  int32_t status =
+      SetProperty(driverSession, driver::kPropEcho, settings.logTransmittedFrames.load());
   if (status < 0) return fail(status);
   const uint8_t busErrorFrames[2] = {settings.logBusErrorFrames.load(), settings.listenOnly.load()};
   status = kxSetProperty(driverSession, driver::kPropBusErrorFrames, sizeof busErrorFrames,

@@ -1,4 +1,5 @@
-// The poll loop that the three bus sessions share: read, pace, fold into the identifier table, send.
+// The poll loop that the three bus sessions share: read, pace, fold into the identifier table,
+// send.
 #pragma once
 
 #include <algorithm>
@@ -65,9 +66,15 @@ class CTableSession : public CBusSystem {
   // Hands a batch to the bus's log writer while logFileEnabled is set.
   virtual void logBatch(const uint8_t* batch, uint32_t bytes, uint32_t frames) {
     switch (busType) {
-      case kBusTypeLin: WriteLinLog(sessionLog, batch, bytes, frames); break;
-      case kBusTypeFlexRay: WriteFlexRayLog(sessionLog, batch, bytes, frames); break;
-      default: WriteCanLog(sessionLog, batch, bytes, frames); break;
+      case kBusTypeLin:
+        WriteLinLog(sessionLog, batch, bytes, frames);
+        break;
+      case kBusTypeFlexRay:
+        WriteFlexRayLog(sessionLog, batch, bytes, frames);
+        break;
+      default:
+        WriteCanLog(sessionLog, batch, bytes, frames);
+        break;
     }
   }
   // A frame taken into the table while txTimeStatistic > 0.
@@ -132,7 +139,8 @@ class CTableSession : public CBusSystem {
   }
 
   void pace(uint32_t bytes) {
-    if (pacing_ == ReadPacing::kNearlyFullRule && bytes >= kNearlyFullBytes && burst_ <= kMaxBurst) {
+    if (pacing_ == ReadPacing::kNearlyFullRule && bytes >= kNearlyFullBytes &&
+        burst_ <= kMaxBurst) {
       ++burst_;
       return;
     }
@@ -148,8 +156,8 @@ class CTableSession : public CBusSystem {
     const uint32_t statisticPeriod = settings.txTimeStatistic.load();
     // A batch is read at one moment, so the window is looked at once per batch.
     const bool inWindow = windowWatch.ElapsedMilliseconds() < statisticPeriod;
-    const int32_t status = table->updateIdentifierTable(
-        readBuffer, bytes, rules, [&](const RawFrameView& frame) {
+    const int32_t status =
+        table->updateIdentifierTable(readBuffer, bytes, rules, [&](const RawFrameView& frame) {
           if (statisticPeriod > 0) countFrame(frame, inWindow);
         });
     recordStatus(status);

@@ -5,7 +5,7 @@ namespace nKV_DLL300 {
 
 namespace {
 
-constexpr uint32_t kFdLengths[CanFrameTimes::kIndices] = {0,  1,  2,  3,  4,  5,  6,  7,
+constexpr uint32_t kFdLengths[CanFrameTimes::kIndices] = {0, 1,  2,  3,  4,  5,  6,  7,
                                                           8, 12, 16, 20, 24, 32, 48, 64};
 constexpr uint32_t kClassicIndices = 9;
 constexpr uint32_t kBusLoadFull = 10000;

@@ -5,7 +5,8 @@
 
 namespace nKV_DLL300 {
 
-// What the frame-time tables are built from, read from the session settings when a poll loop begins.
+// What the frame-time tables are built from, read from the session settings when a poll loop
+// begins.
 struct CanFrameTimeSettings {
   uint32_t canIoMode = 0;            // 0 classic, 1 FD, 2 FD with bit-rate switching
   uint32_t applicationProtocol = 0;  // 1: J1939
@@ -21,7 +22,8 @@ class CanFrameTimes {
   static constexpr uint32_t kIndices = 16;
   static constexpr uint32_t kNoIndex = kIndices;
 
-  // Index of a payload length: 0-8 are their own, 12 16 20 24 32 48 64 are 9-15; kNoIndex otherwise.
+  // Index of a payload length: 0-8 are their own, 12 16 20 24 32 48 64 are 9-15; kNoIndex
+  // otherwise.
   static uint32_t indexOf(uint32_t payloadLength);
 
   // Classic CAN without J1939 fills indices 0-8; FD modes fill all 16. Everything else (J1939 on a

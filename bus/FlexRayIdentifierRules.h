@@ -12,7 +12,8 @@ namespace nKV_DLL300 {
 // Key: slot and channel key. The channel key is 0 for a frame flagged channel A (0x10), else 1 for
 // one flagged channel B (0x20), else the key of the frame before it in the batch (0 for the first).
 // A new entry takes the channel of its key, so a frame without channel flags finds the entry it
-// created again; the entry keeps the type of its first frame. Payloads are copied outside the entry.
+// created again; the entry keeps the type of its first frame. Payloads are copied outside the
+// entry.
 struct FlexRayIdentifierRules {
   using Entry = FlexRayIdentifierEntry;
   static constexpr uint8_t kMessageType = 2;

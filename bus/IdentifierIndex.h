@@ -30,7 +30,9 @@ class IdentifierIndex {
   uint32_t entryAt(uint32_t slot) const {
     return static_cast<uint32_t>(slots_[slot] & 0xFFFF) - 1;  // a free slot gives kNoEntry
   }
-  void set(uint32_t slot, uint64_t key, uint32_t entry) { slots_[slot] = (key << 16) | (entry + 1); }
+  void set(uint32_t slot, uint64_t key, uint32_t entry) {
+    slots_[slot] = (key << 16) | (entry + 1);
+  }
   void clear();
 
  private:

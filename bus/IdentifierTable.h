@@ -59,7 +59,8 @@ class IdentifierTable {
   // be obtained; the poll loop then stores kStatusPayloadNotStored and must not run without it.
   // sendBufferSize is the largest message payload of CAN and FlexRay (at least one whole record).
   static std::unique_ptr<IdentifierTable> Create(
-      uint32_t dataLogIdsMax, std::pmr::memory_resource* resource = std::pmr::get_default_resource(),
+      uint32_t dataLogIdsMax,
+      std::pmr::memory_resource* resource = std::pmr::get_default_resource(),
       uint32_t sendBufferSize = kSendBufferSize) {
     try {
       std::unique_ptr<IdentifierTable> table(new IdentifierTable(resource));
@@ -141,8 +142,12 @@ class IdentifierTable {
 
  private:
   explicit IdentifierTable(std::pmr::memory_resource* resource)
-      : entries_(resource), index_(resource), sortKeys_(resource), mergeKeys_(resource),
-        payloads_(resource), wire_(resource) {}
+      : entries_(resource),
+        index_(resource),
+        sortKeys_(resource),
+        mergeKeys_(resource),
+        payloads_(resource),
+        wire_(resource) {}
 
   void allocate(uint32_t capacity, uint32_t sendBufferSize) {
     capacity_ = capacity;
@@ -266,12 +271,12 @@ class IdentifierTable {
   uint32_t capacity_ = 0;
   uint32_t count_ = 0;
   uint32_t sortedCount_ = 0;
-  std::pmr::vector<Entry> entries_;     // in the order first seen
-  IdentifierIndex index_;               // key -> entry
+  std::pmr::vector<Entry> entries_;       // in the order first seen
+  IdentifierIndex index_;                 // key -> entry
   std::pmr::vector<uint64_t> sortKeys_;   // send order
   std::pmr::vector<uint64_t> mergeKeys_;  // scratch of the merge
-  PayloadCopies payloads_;              // CAN and FlexRay: slot i holds entry i's payload
-  std::pmr::vector<uint8_t> wire_;      // where messages are assembled
+  PayloadCopies payloads_;                // CAN and FlexRay: slot i holds entry i's payload
+  std::pmr::vector<uint8_t> wire_;        // where messages are assembled
 };
 
 using CanIdentifierTable = IdentifierTable<CanIdentifierRules>;

@@ -57,12 +57,12 @@ inline constexpr uint32_t RawFrameSize(const RawFrameHeader& h) {
 // A view of one frame inside a batch. The header is copied out (read buffers need not be aligned).
 struct RawFrameView {
   RawFrameHeader header;
-  const uint8_t* payload;   // RawPayloadLength(header) bytes, all inside the batch
+  const uint8_t* payload;  // RawPayloadLength(header) bytes, all inside the batch
   uint32_t payloadLength;
 };
 
-// Walks a batch of `size` bytes frame by frame. A frame whose header or payload would reach past the
-// end of the batch ends the walk: nothing is ever read outside the bytes the driver delivered.
+// Walks a batch of `size` bytes frame by frame. A frame whose header or payload would reach past
+// the end of the batch ends the walk: nothing is ever read outside the bytes the driver delivered.
 class RawFrameWalker {
  public:
   RawFrameWalker(const void* batch, uint32_t size)

@@ -40,8 +40,7 @@ int main(int argc, char** argv) {
     std::fputs(kvcontroller::UsageText(), options ? stdout : stderr);
     return options ? 0 : 2;
   }
-  std::string modulePath =
-      options->modulePath.empty() ? DefaultModulePath() : options->modulePath;
+  std::string modulePath = options->modulePath.empty() ? DefaultModulePath() : options->modulePath;
   sigset_t stopSignals = BlockStopSignals();
 
   platform::HMODULE module = platform::LoadLibraryA(modulePath.c_str());

@@ -5,9 +5,9 @@
 
 namespace driver {
 
-inline constexpr uint32_t kStateCan = 0x00130010;              // 4 bytes, CAN state word
-inline constexpr uint32_t kStateLin = 0x00130030;              // 8 bytes, LIN state (low word used)
-inline constexpr uint32_t kStateFlexRay = 0x00130020;          // 4 bytes, FlexRay protocol state word
+inline constexpr uint32_t kStateCan = 0x00130010;      // 4 bytes, CAN state word
+inline constexpr uint32_t kStateLin = 0x00130030;      // 8 bytes, LIN state (low word used)
+inline constexpr uint32_t kStateFlexRay = 0x00130020;  // 4 bytes, FlexRay protocol state word
 inline constexpr uint32_t kStateFlexRayCounters = 0x08130021;  // 24 bytes, six counters
 inline constexpr uint32_t kStateFlexRayChannels = 0x00130004;  // 4 bytes, channel status word
 
@@ -29,8 +29,8 @@ inline constexpr uint32_t kCanLastErrorForm = 2;
 inline constexpr uint32_t kCanLastErrorAck = 3;
 
 // LIN state word (low 32 bits): bit 0 communicating, 1 sleep, 2-3 communication state, 4-7 last
-// error, 8-15 identifier of the last error, 16-23 frames since start (mod 256), 24-29 schedule slot,
-// 31 the interface is stopped.
+// error, 8-15 identifier of the last error, 16-23 frames since start (mod 256), 24-29 schedule
+// slot, 31 the interface is stopped.
 inline constexpr uint32_t kLinCommIdle = 0;
 inline constexpr uint32_t kLinCommActive = 1;
 inline constexpr uint32_t kLinCommInactive = 2;

@@ -15,7 +15,7 @@ class ExceptionBase {
   ExceptionBase() = default;
   ExceptionBase(const ExceptionBase& other);
   ExceptionBase& operator=(const ExceptionBase&) = delete;
-  virtual ~ExceptionBase();  // the Status releases the report through its policy
+  virtual ~ExceptionBase();                // the Status releases the report through its policy
   virtual const char* reportText() const;  // the report, or "" when there is none
 
   int32_t code() const { return held.code; }

@@ -29,7 +29,9 @@ class Scanner {
     return true;
   }
   void skipBlanks() {
-    while (!atEnd() && (text[pos] == ' ' || text[pos] == '\t' || text[pos] == '\r' || text[pos] == '\n')) ++pos;
+    while (!atEnd() &&
+           (text[pos] == ' ' || text[pos] == '\t' || text[pos] == '\r' || text[pos] == '\n'))
+      ++pos;
   }
   static bool isDigit(char c) { return c >= '0' && c <= '9'; }
   static bool isHex(char c) {
@@ -39,13 +41,20 @@ class Scanner {
   bool value(int depth) {
     skipBlanks();
     switch (peek()) {
-      case '{': return object(depth + 1);
-      case '[': return array(depth + 1);
-      case '"': return string();
-      case 't': return word("true");
-      case 'f': return word("false");
-      case 'n': return word("null");
-      default: return number();
+      case '{':
+        return object(depth + 1);
+      case '[':
+        return array(depth + 1);
+      case '"':
+        return string();
+      case 't':
+        return word("true");
+      case 'f':
+        return word("false");
+      case 'n':
+        return word("null");
+      default:
+        return number();
     }
   }
 

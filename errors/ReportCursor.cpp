@@ -17,20 +17,26 @@ bool isBlank(char c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; }
 
 const char* shortEscape(unsigned char byte) {
   switch (byte) {
-    case 0x08: return "\\b";
-    case 0x09: return "\\t";
-    case 0x0A: return "\\n";
-    case 0x0C: return "\\f";
-    case 0x0D: return "\\r";
-    case '"': return "\\\"";
-    case '\\': return "\\\\";
-    default: return nullptr;
+    case 0x08:
+      return "\\b";
+    case 0x09:
+      return "\\t";
+    case 0x0A:
+      return "\\n";
+    case 0x0C:
+      return "\\f";
+    case 0x0D:
+      return "\\r";
+    case '"':
+      return "\\\"";
+    case '\\':
+      return "\\\\";
+    default:
+      return nullptr;
   }
 }
 
-std::string quoted(const char* text) {
-  return '"' + escapeJson(text != nullptr ? text : "") + '"';
-}
+std::string quoted(const char* text) { return '"' + escapeJson(text != nullptr ? text : "") + '"'; }
 
 }  // namespace
 
@@ -63,7 +69,8 @@ ReportCursor::ReportCursor(Status& status) : owner(status) {
   valid = true;
 }
 
-void ReportCursor::addMember(const char* key, const std::string& encodedValue, uint32_t cursorBack) {
+void ReportCursor::addMember(const char* key, const std::string& encodedValue,
+                             uint32_t cursorBack) {
   if (!valid) return;
   uint32_t before = position;
   while (before > 0 && isBlank(owner.report[before - 1])) --before;
@@ -78,7 +85,9 @@ void ReportCursor::addMember(const char* key, const std::string& encodedValue, u
 
 void ReportCursor::openObject(const char* key) { addMember(key, "{}", 1); }
 
-void ReportCursor::addString(const char* key, const char* value) { addMember(key, quoted(value), 0); }
+void ReportCursor::addString(const char* key, const char* value) {
+  addMember(key, quoted(value), 0);
+}
 
 void ReportCursor::addInteger(const char* key, int32_t value) {
   addMember(key, std::to_string(value), 0);

@@ -21,7 +21,7 @@ class ReportCursor {
   // Ensures a buffer (at least 4 bytes) and positions at the end of the root object.
   explicit ReportCursor(Status& owner);
 
-  void openObject(const char* key);  // inserts "key":{} and moves inside it
+  void openObject(const char* key);                    // inserts "key":{} and moves inside it
   void addString(const char* key, const char* value);  // null texts are written as ""
   void addInteger(const char* key, int32_t value);
   void closeObject();  // back into the enclosing object

@@ -6,7 +6,7 @@
 namespace qverr {
 
 struct SourceLocation {
-  const char* file;           // the raising source unit, for example "qvsysq\stdpath_util"
+  const char* file;  // the raising source unit, for example "qvsysq\stdpath_util"
   int32_t line;
   const char* component;      // "kelvanert", or null to leave the member out
   const char* errorConstant;  // symbolic name of the code, "qvapalerr_objectNameCollision"

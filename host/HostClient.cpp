@@ -67,7 +67,8 @@ bool HostClient::ConnectSocket(const std::string& host, uint16_t port, int32_t r
   }
   int on = 1;
   setsockopt(socket_, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
-  if (receiveBuffer > 0) setsockopt(socket_, SOL_SOCKET, SO_RCVBUF, &receiveBuffer, sizeof receiveBuffer);
+  if (receiveBuffer > 0)
+    setsockopt(socket_, SOL_SOCKET, SO_RCVBUF, &receiveBuffer, sizeof receiveBuffer);
   if (connect(socket_, reinterpret_cast<sockaddr*>(&address), sizeof address) != 0) {
     error_ = std::strerror(errno);
     Close();

@@ -13,12 +13,12 @@ namespace kvhost {
 struct IdentifierRecord {
   uint32_t identifier = 0;  // CAN: bit 29 marks an extended identifier; FlexRay: the slot
   uint32_t count = 0;
-  uint64_t lastTimestamp = 0;      // 100 ns units since 1601-01-01 UTC
+  uint64_t lastTimestamp = 0;  // 100 ns units since 1601-01-01 UTC
   uint64_t previousTimestamp = 0;
   uint8_t type = 0;
-  uint8_t echo = 0;                // 0x80: the last frame was sent by this interface
+  uint8_t echo = 0;  // 0x80: the last frame was sent by this interface
   uint32_t payloadLength = 0;
-  std::vector<uint8_t> payload;    // payloadLength bytes
+  std::vector<uint8_t> payload;  // payloadLength bytes
   // LIN only.
   uint8_t flag = 0;
   uint32_t checksum = 0;

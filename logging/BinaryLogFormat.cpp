@@ -7,10 +7,12 @@
 namespace nKV_DLL300 {
 
 bool HasBinaryLogMagic(const uint8_t* data, size_t size) {
-  return size >= 2 && data[0] == kBinaryLogFileHeaderBytes[0] && data[1] == kBinaryLogFileHeaderBytes[1];
+  return size >= 2 && data[0] == kBinaryLogFileHeaderBytes[0] &&
+         data[1] == kBinaryLogFileHeaderBytes[1];
 }
 
-size_t CopyBinaryRecord(uint8_t* out, size_t cap, const RawFrameView& frame, BinaryRecordLayout layout) {
+size_t CopyBinaryRecord(uint8_t* out, size_t cap, const RawFrameView& frame,
+                        BinaryRecordLayout layout) {
   const uint32_t size = BinaryRecordSize(layout, frame.header);
   if (cap < size) return 0;
   // A fixed record of a frame whose payload area is shorter than 8 bytes cannot occur in a read

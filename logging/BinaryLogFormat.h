@@ -6,9 +6,12 @@
 //
 //   LIN                                          24 bytes, always
 //   CAN, canIoMode 0 and applicationProtocol 0   24 bytes, always (classic frames, 8 payload bytes)
-//   CAN otherwise                                16 + L rounded up to a multiple of 8; 16 when L is 0
-//                                                (L includes the J1939 length bits of the info byte)
-//   FlexRay                                      16 + the length byte rounded up to a multiple of 8;
+//   CAN otherwise                                16 + L rounded up to a multiple of 8; 16 when L is
+//   0
+//                                                (L includes the J1939 length bits of the info
+//                                                byte)
+//   FlexRay                                      16 + the length byte rounded up to a multiple of
+//   8;
 //                                                16 when it is 0
 //
 // Every record size is at most the size the frame occupies in the driver's read buffer, so a record
@@ -56,7 +59,8 @@ enum class BinaryRecordLayout : uint8_t {
 inline constexpr uint32_t kFixedRecordSize = 24;
 
 // The layout of a CAN log follows the two session settings as they are when the frame is written.
-constexpr BinaryRecordLayout CanBinaryRecordLayout(uint32_t canIoMode, uint32_t applicationProtocol) {
+constexpr BinaryRecordLayout CanBinaryRecordLayout(uint32_t canIoMode,
+                                                   uint32_t applicationProtocol) {
   return canIoMode == 0 && applicationProtocol == 0 ? BinaryRecordLayout::kFixed24
                                                     : BinaryRecordLayout::kCanVariable;
 }
@@ -65,9 +69,12 @@ constexpr BinaryRecordLayout CanBinaryRecordLayout(uint32_t canIoMode, uint32_t 
 constexpr uint32_t BinaryRecordSize(BinaryRecordLayout layout, const RawFrameHeader& h) {
   const auto rounded = [](uint32_t length) { return kRawFrameHeaderSize + ((length + 7u) & ~7u); };
   switch (layout) {
-    case BinaryRecordLayout::kFixed24: return kFixedRecordSize;
-    case BinaryRecordLayout::kCanVariable: return rounded(RawPayloadLength(h));
-    case BinaryRecordLayout::kFlexRayVariable: return rounded(h.length);
+    case BinaryRecordLayout::kFixed24:
+      return kFixedRecordSize;
+    case BinaryRecordLayout::kCanVariable:
+      return rounded(RawPayloadLength(h));
+    case BinaryRecordLayout::kFlexRayVariable:
+      return rounded(h.length);
   }
   return kFixedRecordSize;
 }
@@ -75,6 +82,7 @@ constexpr uint32_t BinaryRecordSize(BinaryRecordLayout layout, const RawFrameHea
 // Copies the record of `frame` (a view into a read batch, as RawFrameWalker yields it) into `out`
 // and returns its size; returns 0 and writes nothing when `cap` is too small. The record never
 // reaches past the frame's padded payload area, which the walker has checked lies in the batch.
-size_t CopyBinaryRecord(uint8_t* out, size_t cap, const RawFrameView& frame, BinaryRecordLayout layout);
+size_t CopyBinaryRecord(uint8_t* out, size_t cap, const RawFrameView& frame,
+                        BinaryRecordLayout layout);
 
 }  // namespace nKV_DLL300

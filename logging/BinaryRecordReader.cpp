@@ -12,8 +12,10 @@ bool IsTypeOfBus(uint8_t type, RecordBus bus) {
     case RecordBus::kCan:
       return type == 0x00 || type == 0x01 || type == 0x02 || type == 0x10 || type == 0x18 ||
              type == kFrameTypeJ1939;
-    case RecordBus::kLin: return type == 0x40 || type == 0x41 || type == 0x42;
-    case RecordBus::kFlexRay: return type == 0x20 || type == 0x21;
+    case RecordBus::kLin:
+      return type == 0x40 || type == 0x41 || type == 0x42;
+    case RecordBus::kFlexRay:
+      return type == 0x20 || type == 0x21;
   }
   return false;
 }
@@ -26,21 +28,24 @@ bool BinaryRecordReader::next(RawFrameView& out) {
   const uint32_t recordSize = BinaryRecordSize(layout_, out.header);
   if (recordSize > size_ - offset_) return false;
   const uint32_t held = recordSize - kRawFrameHeaderSize;
-  const uint32_t stated =
-      layout_ == BinaryRecordLayout::kFlexRayVariable ? out.header.length : RawPayloadLength(out.header);
+  const uint32_t stated = layout_ == BinaryRecordLayout::kFlexRayVariable
+                              ? out.header.length
+                              : RawPayloadLength(out.header);
   out.payload = data_ + offset_ + kRawFrameHeaderSize;
   out.payloadLength = std::min(stated, held);
   offset_ += recordSize;
   return true;
 }
 
-bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayout layout, RecordBus bus) {
+bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayout layout,
+                          RecordBus bus) {
   BinaryRecordReader reader(records, size, layout);
   RawFrameView frame;
   uint64_t lastTimestamp = 0;
   while (reader.next(frame)) {
     if (!IsTypeOfBus(frame.header.type, bus)) return false;
-    if (frame.payloadLength < RawPayloadLength(frame.header) && bus != RecordBus::kFlexRay) return false;
+    if (frame.payloadLength < RawPayloadLength(frame.header) && bus != RecordBus::kFlexRay)
+      return false;
     if (frame.header.timestamp < lastTimestamp) return false;
     lastTimestamp = frame.header.timestamp;
   }

@@ -35,10 +35,11 @@ class BinaryRecordReader {
 // of `bus` and a payload the layout can hold, with time stamps that never go back. Used to tell
 // apart the two CAN layouts of a log whose writer settings are unknown.
 enum class RecordBus : uint8_t { kCan, kLin, kFlexRay };
-bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayout layout, RecordBus bus);
+bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayout layout,
+                          RecordBus bus);
 
-// The CAN layout that reads `size` bytes of records consistently: fixed 24-byte records when they do,
-// else the variable layout.
+// The CAN layout that reads `size` bytes of records consistently: fixed 24-byte records when they
+// do, else the variable layout.
 BinaryRecordLayout DetectCanRecordLayout(const uint8_t* records, size_t size);
 
 }  // namespace nKV_DLL300

@@ -11,8 +11,8 @@ constexpr uint64_t kLargestConvertible = 0x7FFF'FFFF'FFFF'FFFFull;
 
 void CivilFromDays(int64_t daysSince1601, CalendarTime& out) {
   const int64_t z = daysSince1601 + kDaysFromMarch0To1601;
-  const int64_t era = z / 146'097;                       // z is never negative here
-  const int64_t dayOfEra = z - era * 146'097;            // [0, 146096]
+  const int64_t era = z / 146'097;             // z is never negative here
+  const int64_t dayOfEra = z - era * 146'097;  // [0, 146096]
   const int64_t yearOfEra =
       (dayOfEra - dayOfEra / 1'460 + dayOfEra / 36'524 - dayOfEra / 146'096) / 365;  // [0, 399]
   const int64_t dayOfYear = dayOfEra - (365 * yearOfEra + yearOfEra / 4 - yearOfEra / 100);

@@ -53,10 +53,17 @@ void OpenLogFile(SessionLog& log, std::string_view headerLine) {
       CanBinaryRecordLayout(settings.canIoMode.load(), settings.applicationProtocol.load()));
   const std::string path = NameLogFile(log, logType);
   switch (logType) {
-    case kLogTypeText: OpenTextLog(log, path, headerLine); break;
-    case kLogTypeBinary: OpenBinaryLog(log, path); break;
-    case kLogTypeMeasurementData: OpenVoraLog(log, path); break;
-    default: break;  // named nothing (reported above) and opens nothing
+    case kLogTypeText:
+      OpenTextLog(log, path, headerLine);
+      break;
+    case kLogTypeBinary:
+      OpenBinaryLog(log, path);
+      break;
+    case kLogTypeMeasurementData:
+      OpenVoraLog(log, path);
+      break;
+    default:
+      break;  // named nothing (reported above) and opens nothing
   }
 }
 
@@ -68,8 +75,11 @@ void CloseLogFile(SessionLog& log) {
       // that looks complete, so a failure here is reported once.
       if (!log.closeStream()) log.fail(kLogWriteIncomplete);
       break;
-    case kLogTypeMeasurementData: CloseVoraLog(log); break;
-    default: break;
+    case kLogTypeMeasurementData:
+      CloseVoraLog(log);
+      break;
+    default:
+      break;
   }
   log.setOpenedType(-1);
 }

@@ -12,9 +12,12 @@ namespace nKV_DLL300 {
 
 std::string LogFileExtension(uint32_t logType) {
   switch (logType) {
-    case kLogTypeText: return ".txt";
-    case kLogTypeBinary: return ".zfl";
-    case kLogTypeMeasurementData: return ".vora";
+    case kLogTypeText:
+      return ".txt";
+    case kLogTypeBinary:
+      return ".zfl";
+    case kLogTypeMeasurementData:
+      return ".vora";
     default:
       throw nENSPAN000::cExceptionBase(nENSPAN000::ErrorKind::UsageError, nENSPAN000::kLogModule,
                                        nENSPAN000::kLogFile, nENSPAN000::kLineBadLogType);

@@ -30,8 +30,8 @@ BatchSettings ReadBatchSettings(const SessionLog& log) {
 // Calls `write` for each of at most `frames` frames of the batch that the selection accepts.
 // Rejected frames are stepped over all the same.
 template <class Write>
-void ForEachLoggedFrame(const uint8_t* batch, uint32_t bytes, uint32_t frames, uint8_t logTransmitted,
-                        Write&& write) {
+void ForEachLoggedFrame(const uint8_t* batch, uint32_t bytes, uint32_t frames,
+                        uint8_t logTransmitted, Write&& write) {
   RawFrameWalker walker(batch, bytes);
   RawFrameView frame;
   for (uint32_t i = 0; i < frames && walker.next(frame); ++i) {
@@ -41,44 +41,55 @@ void ForEachLoggedFrame(const uint8_t* batch, uint32_t bytes, uint32_t frames, u
 
 size_t FormatLine(LogBus bus, char* out, const RawFrameView& frame, uint8_t logChecksum) {
   switch (bus) {
-    case LogBus::kCan: return FormatCanTextLine(out, SessionLog::kLineBufferSize, frame);
+    case LogBus::kCan:
+      return FormatCanTextLine(out, SessionLog::kLineBufferSize, frame);
     case LogBus::kLin:
       return FormatLinTextLine(out, SessionLog::kLineBufferSize, frame, logChecksum);
-    case LogBus::kFlexRay: return FormatFlexRayTextLine(out, SessionLog::kLineBufferSize, frame);
+    case LogBus::kFlexRay:
+      return FormatFlexRayTextLine(out, SessionLog::kLineBufferSize, frame);
   }
   return 0;
 }
 
-void WriteTextLines(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+void WriteTextLines(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes,
+                    uint32_t frames) {
   const BatchSettings settings = ReadBatchSettings(log);
   char* line = log.lineBuffer();
-  ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames, [&](const RawFrameView& frame) {
-    const size_t length = FormatLine(bus, line, frame, settings.logChecksum);
-    if (!log.write(line, length)) log.fail(kLogWriteIncomplete);
-  });
+  ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames,
+                     [&](const RawFrameView& frame) {
+                       const size_t length = FormatLine(bus, line, frame, settings.logChecksum);
+                       if (!log.write(line, length)) log.fail(kLogWriteIncomplete);
+                     });
 }
 
 BinaryRecordLayout RecordLayout(const SessionLog& log, LogBus bus) {
   switch (bus) {
-    case LogBus::kCan: return log.canLayout();
-    case LogBus::kLin: return BinaryRecordLayout::kFixed24;
-    case LogBus::kFlexRay: return BinaryRecordLayout::kFlexRayVariable;
+    case LogBus::kCan:
+      return log.canLayout();
+    case LogBus::kLin:
+      return BinaryRecordLayout::kFixed24;
+    case LogBus::kFlexRay:
+      return BinaryRecordLayout::kFlexRayVariable;
   }
   return BinaryRecordLayout::kFixed24;
 }
 
 // A record is the frame's first bytes in the read buffer, never more than the frame occupies
 // there, so it is written straight from the batch.
-void WriteRecords(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+void WriteRecords(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes,
+                  uint32_t frames) {
   const BatchSettings settings = ReadBatchSettings(log);
   const BinaryRecordLayout layout = RecordLayout(log, bus);
-  ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames, [&](const RawFrameView& frame) {
-    const uint8_t* record = frame.payload - kRawFrameHeaderSize;
-    if (!log.write(record, BinaryRecordSize(layout, frame.header))) log.fail(kLogWriteIncomplete);
-  });
+  ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames,
+                     [&](const RawFrameView& frame) {
+                       const uint8_t* record = frame.payload - kRawFrameHeaderSize;
+                       if (!log.write(record, BinaryRecordSize(layout, frame.header)))
+                         log.fail(kLogWriteIncomplete);
+                     });
 }
 
-void WriteBatch(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
+void WriteBatch(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes,
+                uint32_t frames) {
   if (bytes == 0 || frames == 0) return;
   switch (log.openedType()) {
     case kLogTypeText:
@@ -87,8 +98,11 @@ void WriteBatch(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t byte
     case kLogTypeBinary:
       if (log.isOpen()) WriteRecords(log, bus, batch, bytes, frames);
       break;
-    case kLogTypeMeasurementData: WriteVoraRecords(log, RecordLayout(log, bus), batch, bytes, frames); break;
-    default: break;
+    case kLogTypeMeasurementData:
+      WriteVoraRecords(log, RecordLayout(log, bus), batch, bytes, frames);
+      break;
+    default:
+      break;
   }
 }
 

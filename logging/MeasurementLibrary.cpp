@@ -36,15 +36,15 @@ bool StartsWithIgnoringCase(const std::string& text, std::string_view prefix) {
 int32_t DetectPlatform() {
   const std::optional<std::string> os = platform::GetEnvironmentVariable("OS");
   return os && StartsWithIgnoringCase(*os, kRealTimeKernel) ? kVorPlatformRealTime
-                                                             : kVorPlatformDesktop;
+                                                            : kVorPlatformDesktop;
 }
 
 // QVSHAREDDIR + "\vora\", or "" when the key or the value is missing or cannot be read. A value
 // that is present but empty still gets "\vora\" (so the file is looked for in \vora\ of the drive).
 std::string RegistryDirectory() {
   platform::HKEY key = nullptr;
-  if (platform::RegOpenKeyExA(platform::HKEY_LOCAL_MACHINE, kInstallerKey, 0, kKeyQueryValue, &key) !=
-      platform::ERROR_SUCCESS) {
+  if (platform::RegOpenKeyExA(platform::HKEY_LOCAL_MACHINE, kInstallerKey, 0, kKeyQueryValue,
+                              &key) != platform::ERROR_SUCCESS) {
     return {};
   }
   char value[kPathBufferSize] = {};
@@ -52,7 +52,8 @@ std::string RegistryDirectory() {
   uint32_t type = 0;
   std::string directory;
   if (platform::RegQueryValueExA(key, kSharedDirectoryValue, nullptr, &type,
-                                 reinterpret_cast<uint8_t*>(value), &size) == platform::ERROR_SUCCESS) {
+                                 reinterpret_cast<uint8_t*>(value),
+                                 &size) == platform::ERROR_SUCCESS) {
     directory.assign(value, std::find(value, value + sizeof value, '\0'));
     directory += kLibrarySubdirectory;
   }
@@ -162,7 +163,9 @@ int32_t MeasurementLibrary::FileBufFlush(int32_t scope, int32_t fileHandle) cons
   return Table().fileBufFlush(scope, fileHandle);
 }
 
-int32_t MeasurementLibrary::FileClose(int32_t fileHandle) const { return Table().fileClose(fileHandle); }
+int32_t MeasurementLibrary::FileClose(int32_t fileHandle) const {
+  return Table().fileClose(fileHandle);
+}
 
 // Never destroyed: the module unloads the library explicitly after its service has stopped, and
 // a destructor run by the static teardown would come before that.

@@ -79,9 +79,9 @@ class MeasurementLibrary {
   // Throws unless loaded; the table then holds every entry point.
   const EntryPoints& Table() const;
 
-  mutable std::mutex lock_;     // the library lock: guards loading, unloading and locating
-  std::string path_;            // lock_
-  int32_t platformCode_ = -1;   // lock_; -1 until detected, then kept for the instance's life
+  mutable std::mutex lock_;    // the library lock: guards loading, unloading and locating
+  std::string path_;           // lock_
+  int32_t platformCode_ = -1;  // lock_; -1 until detected, then kept for the instance's life
   platform::HMODULE module_ = nullptr;  // lock_
   std::atomic<bool> loaded_{false};     // set under lock_ once every entry point is resolved
   EntryPoints table_;                   // see EntryPoints

@@ -23,10 +23,14 @@ struct TypeText {
 // Type cell of a CAN line, ended by the line feed.
 TypeText CanTypeText(uint8_t type, bool extended) {
   switch (type) {
-    case 0x01: return extended ? TypeText{"E/R\n", 4} : TypeText{"S/R\n", 4};
-    case 0x10: return extended ? TypeText{"E/FD\n", 5} : TypeText{"FD\n", 3};
-    case 0x18: return extended ? TypeText{"E/BRS\n", 6} : TypeText{"BRS\n", 4};
-    default: return extended ? TypeText{"E\n", 2} : TypeText{"S\n", 2};
+    case 0x01:
+      return extended ? TypeText{"E/R\n", 4} : TypeText{"S/R\n", 4};
+    case 0x10:
+      return extended ? TypeText{"E/FD\n", 5} : TypeText{"FD\n", 3};
+    case 0x18:
+      return extended ? TypeText{"E/BRS\n", 6} : TypeText{"BRS\n", 4};
+    default:
+      return extended ? TypeText{"E\n", 2} : TypeText{"S\n", 2};
   }
 }
 

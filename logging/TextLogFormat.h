@@ -6,7 +6,8 @@
 //
 //   CAN      "%x\t" identifier (extended: AND 0x1FFFFFFF, standard: AND 0x7FF), "%02x  " per
 //            payload byte (J1939 lengths up to 2047 written whole, no padding), "\t%1d\t" length,
-//            type text "%s\n": 0x01 "S/R"/"E/R", 0x10 "FD"/"E/FD", 0x18 "BRS"/"E/BRS", else "S"/"E".
+//            type text "%s\n": 0x01 "S/R"/"E/R", 0x10 "FD"/"E/FD", 0x18 "BRS"/"E/BRS", else
+//            "S"/"E".
 //   LIN      "%x\t" identifier, "%02x  " per payload byte and "00  " up to eight groups,
 //            "\t%1d\t" length, with the checksum column "%02x\t" info byte, then "NR\n" for type
 //            0x42 (no response) or "S\n".
@@ -32,7 +33,8 @@ inline constexpr std::string_view kCanTextLogHeader =
     "Timestamp\tID\tPayload\tPayload Length\tType\tName";
 inline constexpr std::string_view kLinTextLogHeaderWithChecksum =
     "Timestamp\tID\tPayload\tPayload Length\tChecksum\tType\t";
-inline constexpr std::string_view kLinTextLogHeader = "Timestamp\tID\tPayload\tPayload Length\tType\t";
+inline constexpr std::string_view kLinTextLogHeader =
+    "Timestamp\tID\tPayload\tPayload Length\tType\t";
 inline constexpr std::string_view kFlexRayTextLogHeader =
     "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle Number\tChannel\tStartup\tSync\tPreamble";
 

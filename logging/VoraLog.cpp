@@ -27,7 +27,8 @@ static_assert(kPropertyType == 3 && kRawType == 5 && kFlushScope == 3);
 
 void CreateChannel(SessionLog& log, const MeasurementLibrary& library) {
   const SessionSettings& settings = log.session().connection->settings;
-  const std::string channelPath = VoraChannelPath(settings.voraGroupName.Get(), settings.voraChannelName.Get());
+  const std::string channelPath =
+      VoraChannelPath(settings.voraGroupName.Get(), settings.voraChannelName.Get());
   log.voraChannel = kVorNoHandle;
   (void)library.ObjCreateA(channelPath.c_str(), log.voraFile, &log.voraChannel);
   // The protocol follows the bus the session reads, which is what the records are.
@@ -87,9 +88,12 @@ std::string VoraChannelPath(std::string_view group, std::string_view channel) {
 
 int32_t VoraNetworkProtocol(uint32_t busType) {
   switch (busType) {
-    case kBusTypeLin: return kVoraProtocolLin;
-    case kBusTypeFlexRay: return kVoraProtocolFlexRay;
-    default: return kVoraProtocolCan;
+    case kBusTypeLin:
+      return kVoraProtocolLin;
+    case kBusTypeFlexRay:
+      return kVoraProtocolFlexRay;
+    default:
+      return kVoraProtocolCan;
   }
 }
 
@@ -97,8 +101,8 @@ void OpenVoraLog(SessionLog& log, const std::string& path) {
   Guarded(log, [&] { OpenFileAndChannel(log, path); });
 }
 
-void WriteVoraRecords(SessionLog& log, BinaryRecordLayout layout, const uint8_t* batch, uint32_t bytes,
-                      uint32_t frames) {
+void WriteVoraRecords(SessionLog& log, BinaryRecordLayout layout, const uint8_t* batch,
+                      uint32_t bytes, uint32_t frames) {
   if (log.voraFile == kVorNoHandle || bytes == 0) return;
   Guarded(log, [&] { AppendRecords(log, layout, batch, bytes, frames); });
 }

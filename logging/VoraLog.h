@@ -40,8 +40,8 @@ void OpenVoraLog(SessionLog& log, const std::string& path);
 // the frame selection accepts (the binary log's record of `layout`) to the channel. Nothing when
 // no file is open. A library failure stores -24, reports it and ends the batch. Poll thread.
 // Never throws.
-void WriteVoraRecords(SessionLog& log, BinaryRecordLayout layout, const uint8_t* batch, uint32_t bytes,
-                      uint32_t frames);
+void WriteVoraRecords(SessionLog& log, BinaryRecordLayout layout, const uint8_t* batch,
+                      uint32_t bytes, uint32_t frames);
 
 // The type-2 branch of CloseLogFile: flushes and closes the file, if one is open; a library
 // failure stores -24 and reports it. Stopping thread. Never throws.

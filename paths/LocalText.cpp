@@ -60,12 +60,15 @@ int32_t convert(const char* text, std::string& out, Conversion conversion) {
 
 int32_t mbsToUtf8(const char* text, std::string& out) { return convert(text, out, convertToUtf8); }
 
-int32_t utf8ToMbs(const char* text, std::string& out) { return convert(text, out, convertFromUtf8); }
+int32_t utf8ToMbs(const char* text, std::string& out) {
+  return convert(text, out, convertFromUtf8);
+}
 
 void throwConversionError(int32_t code, int32_t line) {
   qverr::Exception exception;
-  qverr::setError(exception.status(), code,
-                  {qverr::kConversionFile, line, qverr::kComponentName, qverr::kConversionConstant});
+  qverr::setError(
+      exception.status(), code,
+      {qverr::kConversionFile, line, qverr::kComponentName, qverr::kConversionConstant});
   throw exception;
 }
 

@@ -1,7 +1,6 @@
 // The table of standard directories: base query, components, and whether it is created.
 #include "paths/StandardPaths.h"
 
-
 #include "errors/RaiseSites.h"
 #include "errors/cExceptionBase.h"
 
@@ -21,26 +20,45 @@ constexpr uint32_t kStandardPathCount = 18;
 
 StandardDirectory directoryFor(uint32_t id) {
   switch (id) {
-    case 1: return {Base::Shared, {"tarvix", "dbCache"}, false};
-    case 2: case 15: return {Base::Data, {"tarvix", nullptr}, true};
-    case 3: case 11: case 12: return {Base::Data, {"tarvix", "log"}, true};
-    case 4: return {Base::Shared, {"tarvix", "firmware"}, false};
-    case 7: return {Base::ErrorFiles, {"errors", "English"}, false};
-    case 8: return {Base::ErrorFiles, {"errors", "German"}, false};
-    case 9: return {Base::ErrorFiles, {"errors", "French"}, false};
-    case 10: return {Base::ErrorFiles, {"errors", "Japanese"}, false};
-    case 13: return {Base::Temp, {"tarvix", nullptr}, false};
-    case 16: case 17: return {Base::Data, {"tarvix", "kelvane"}, true};
-    default: return {Base::Shared, {"tarvix", nullptr}, false};  // 0, 5, 6, 14
+    case 1:
+      return {Base::Shared, {"tarvix", "dbCache"}, false};
+    case 2:
+    case 15:
+      return {Base::Data, {"tarvix", nullptr}, true};
+    case 3:
+    case 11:
+    case 12:
+      return {Base::Data, {"tarvix", "log"}, true};
+    case 4:
+      return {Base::Shared, {"tarvix", "firmware"}, false};
+    case 7:
+      return {Base::ErrorFiles, {"errors", "English"}, false};
+    case 8:
+      return {Base::ErrorFiles, {"errors", "German"}, false};
+    case 9:
+      return {Base::ErrorFiles, {"errors", "French"}, false};
+    case 10:
+      return {Base::ErrorFiles, {"errors", "Japanese"}, false};
+    case 13:
+      return {Base::Temp, {"tarvix", nullptr}, false};
+    case 16:
+    case 17:
+      return {Base::Data, {"tarvix", "kelvane"}, true};
+    default:
+      return {Base::Shared, {"tarvix", nullptr}, false};  // 0, 5, 6, 14
   }
 }
 
 std::string baseText(Base base, cSysqWrapper& wrapper) {
   switch (base) {
-    case Base::Data: return wrapper.getDataDir(0);
-    case Base::ErrorFiles: return wrapper.getErrorFilesDir();
-    case Base::Temp: return wrapper.getTempDir();
-    default: return wrapper.getSharedDir();
+    case Base::Data:
+      return wrapper.getDataDir(0);
+    case Base::ErrorFiles:
+      return wrapper.getErrorFilesDir();
+    case Base::Temp:
+      return wrapper.getTempDir();
+    default:
+      return wrapper.getSharedDir();
   }
 }
 

@@ -25,7 +25,7 @@ void EtsDisplayMessage(const char* format, ...) {
   va_end(arguments);
   if (length <= 0) return;
   const size_t size = static_cast<size_t>(length) < sizeof message ? static_cast<size_t>(length)
-                                                                    : sizeof message - 1;
+                                                                   : sizeof message - 1;
   const ssize_t written = write(STDERR_FILENO, message, size);
   (void)written;  // nowhere to report a failing console
 }

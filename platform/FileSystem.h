@@ -12,8 +12,8 @@ constexpr uint32_t kFileAttributeNormal = 0x80;
 constexpr uint32_t kInvalidFileAttributes = 0xFFFFFFFF;
 
 // mkdir of one level: 0 on success, else the errno (17 exists, 2 parent missing). A path that
-// cannot be mapped onto the drive, or a file standing where a parent should be, gives 2. The drive's own directory is created on demand,
-// as a volume that is always there.
+// cannot be mapped onto the drive, or a file standing where a parent should be, gives 2. The
+// drive's own directory is created on demand, as a volume that is always there.
 int MakeDirectory(const std::string& runtimePath);
 
 // kFileAttributeDirectory or kFileAttributeNormal for an existing path, kInvalidFileAttributes

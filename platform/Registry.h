@@ -25,7 +25,8 @@ inline constexpr int32_t ERROR_MORE_DATA = 234;
 inline constexpr uint32_t REG_SZ = 1;
 
 // Opens root\subKey; *result must be released with RegCloseKey. Options and access are ignored.
-int32_t RegOpenKeyExA(HKEY root, const char* subKey, uint32_t options, uint32_t access, HKEY* result);
+int32_t RegOpenKeyExA(HKEY root, const char* subKey, uint32_t options, uint32_t access,
+                      HKEY* result);
 
 // Reads a string value with its NUL. data may be null to ask for the size; *dataSize is the
 // buffer size in, the bytes needed (value length + 1) out; ERROR_MORE_DATA when it is short.

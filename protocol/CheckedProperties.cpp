@@ -27,9 +27,9 @@ constexpr CheckedRule kLogFile{"<ACK: SET_PROP_LOGFILE %d> \n",
 constexpr CheckedRule kLogFileType{"<ACK: SET_PROP_LOGFILE_TYPE %d> \n",
                                    "<ERROR: SET_PROP_LOGFILE_TYPE: Value range error>\n", 0, 2,
                                    ReplySession::kNone};
-constexpr CheckedRule kTxTimeStatistic{
-    "<ACK: SET_PROP_TX_TIME_STATISTIC %d> \n",
-    "<ERROR: SET_PROP_TX_TIME_STATISTIC: Value range error>\n", 1000, kNoLimit, ReplySession::kNone};
+constexpr CheckedRule kTxTimeStatistic{"<ACK: SET_PROP_TX_TIME_STATISTIC %d> \n",
+                                       "<ERROR: SET_PROP_TX_TIME_STATISTIC: Value range error>\n",
+                                       1000, kNoLimit, ReplySession::kNone};
 constexpr CheckedRule kTransceiverType{
     "<ACK: SET_PROP_SESSION_TRANSCEIVER_TYPE %d> \n",
     "<ERROR: SET_PROP_SESSION_TRANSCEIVER_TYPE: Value range error>\n", 0, 4, ReplySession::kWith};
@@ -39,9 +39,9 @@ constexpr CheckedRule kShowNullFrames{
 constexpr CheckedRule kNoResponseFrames{
     "<ACK: SET_PROP_SESSION_NO_RESPONSE_FRAMES %d> \n",
     "<ERROR: SET_PROP_SESSION_NO_RESPONSE_FRAMES: Value range error>\n", 0, 1, ReplySession::kWith};
-constexpr CheckedRule kLogChecksum{
-    "<ACK: SET_PROP_SESSION_LOG_CHECKSUM %d> \n",
-    "<ERROR: SET_PROP_SESSION_LOG_CHECKSUM: Value range error>\n", 0, 1, ReplySession::kWith};
+constexpr CheckedRule kLogChecksum{"<ACK: SET_PROP_SESSION_LOG_CHECKSUM %d> \n",
+                                   "<ERROR: SET_PROP_SESSION_LOG_CHECKSUM: Value range error>\n", 0,
+                                   1, ReplySession::kWith};
 
 // Reads with `Read`, stores into settings.*Field, then answers by `Rule`.
 template <auto Field, auto Read, const CheckedRule& Rule>

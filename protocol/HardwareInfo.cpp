@@ -37,8 +37,8 @@ int32_t ReadInterfaceRecord(DriverSystem& driver, uint32_t interfaceRef, Hardwar
 // Lists the interfaces of one device into `table`; 0 or the failing status.
 int32_t ListDevice(DriverSystem& driver, uint32_t deviceRef, std::vector<HardwareRecord>& table) {
   uint32_t interfaces[kMaxInterfaces] = {};
-  int32_t status = driver.GetProperty(deviceRef, kPropertyInterfaceRefs, sizeof interfaces,
-                                      interfaces);
+  int32_t status =
+      driver.GetProperty(deviceRef, kPropertyInterfaceRefs, sizeof interfaces, interfaces);
   if (status != 0) return status;
   for (size_t i = 0; i < kMaxInterfaces && interfaces[i] != 0; ++i) {
     HardwareRecord record;
@@ -86,7 +86,8 @@ int32_t buildHardwareTable(DriverSystem& driver, std::vector<HardwareRecord>& ta
 }
 
 int32_t SendHardwareInfo(HostConnection& connection) {
-  const void* records = connection.hardwareTable.empty() ? nullptr : connection.hardwareTable.data();
+  const void* records =
+      connection.hardwareTable.empty() ? nullptr : connection.hardwareTable.data();
   SendReply(connection, records, connection.session.get(), kMessageHardwareTable,
             static_cast<uint32_t>(connection.hardwareCount * sizeof(HardwareRecord)));
   return 0;

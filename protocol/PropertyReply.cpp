@@ -20,7 +20,9 @@ std::string FillReply(std::string_view pattern, std::string_view value) {
     if (at == std::string_view::npos) continue;
     std::string text;
     text.reserve(pattern.size() + value.size());
-    text.append(pattern.substr(0, at)).append(value).append(pattern.substr(at + placeholder.size()));
+    text.append(pattern.substr(0, at))
+        .append(value)
+        .append(pattern.substr(at + placeholder.size()));
     return text;
   }
   return std::string(pattern);

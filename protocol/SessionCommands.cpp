@@ -103,8 +103,8 @@ const char* AlreadyStartedText(const CBusSystem& session) {
 int32_t StartSession(HostConnection& connection) {
   const uint32_t busType = connection.busType.load();
   const SessionSettings& settings = connection.settings;
-  if (busType == kBusTypeFlexRay && settings.runMode.Contains("NORMAL") &&
-      settings.alias.Empty() && settings.cluster.Empty()) {
+  if (busType == kBusTypeFlexRay && settings.runMode.Contains("NORMAL") && settings.alias.Empty() &&
+      settings.cluster.Empty()) {
     SendText(connection, kNoAliasAndCluster, nullptr, kMessageErrorText);
     return 0;
   }
@@ -148,9 +148,10 @@ int32_t ReadLastError(HostConnection& connection) {
     SendFormatted(connection, kMessageText, "<TCP Error: %d> \n", tcpError);
     return 0;
   }
-  const char* format = session->busType == kBusTypeLin       ? "<LIN Error: %d>  <TCP Error: %d> \n"
-                       : session->busType == kBusTypeFlexRay ? "<FlexRay Error: %d>  <TCP Error: %d> \n"
-                                                             : "<CAN Error: %d>  <TCP Error: %d> \n";
+  const char* format = session->busType == kBusTypeLin ? "<LIN Error: %d>  <TCP Error: %d> \n"
+                       : session->busType == kBusTypeFlexRay
+                           ? "<FlexRay Error: %d>  <TCP Error: %d> \n"
+                           : "<CAN Error: %d>  <TCP Error: %d> \n";
   SendFormatted(connection, kMessageText, format, session->lastStatus.load(), tcpError);
   return 0;
 }

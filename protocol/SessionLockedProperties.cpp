@@ -19,7 +19,8 @@ struct LockedRule {
 };
 
 constexpr LockedRule kLogTransmittedFrames{
-    "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES", "<ACK: SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES %d> \n",
+    "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES",
+    "<ACK: SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES %d> \n",
     "<ERROR: SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES: Value range error>\n", 1};
 constexpr LockedRule kTermination{"SET_PROP_SESSION_TERMINATION",
                                   "<ACK: SET_PROP_SESSION_TERMINATION %d> \n",
@@ -39,10 +40,14 @@ constexpr LockedRule kCluster{"SET_PROP_SESSION_CLUSTER", "<ACK: SET_PROP_SESSIO
 // The bus word of the refusal texts; empty for a bus type that names no bus.
 std::string_view BusWord(uint32_t busType) {
   switch (busType) {
-    case 1: return "CAN";
-    case 2: return "LIN";
-    case 3: return "FR";
-    default: return "";
+    case 1:
+      return "CAN";
+    case 2:
+      return "LIN";
+    case 3:
+      return "FR";
+    default:
+      return "";
   }
 }
 

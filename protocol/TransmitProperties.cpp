@@ -20,9 +20,10 @@ void AcknowledgeAndStore(HostConnection& connection, const char* text, Store sto
 }
 
 void PayloadLength(HostConnection& connection, std::string_view value) {
-  AcknowledgeAndStore(connection, "<ACK: SET_TX_PROP_PAYLOAD_LENGTH>\n", [&](CTransmitFrame& frame) {
-    frame.txPayloadLength = static_cast<uint32_t>(ReadInteger(value));
-  });
+  AcknowledgeAndStore(connection, "<ACK: SET_TX_PROP_PAYLOAD_LENGTH>\n",
+                      [&](CTransmitFrame& frame) {
+                        frame.txPayloadLength = static_cast<uint32_t>(ReadInteger(value));
+                      });
 }
 
 void ExtendedId(HostConnection& connection, std::string_view value) {

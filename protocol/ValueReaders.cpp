@@ -73,7 +73,8 @@ uint32_t ReadKey(std::string_view value) {
   Cursor cursor(value);
   int base = 10;
   if (cursor.Peek() == '0') {
-    bool hex = (cursor.Peek(1) == 'x' || cursor.Peek(1) == 'X') && DigitValue(cursor.Peek(2), 16) >= 0;
+    bool hex =
+        (cursor.Peek(1) == 'x' || cursor.Peek(1) == 'X') && DigitValue(cursor.Peek(2), 16) >= 0;
     base = hex ? 16 : 8;
     if (hex) cursor.at += 2;
   }

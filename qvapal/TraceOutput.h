@@ -23,6 +23,7 @@ void defaultConsoleOutput(const char* text);
 void tracePrintf(const char* format, ...) __attribute__((format(printf, 1, 2)));
 
 // Formats through formatHook into the caller's buffer.
-int traceFormat(char* buffer, size_t size, const char* format, ...) __attribute__((format(printf, 3, 4)));
+int traceFormat(char* buffer, size_t size, const char* format, ...)
+    __attribute__((format(printf, 3, 4)));
 
 }  // namespace nQVAPAL000

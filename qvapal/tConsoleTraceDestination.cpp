@@ -19,7 +19,8 @@ void tConsoleTraceDestination::writeTextN(const char* text, uint32_t length) {
 
 void tConsoleTraceDestination::writeText(const char* text) { tracePrintf("%s", text); }
 
-void tConsoleTraceDestination::getDestinationArguments(char* buffer, uint32_t size, uint32_t* needed) {
+void tConsoleTraceDestination::getDestinationArguments(char* buffer, uint32_t size,
+                                                       uint32_t* needed) {
   if (buffer != nullptr) {
     for (uint32_t i = 0; i < size && i < sizeof kArguments; ++i) buffer[i] = kArguments[i];
     if (size > 0) buffer[size - 1] = '\0';

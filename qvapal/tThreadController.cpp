@@ -36,7 +36,8 @@ void threadStart(void* raw) {
 
 tThreadController::tThreadController() : tThreadController(platform::SystemThreads()) {}
 
-tThreadController::tThreadController(platform::ThreadSystem& threadSystem) : threads(threadSystem) {}
+tThreadController::tThreadController(platform::ThreadSystem& threadSystem)
+    : threads(threadSystem) {}
 
 tThreadController::~tThreadController() { releaseHandle(); }
 

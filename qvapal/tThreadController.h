@@ -45,7 +45,7 @@ class tThreadController {
   Entry entry = nullptr;            // managing thread only
   platform::ThreadHandle handle;    // managing thread only
   std::atomic<bool> running{false};
-  bool ownsHandle = false;          // managing thread only
+  bool ownsHandle = false;  // managing thread only
 };
 
 }  // namespace nQVAPAL000

@@ -36,7 +36,8 @@ FailureRow rowFor(int errorNumber) {
 
 void reportFailure(const char* path, qverr::Status& status, int errorNumber) {
   const FailureRow row = rowFor(errorNumber);
-  if (!qverr::setError(status, row.code, {kDirectorySource, row.line, qverr::kComponentName, row.constant})) {
+  if (!qverr::setError(status, row.code,
+                       {kDirectorySource, row.line, qverr::kComponentName, row.constant})) {
     return;
   }
   const std::string text = platform::ErrorText(errorNumber);

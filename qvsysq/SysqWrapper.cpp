@@ -37,7 +37,8 @@ std::string SysqWrapper::getDataDir(int32_t) { return answer(kRootDir); }
 // The runtime library's temporary-name function is unsafe on this platform; a process-wide
 // counter gives names that are unique within the process and never null.
 std::string SysqWrapper::getTempFileName() {
-  return answer(std::string(kTempDir) + "\\kv" + std::to_string(temporaryCounter.fetch_add(1)) + ".tmp");
+  return answer(std::string(kTempDir) + "\\kv" + std::to_string(temporaryCounter.fetch_add(1)) +
+                ".tmp");
 }
 
 }  // namespace qvsysq

@@ -11,13 +11,13 @@ namespace qvsysq {
 class SysqWrapper {
  public:
   virtual ~SysqWrapper();
-  virtual std::string getRootDir();        // "C:\QV-RT"
-  virtual std::string getSharedDir();      // "C:\QV-RT"
-  virtual std::string getSystemDir();      // "C:\QV-RT\SYSTEM"
-  virtual std::string getErrorFilesDir();  // "C:\QV-RT\SYSTEM"
-  virtual std::string getTempDir();        // "c:\temp"
+  virtual std::string getRootDir();              // "C:\QV-RT"
+  virtual std::string getSharedDir();            // "C:\QV-RT"
+  virtual std::string getSystemDir();            // "C:\QV-RT\SYSTEM"
+  virtual std::string getErrorFilesDir();        // "C:\QV-RT\SYSTEM"
+  virtual std::string getTempDir();              // "c:\temp"
   virtual std::string getDataDir(int32_t kind);  // "C:\QV-RT"; kind is ignored
-  virtual std::string getTempFileName();   // "c:\temp\" and a name unique in this process
+  virtual std::string getTempFileName();         // "c:\temp\" and a name unique in this process
 };
 
 }  // namespace qvsysq

@@ -2,7 +2,6 @@
 #include "service/Configuration.h"
 
 #include <cstdio>
-
 #include <exception>
 
 #include "paths/StandardPaths.h"

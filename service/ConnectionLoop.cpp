@@ -56,7 +56,8 @@ int32_t AcceptHost(ServiceContext& context) {
   }
   (void)buildHardwareTable(*context.options.driver, context.hardwareTable);
   ConnectionSetup setup;
-  for (size_t i = 0; i < kDriverVersionCount; ++i) setup.driverVersion[i] = context.driverVersion[i];
+  for (size_t i = 0; i < kDriverVersionCount; ++i)
+    setup.driverVersion[i] = context.driverVersion[i];
   setup.hardwareTable = context.hardwareTable;
   setup.statistics = &context.stats;
   slot->socket = socket;

@@ -38,11 +38,11 @@ class HostConnection {
   SessionSettings settings;  // see SessionSettings for its guards
   const MessageTable commandTable;
   const MessageTable propertyTable;
-  std::atomic<uint32_t> busType{0};  // 0 none, 1 CAN, 2 LIN, 3 FlexRay
+  std::atomic<uint32_t> busType{0};                  // 0 none, 1 CAN, 2 LIN, 3 FlexRay
   uint32_t driverVersion[kDriverVersionCount] = {};  // set at construction, read-only after
-  std::atomic<int32_t> lastTcpError{0};  // result of the last send on this connection
-  Stopwatch heartbeatWatch;               // service thread only
-  std::unique_ptr<CBusSystem> session;    // service thread only
+  std::atomic<int32_t> lastTcpError{0};              // result of the last send on this connection
+  Stopwatch heartbeatWatch;                          // service thread only
+  std::unique_ptr<CBusSystem> session;               // service thread only
   std::atomic<bool> closeRequested{false};
   const std::vector<HardwareRecord> hardwareTable;  // own copy, read-only
   const uint16_t hardwareCount;

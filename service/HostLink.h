@@ -12,7 +12,8 @@ constexpr size_t kMessageBufferSize = 256;
 constexpr int32_t kReceiveFailed = -7;
 constexpr int32_t kHeartbeatTimeout = -25;
 constexpr uint64_t kHeartbeatLimitMs = 10000;
-constexpr char kHeartbeatErrorText[] = "<ERROR: Heartbeat message missing| TCP Client disconnect> \n";
+constexpr char kHeartbeatErrorText[] =
+    "<ERROR: Heartbeat message missing| TCP Client disconnect> \n";
 
 // Waits at most 100 ms for the host's next message and receives at most 256 bytes of it into
 // `buffer` (kMessageBufferSize bytes), `received` telling how many. Returns 0 when bytes were

@@ -24,7 +24,8 @@ uint32_t RemainingMs(uint64_t deadline) {
 
 uint32_t PayloadLength(const void* payload, uint8_t type, uint32_t length) {
   if (IsBinaryMessageType(type) && length != 0) return payload == nullptr ? 0 : length;
-  return payload == nullptr ? 0 : static_cast<uint32_t>(std::strlen(static_cast<const char*>(payload)));
+  return payload == nullptr ? 0
+                            : static_cast<uint32_t>(std::strlen(static_cast<const char*>(payload)));
 }
 
 MessageHeaderFields HeaderFor(HostConnection& connection, const CBusSystem* session, uint8_t type,
@@ -35,7 +36,8 @@ MessageHeaderFields HeaderFor(HostConnection& connection, const CBusSystem* sess
   fields.payloadLength = payloadLength;
   uint32_t busType = connection.busType.load();
   if (session != nullptr && busType >= 1 && busType <= 3) {
-    fields.idCount = recordCount >= 0 ? static_cast<uint32_t>(recordCount) : session->idCount.load();
+    fields.idCount =
+        recordCount >= 0 ? static_cast<uint32_t>(recordCount) : session->idCount.load();
     fields.lastStatus = session->lastStatus.load();
   }
   for (size_t i = 0; i < 4; ++i) {

@@ -4,8 +4,8 @@
 #include "platform/Console.h"
 #include "protocol/HardwareInfo.h"
 #include "service/CPollTCPThread.h"
-#include "service/ConnectionLoop.h"
 #include "service/Configuration.h"
+#include "service/ConnectionLoop.h"
 #include "service/Listener.h"
 #include "timing/Time.h"
 

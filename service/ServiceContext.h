@@ -66,16 +66,16 @@ class ServiceContext {
 
   std::atomic<platform::net::SocketHandle> listenSocket{platform::net::kInvalidSocket};
   std::unique_ptr<nQVAPAL000::tThreadController> threadController;  // constructing thread
-  std::unique_ptr<CPollTCPThread> serviceThread;                     // constructing thread
-  std::atomic<bool> running{true};                                   // any thread
+  std::unique_ptr<CPollTCPThread> serviceThread;                    // constructing thread
+  std::atomic<bool> running{true};                                  // any thread
   uint32_t driverVersion[kDriverVersionCount] = {};
   std::vector<HardwareRecord> hardwareTable;  // rebuilt at every accept; copied to each host
   std::array<ConnectionSlot, kConnectionSlots> connections;
   const ServiceOptions options;
-  ServiceStatistics stats;                  // atomics, any thread
-  std::atomic<int32_t> boundPort{-1};       // any thread
-  std::atomic<bool> setUpComplete{false};   // any thread: configuration and listener done
-  std::atomic<bool> shutDown_{false};       // any thread: Shutdown ran
+  ServiceStatistics stats;                 // atomics, any thread
+  std::atomic<int32_t> boundPort{-1};      // any thread
+  std::atomic<bool> setUpComplete{false};  // any thread: configuration and listener done
+  std::atomic<bool> shutDown_{false};      // any thread: Shutdown ran
 };
 
 // The start-up and loop of the service thread: wait, configuration, listener, version values,

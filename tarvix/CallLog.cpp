@@ -8,9 +8,12 @@ CallLog& CallLog::Instance() {
   return *log;
 }
 
-void CallLog::refreshActive() { active_.store(recording_ || !faults_.empty(), std::memory_order_release); }
+void CallLog::refreshActive() {
+  active_.store(recording_ || !faults_.empty(), std::memory_order_release);
+}
 
-std::optional<int32_t> CallLog::injected(const std::string& operation, const std::string& interfaceName) {
+std::optional<int32_t> CallLog::injected(const std::string& operation,
+                                         const std::string& interfaceName) {
   std::lock_guard lock(mutex_);
   for (auto it = faults_.begin(); it != faults_.end(); ++it) {
     if (it->operation != operation) continue;

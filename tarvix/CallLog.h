@@ -34,9 +34,9 @@ class CallLog {
   void refreshActive();
 
   mutable std::mutex mutex_;
-  bool recording_ = false;          // guarded by mutex_
-  std::vector<CallRecord> calls_;   // guarded by mutex_
-  std::vector<FaultConfig> faults_; // guarded by mutex_
+  bool recording_ = false;           // guarded by mutex_
+  std::vector<CallRecord> calls_;    // guarded by mutex_
+  std::vector<FaultConfig> faults_;  // guarded by mutex_
   std::atomic<bool> active_{false};
 };
 

@@ -22,7 +22,8 @@ CanBus::CanBus(BusConfig config, int64_t epochNs, std::vector<std::vector<Logged
     owned_.push_back(std::make_unique<PeriodicSource>(f, epochNs));
   }
   for (size_t i = 0; i < replays.size() && i < this->config().replays.size(); ++i) {
-    owned_.push_back(std::make_unique<ReplaySource>(std::move(replays[i]), this->config().replays[i], epochNs));
+    owned_.push_back(
+        std::make_unique<ReplaySource>(std::move(replays[i]), this->config().replays[i], epochNs));
   }
   auto injected = std::make_unique<InjectedSource>();
   injected_ = injected.get();
@@ -87,7 +88,8 @@ int64_t CanBus::nextEventNs() const {
   return earliest;
 }
 
-bool CanBus::claim(const Session* owner, uint8_t address, uint64_t name, int32_t origin, int64_t nowNs) {
+bool CanBus::claim(const Session* owner, uint8_t address, uint64_t name, int32_t origin,
+                   int64_t nowNs) {
   release(owner);
   const auto& held = config().claimedAddresses;
   if (std::find(held.begin(), held.end(), address) != held.end()) return false;

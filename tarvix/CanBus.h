@@ -40,10 +40,10 @@ class CanBus final : public Bus {
   int64_t durationNs(const SimFrame& frame) const;
 
   std::vector<std::unique_ptr<CanSource>> owned_;  // guarded by mutex()
-  std::vector<CanSource*> sources_;                 // guarded by mutex(); owned_ and output sessions
-  InjectedSource* injected_ = nullptr;              // one of owned_
-  std::vector<Claim> claims_;                       // guarded by mutex()
-  int64_t freeAtNs_;                                // guarded by mutex(): end of the last frame
+  std::vector<CanSource*> sources_;                // guarded by mutex(); owned_ and output sessions
+  InjectedSource* injected_ = nullptr;             // one of owned_
+  std::vector<Claim> claims_;                      // guarded by mutex()
+  int64_t freeAtNs_;                               // guarded by mutex(): end of the last frame
 };
 
 }  // namespace tarvix

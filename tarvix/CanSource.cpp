@@ -19,7 +19,8 @@ uint64_t ArbitrationKey(const SimFrame& f) {
   if (f.identifier & driver::kExtendedIdFlag) {
     const uint64_t id = f.identifier & driver::kExtendedIdMask;
     // base identifier, SRR (1), IDE (1), extension, RTR
-    key = ((id >> 18) << 21) | (1ULL << 20) | (1ULL << 19) | ((id & 0x3FFFF) << 1) | (remote ? 1 : 0);
+    key =
+        ((id >> 18) << 21) | (1ULL << 20) | (1ULL << 19) | ((id & 0x3FFFF) << 1) | (remote ? 1 : 0);
   } else {
     // base identifier, RTR, IDE (0)
     key = (static_cast<uint64_t>(f.identifier & driver::kStandardIdMask) << 21) |
@@ -43,7 +44,8 @@ void PeriodicSource::build() {
   f.flags = 0;
   f.info = 0;
   f.origin = -1;
-  if (config_.type != driver::kFrameCanRemote) config_.payload.fill(f.payload.data(), f.length, counter_);
+  if (config_.type != driver::kFrameCanRemote)
+    config_.payload.fill(f.payload.data(), f.length, counter_);
   pending_.key = ArbitrationKey(f);
 }
 
@@ -67,7 +69,8 @@ void PeriodicSource::skipTo(int64_t nowNs) {
   build();
 }
 
-ReplaySource::ReplaySource(std::vector<LoggedFrame> frames, const ReplayConfig& config, int64_t epochNs)
+ReplaySource::ReplaySource(std::vector<LoggedFrame> frames, const ReplayConfig& config,
+                           int64_t epochNs)
     : frames_(std::move(frames)), loop_(config.loop), startNs_(epochNs + MsToNs(config.offsetMs)) {
   done_ = frames_.empty();
   if (done_) return;

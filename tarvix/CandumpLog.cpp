@@ -158,7 +158,8 @@ std::string FormatCandumpLine(const SimFrame& f, const std::string& interfaceNam
   uint32_t micros = 0;
   UnixTimeOf(TimestampAt(f.endNs), seconds, micros);
   char head[64];
-  std::snprintf(head, sizeof head, "(%010llu.%06u) ", static_cast<unsigned long long>(seconds), micros);
+  std::snprintf(head, sizeof head, "(%010llu.%06u) ", static_cast<unsigned long long>(seconds),
+                micros);
   std::string line = head + interfaceName + " ";
   char id[16];
   if (f.type == driver::kFrameCanBusError) {

@@ -19,8 +19,8 @@ struct LoggedFrame {
 
 // Line format: "(SECONDS.MICROS) IFACE ID#DATA", where ID is 3 hex digits (standard), 8 hex digits
 // (extended; with bit 29 set: an error frame), DATA is hex bytes; "ID#R" or "ID#Rn" a remote frame
-// with length n; "ID##F" + DATA a CAN FD frame whose flags nibble F has bit 0 for bit-rate switching.
-// Anything after the frame token is ignored. Returns false for a malformed line.
+// with length n; "ID##F" + DATA a CAN FD frame whose flags nibble F has bit 0 for bit-rate
+// switching. Anything after the frame token is ignored. Returns false for a malformed line.
 bool ParseCandumpLine(std::string_view line, LoggedFrame& out);
 
 // Reads a whole log; blank lines are skipped, the first malformed line fails with its number.

@@ -20,7 +20,9 @@ struct ConfigError {
   std::string text;
 };
 
-[[noreturn]] void Fail(const std::string& where, const std::string& what) { throw ConfigError{where + ": " + what}; }
+[[noreturn]] void Fail(const std::string& where, const std::string& what) {
+  throw ConfigError{where + ": " + what};
+}
 
 const json* Member(const json& j, const char* key) {
   auto it = j.find(key);
@@ -48,7 +50,8 @@ uint64_t Unsigned(const json& v, const std::string& where, uint64_t max) {
   return value;
 }
 
-uint64_t UnsignedOr(const json& j, const char* key, const std::string& where, uint64_t max, uint64_t fallback) {
+uint64_t UnsignedOr(const json& j, const char* key, const std::string& where, uint64_t max,
+                    uint64_t fallback) {
   const json* v = Member(j, key);
   return v ? Unsigned(*v, where + "." + key, max) : fallback;
 }
@@ -56,7 +59,8 @@ uint64_t UnsignedOr(const json& j, const char* key, const std::string& where, ui
 double NumberOr(const json& j, const char* key, const std::string& where, double fallback) {
   const json* v = Member(j, key);
   if (v == nullptr) return fallback;
-  if (!v->is_number() || v->get<double>() < 0 || v->get<double>() > 1e9) Fail(where + "." + key, "expected a number >= 0");
+  if (!v->is_number() || v->get<double>() < 0 || v->get<double>() > 1e9)
+    Fail(where + "." + key, "expected a number >= 0");
   return v->get<double>();
 }
 
@@ -97,16 +101,20 @@ std::string Resolve(const std::string& base, const std::string& path) {
 PayloadPattern Pattern(const json& j, const std::string& where) {
   PayloadPattern p;
   std::string error;
-  if (!PayloadPattern::Parse(TextOr(j, "payload", where, ""), p, error)) Fail(where + ".payload", error);
+  if (!PayloadPattern::Parse(TextOr(j, "payload", where, ""), p, error))
+    Fail(where + ".payload", error);
   return p;
 }
 
 uint8_t FrameKind(const std::string& kind, const std::string& where) {
-  static const std::map<std::string, uint8_t> kKinds = {
-      {"data", driver::kFrameCanData}, {"remote", driver::kFrameCanRemote}, {"error", driver::kFrameCanBusError},
-      {"fd", driver::kFrameCanFdData}, {"fd_brs", driver::kFrameCanFdBrsData}};
+  static const std::map<std::string, uint8_t> kKinds = {{"data", driver::kFrameCanData},
+                                                        {"remote", driver::kFrameCanRemote},
+                                                        {"error", driver::kFrameCanBusError},
+                                                        {"fd", driver::kFrameCanFdData},
+                                                        {"fd_brs", driver::kFrameCanFdBrsData}};
   auto it = kKinds.find(kind);
-  if (it == kKinds.end()) Fail(where + ".kind", "\"" + kind + "\" is not one of data, remote, error, fd, fd_brs");
+  if (it == kKinds.end())
+    Fail(where + ".kind", "\"" + kind + "\" is not one of data, remote, error, fd, fd_brs");
   return it->second;
 }
 
@@ -114,11 +122,13 @@ PeriodicFrame Traffic(const json& j, const std::string& where) {
   if (!j.is_object()) Fail(where, "expected an object");
   PeriodicFrame f;
   f.extended = BoolOr(j, "extended", where, false);
-  f.identifier = static_cast<uint32_t>(UnsignedOr(j, "id", where, f.extended ? driver::kExtendedIdMask : driver::kStandardIdMask, 0));
+  f.identifier = static_cast<uint32_t>(UnsignedOr(
+      j, "id", where, f.extended ? driver::kExtendedIdMask : driver::kStandardIdMask, 0));
   f.type = FrameKind(TextOr(j, "kind", where, "data"), where);
   const bool fd = f.type == driver::kFrameCanFdData || f.type == driver::kFrameCanFdBrsData;
   const bool noData = f.type == driver::kFrameCanBusError || f.type == driver::kFrameCanRemote;
-  f.length = static_cast<uint32_t>(UnsignedOr(j, "length", where, fd ? driver::kMaxCanFdPayload : 8, noData ? 0 : 8));
+  f.length = static_cast<uint32_t>(
+      UnsignedOr(j, "length", where, fd ? driver::kMaxCanFdPayload : 8, noData ? 0 : 8));
   if (fd) f.length = CanFdLength(f.length);
   f.periodMs = NumberOr(j, "periodMs", where, 100);
   f.offsetMs = NumberOr(j, "offsetMs", where, 0);
@@ -147,10 +157,13 @@ LinSlot Lin(const json& j, const std::string& where) {
 }
 
 NullCycles Nulls(const std::string& text, const std::string& where) {
-  static const std::map<std::string, NullCycles> kRules = {
-      {"none", NullCycles::None}, {"odd", NullCycles::Odd}, {"even", NullCycles::Even}, {"all", NullCycles::All}};
+  static const std::map<std::string, NullCycles> kRules = {{"none", NullCycles::None},
+                                                           {"odd", NullCycles::Odd},
+                                                           {"even", NullCycles::Even},
+                                                           {"all", NullCycles::All}};
   auto it = kRules.find(text);
-  if (it == kRules.end()) Fail(where + ".nullFrames", "\"" + text + "\" is not one of none, odd, even, all");
+  if (it == kRules.end())
+    Fail(where + ".nullFrames", "\"" + text + "\" is not one of none, odd, even, all");
   return it->second;
 }
 
@@ -160,7 +173,8 @@ FlexRaySlot Slot(const json& j, const std::string& where) {
   s.slot = static_cast<uint16_t>(UnsignedOr(j, "slot", where, 2047, 1));
   if (s.slot == 0) Fail(where + ".slot", "slots count from 1");
   const std::string channels = TextOr(j, "channels", where, "A");
-  if (channels != "A" && channels != "B" && channels != "AB") Fail(where + ".channels", "expected A, B or AB");
+  if (channels != "A" && channels != "B" && channels != "AB")
+    Fail(where + ".channels", "expected A, B or AB");
   s.channelA = channels.find('A') != std::string::npos;
   s.channelB = channels.find('B') != std::string::npos;
   s.startup = BoolOr(j, "startup", where, false);
@@ -184,39 +198,53 @@ BusConfig Bus(const json& j, const std::string& where, const std::string& base) 
   BusConfig b;
   b.name = RequiredText(j, "name", where);
   b.protocol = Protocol(TextOr(j, "protocol", where, "CAN"), where);
-  const uint64_t defaultRate = b.protocol == BusProtocol::Lin ? 19200 : b.protocol == BusProtocol::FlexRay ? 10000000 : 500000;
+  const uint64_t defaultRate = b.protocol == BusProtocol::Lin       ? 19200
+                               : b.protocol == BusProtocol::FlexRay ? 10000000
+                                                                    : 500000;
   b.bitRate = UnsignedOr(j, "bitRate", where, 12000000, defaultRate);
   if (b.bitRate == 0) Fail(where + ".bitRate", "must not be 0");
   b.dataBitRate = UnsignedOr(j, "dataBitRate", where, 12000000, 0);
-  b.canIoMode = static_cast<uint32_t>(UnsignedOr(j, "canIoMode", where, 2, b.dataBitRate ? driver::kCanIoModeFdBrs : 0));
+  b.canIoMode = static_cast<uint32_t>(
+      UnsignedOr(j, "canIoMode", where, 2, b.dataBitRate ? driver::kCanIoModeFdBrs : 0));
   const std::string capture = TextOr(j, "capture", where, "");
   b.capture = capture.empty() ? "" : Resolve(base, capture);
-  for (size_t i = 0; const json& t : Array(j, "traffic", where)) b.traffic.push_back(Traffic(t, where + ".traffic[" + std::to_string(i++) + "]"));
-  for (size_t i = 0; const json& r : Array(j, "replay", where)) b.replays.push_back(Replay(r, where + ".replay[" + std::to_string(i++) + "]", base));
+  for (size_t i = 0; const json& t : Array(j, "traffic", where))
+    b.traffic.push_back(Traffic(t, where + ".traffic[" + std::to_string(i++) + "]"));
+  for (size_t i = 0; const json& r : Array(j, "replay", where))
+    b.replays.push_back(Replay(r, where + ".replay[" + std::to_string(i++) + "]", base));
   for (size_t i = 0; const json& a : Array(j, "claimedAddresses", where)) {
-    b.claimedAddresses.push_back(static_cast<uint8_t>(Unsigned(a, where + ".claimedAddresses[" + std::to_string(i++) + "]", 0xFD)));
+    b.claimedAddresses.push_back(static_cast<uint8_t>(
+        Unsigned(a, where + ".claimedAddresses[" + std::to_string(i++) + "]", 0xFD)));
   }
   b.linSlotMs = NumberOr(j, "slotMs", where, 10);
-  for (size_t i = 0; const json& s : Array(j, "schedule", where)) b.linSchedule.push_back(Lin(s, where + ".schedule[" + std::to_string(i++) + "]"));
+  for (size_t i = 0; const json& s : Array(j, "schedule", where))
+    b.linSchedule.push_back(Lin(s, where + ".schedule[" + std::to_string(i++) + "]"));
   b.flexRayCycleMs = NumberOr(j, "cycleMs", where, 5);
   b.flexRaySlotUs = NumberOr(j, "slotUs", where, 50);
-  for (size_t i = 0; const json& s : Array(j, "slots", where)) b.flexRaySlots.push_back(Slot(s, where + ".slots[" + std::to_string(i++) + "]"));
-  if ((b.protocol == BusProtocol::Lin && b.linSlotMs <= 0) || (b.protocol == BusProtocol::FlexRay && (b.flexRayCycleMs <= 0 || b.flexRaySlotUs <= 0))) {
+  for (size_t i = 0; const json& s : Array(j, "slots", where))
+    b.flexRaySlots.push_back(Slot(s, where + ".slots[" + std::to_string(i++) + "]"));
+  if ((b.protocol == BusProtocol::Lin && b.linSlotMs <= 0) ||
+      (b.protocol == BusProtocol::FlexRay && (b.flexRayCycleMs <= 0 || b.flexRaySlotUs <= 0))) {
     Fail(where, "slot and cycle times must be above 0");
   }
-  if (b.protocol != BusProtocol::Can && (!b.traffic.empty() || !b.replays.empty() || !b.capture.empty())) {
+  if (b.protocol != BusProtocol::Can &&
+      (!b.traffic.empty() || !b.replays.empty() || !b.capture.empty())) {
     Fail(where, "traffic, replay and capture need a CAN bus");
   }
   return b;
 }
 
-uint32_t InterfaceProtocol(const std::string& busName, const std::vector<BusConfig>& buses, const std::string& where) {
+uint32_t InterfaceProtocol(const std::string& busName, const std::vector<BusConfig>& buses,
+                           const std::string& where) {
   for (const BusConfig& b : buses) {
     if (b.name != busName) continue;
     switch (b.protocol) {
-      case BusProtocol::Lin: return driver::kProtocolLin;
-      case BusProtocol::FlexRay: return driver::kProtocolFlexRay;
-      default: return driver::kProtocolCan;
+      case BusProtocol::Lin:
+        return driver::kProtocolLin;
+      case BusProtocol::FlexRay:
+        return driver::kProtocolFlexRay;
+      default:
+        return driver::kProtocolCan;
     }
   }
   Fail(where + ".bus", "unknown bus \"" + busName + "\"");
@@ -231,7 +259,8 @@ DeviceConfig Device(const json& j, const std::string& where, const std::vector<B
     if (!i.is_object()) Fail(w, "expected an object");
     InterfaceConfig c;
     c.name = RequiredText(i, "name", w);
-    if (c.name.size() > 15 || c.name.find('@') != std::string::npos) Fail(w + ".name", "at most 15 characters, no '@'");
+    if (c.name.size() > 15 || c.name.find('@') != std::string::npos)
+      Fail(w + ".name", "at most 15 characters, no '@'");
     c.bus = RequiredText(i, "bus", w);
     c.protocol = InterfaceProtocol(c.bus, buses, w);
     c.port = static_cast<uint32_t>(UnsignedOr(i, "port", w, 0xFFFFFFFF, n));
@@ -254,7 +283,8 @@ FaultConfig Fault(const json& j, const std::string& where) {
     if (status->get<int64_t>() < INT32_MIN) Fail(where + ".status", "below the 32-bit range");
     f.status = static_cast<int32_t>(status->get<int64_t>());
   } else {
-    f.status = static_cast<int32_t>(static_cast<uint32_t>(Unsigned(*status, where + ".status", 0xFFFFFFFF)));
+    f.status = static_cast<int32_t>(
+        static_cast<uint32_t>(Unsigned(*status, where + ".status", 0xFFFFFFFF)));
   }
   f.always = BoolOr(j, "always", where, false);
   return f;
@@ -277,24 +307,31 @@ void Parse(const json& root, const std::string& base, HardwareConfig& out) {
   HardwareConfig defaults = DefaultHardware();
   out = HardwareConfig{};
   if (const json* v = Member(root, "versions")) out.versions = Versions(*v);
-  out.receiveQueueFrames = static_cast<uint32_t>(UnsignedOr(root, "receiveQueueFrames", "configuration", 1u << 22, out.receiveQueueFrames));
-  out.transmitQueueFrames = static_cast<uint32_t>(UnsignedOr(root, "transmitQueueFrames", "configuration", 1u << 20, out.transmitQueueFrames));
-  if (out.receiveQueueFrames == 0 || out.transmitQueueFrames == 0) Fail("configuration", "queue sizes must be at least 1");
+  out.receiveQueueFrames = static_cast<uint32_t>(
+      UnsignedOr(root, "receiveQueueFrames", "configuration", 1u << 22, out.receiveQueueFrames));
+  out.transmitQueueFrames = static_cast<uint32_t>(
+      UnsignedOr(root, "transmitQueueFrames", "configuration", 1u << 20, out.transmitQueueFrames));
+  if (out.receiveQueueFrames == 0 || out.transmitQueueFrames == 0)
+    Fail("configuration", "queue sizes must be at least 1");
   // Without "buses" and "devices" the default hardware stands.
   const bool own = Member(root, "buses") || Member(root, "devices");
   if (!own) {
     out.buses = defaults.buses;
     out.devices = defaults.devices;
   }
-  for (size_t i = 0; const json& b : Array(root, "buses", "configuration")) out.buses.push_back(Bus(b, "buses[" + std::to_string(i++) + "]", base));
-  for (size_t i = 0; const json& d : Array(root, "devices", "configuration")) out.devices.push_back(Device(d, "devices[" + std::to_string(i++) + "]", out.buses));
+  for (size_t i = 0; const json& b : Array(root, "buses", "configuration"))
+    out.buses.push_back(Bus(b, "buses[" + std::to_string(i++) + "]", base));
+  for (size_t i = 0; const json& d : Array(root, "devices", "configuration"))
+    out.devices.push_back(Device(d, "devices[" + std::to_string(i++) + "]", out.buses));
   if (out.devices.size() > 64) Fail("devices", "at most 64 devices");
-  for (size_t i = 0; const json& f : Array(root, "faults", "configuration")) out.faults.push_back(Fault(f, "faults[" + std::to_string(i++) + "]"));
+  for (size_t i = 0; const json& f : Array(root, "faults", "configuration"))
+    out.faults.push_back(Fault(f, "faults[" + std::to_string(i++) + "]"));
 }
 
 }  // namespace
 
-bool ParseHardwareConfig(std::string_view text, const std::string& baseDirectory, HardwareConfig& out, std::string& error) {
+bool ParseHardwareConfig(std::string_view text, const std::string& baseDirectory,
+                         HardwareConfig& out, std::string& error) {
   try {
     const json root = json::parse(text.begin(), text.end());
     Parse(root, baseDirectory, out);

@@ -25,10 +25,22 @@ struct Builtin {
 };
 
 const Builtin kBuiltins[] = {
-    {driver::kDatabaseCan, false, false, {driver::kProtocolCan, 500000, 0, driver::kCanIoModeClassic, false}},
-    {driver::kDatabaseCanFd, false, false, {driver::kProtocolCan, 500000, 2000000, driver::kCanIoModeFd, false}},
-    {driver::kDatabaseCanFdBrs, false, false, {driver::kProtocolCan, 500000, 2000000, driver::kCanIoModeFdBrs, false}},
-    {driver::kDatabaseCanJ1939, false, false, {driver::kProtocolCan, 250000, 0, driver::kCanIoModeClassic, true}},
+    {driver::kDatabaseCan,
+     false,
+     false,
+     {driver::kProtocolCan, 500000, 0, driver::kCanIoModeClassic, false}},
+    {driver::kDatabaseCanFd,
+     false,
+     false,
+     {driver::kProtocolCan, 500000, 2000000, driver::kCanIoModeFd, false}},
+    {driver::kDatabaseCanFdBrs,
+     false,
+     false,
+     {driver::kProtocolCan, 500000, 2000000, driver::kCanIoModeFdBrs, false}},
+    {driver::kDatabaseCanJ1939,
+     false,
+     false,
+     {driver::kProtocolCan, 250000, 0, driver::kCanIoModeClassic, true}},
     {driver::kDatabaseMemory, false, true, {}},
     {driver::kDatabaseSubordinate, true, true, {}},
     {driver::kDatabaseSubordinateJ1939, true, true, {driver::kProtocolCan, 0, 0, 0, true}},
@@ -86,11 +98,13 @@ int32_t DatabaseStore::open(const char* name, uint32_t& ref) {
   return driver::kSuccess;
 }
 
-int32_t DatabaseStore::createObject(uint32_t parent, uint32_t objectClass, const char* name, uint32_t& ref) {
+int32_t DatabaseStore::createObject(uint32_t parent, uint32_t objectClass, const char* name,
+                                    uint32_t& ref) {
   if (!ValidName(name)) return driver::kInvalidName;
   if (objectClass == driver::kClassCluster) {
     auto db = databases_.find(parent);
-    if (db == databases_.end()) return clusters_.count(parent) ? driver::kWrongObjectKind : driver::kInvalidReference;
+    if (db == databases_.end())
+      return clusters_.count(parent) ? driver::kWrongObjectKind : driver::kInvalidReference;
     for (uint32_t c : db->second.clusters) {
       if (clusters_[c].name == name) return ref = c, driver::kSuccess;  // the existing cluster
     }
@@ -101,7 +115,8 @@ int32_t DatabaseStore::createObject(uint32_t parent, uint32_t objectClass, const
   }
   if (objectClass == driver::kClassFrame) {
     auto cluster = clusters_.find(parent);
-    if (cluster == clusters_.end()) return databases_.count(parent) ? driver::kWrongObjectKind : driver::kInvalidReference;
+    if (cluster == clusters_.end())
+      return databases_.count(parent) ? driver::kWrongObjectKind : driver::kInvalidReference;
     for (const auto& [r, n] : cluster->second.frames) {
       if (n == name) return ref = r, driver::kSuccess;  // the existing frame
     }
@@ -117,12 +132,15 @@ int32_t DatabaseStore::createObject(uint32_t parent, uint32_t objectClass, const
 
 int32_t DatabaseStore::setProperty(uint32_t ref, uint32_t id, uint32_t size, const void* value) {
   if (value == nullptr) return driver::kBufferMissing;
-  if (auto c = clusters_.find(ref); c != clusters_.end()) return setClusterProperty(c->second, id, size, value);
-  if (auto f = frames_.find(ref); f != frames_.end()) return setFrameProperty(f->second, id, size, value);
+  if (auto c = clusters_.find(ref); c != clusters_.end())
+    return setClusterProperty(c->second, id, size, value);
+  if (auto f = frames_.find(ref); f != frames_.end())
+    return setFrameProperty(f->second, id, size, value);
   return databases_.count(ref) ? driver::kUnknownProperty : driver::kInvalidReference;
 }
 
-int32_t DatabaseStore::setClusterProperty(Cluster& c, uint32_t id, uint32_t size, const void* value) {
+int32_t DatabaseStore::setClusterProperty(Cluster& c, uint32_t id, uint32_t size,
+                                          const void* value) {
   ClusterSettings& s = c.settings;
   switch (id) {
     case driver::kPropClusterApplicationProtocol: {
@@ -183,7 +201,8 @@ int32_t DatabaseStore::setFrameProperty(Frame& f, uint32_t id, uint32_t size, co
     }
     case driver::kPropFrameCanIoMode:
       if (!expect(4)) return driver::kWrongPropertySize;
-      if (Load<uint32_t>(value) > driver::kFrameCanIoModeFdBrs) return driver::kInvalidPropertyValue;
+      if (Load<uint32_t>(value) > driver::kFrameCanIoModeFdBrs)
+        return driver::kInvalidPropertyValue;
       d.canIoMode = Load<uint32_t>(value);
       f.ioModeSet = true;
       return driver::kSuccess;

@@ -31,8 +31,8 @@ class DatabaseStore {
   void clear();
 
   // Looks up a session's database, cluster and frame list ("A,B" names frames of the cluster).
-  int32_t resolve(const std::string& database, const std::string& cluster, const std::string& frameList,
-                  ResolvedDatabase& out) const;
+  int32_t resolve(const std::string& database, const std::string& cluster,
+                  const std::string& frameList, ResolvedDatabase& out) const;
   bool owns(uint32_t ref) const;
 
  private:
@@ -44,7 +44,8 @@ class DatabaseStore {
     std::string name;
     uint32_t database;
     ClusterSettings settings;
-    std::vector<std::pair<uint32_t, std::string>> frames;  // frame refs and names, in creation order
+    std::vector<std::pair<uint32_t, std::string>>
+        frames;  // frame refs and names, in creation order
   };
   struct Database {
     std::string name;
@@ -53,8 +54,8 @@ class DatabaseStore {
   };
   int32_t setClusterProperty(Cluster& c, uint32_t id, uint32_t size, const void* value);
   int32_t setFrameProperty(Frame& f, uint32_t id, uint32_t size, const void* value);
-  int32_t resolveMemory(const Database& db, const std::string& cluster, const std::string& frameList,
-                        ResolvedDatabase& out) const;
+  int32_t resolveMemory(const Database& db, const std::string& cluster,
+                        const std::string& frameList, ResolvedDatabase& out) const;
   uint32_t nextRef(uint32_t kind);
 
   std::map<uint32_t, Database> databases_;

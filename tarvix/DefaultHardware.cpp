@@ -1,8 +1,7 @@
 // The default simulated hardware: three devices, five buses and their traffic.
-#include "tarvix/HardwareConfig.h"
-
 #include "driver/FrameTypes.h"
 #include "driver/Properties.h"
+#include "tarvix/HardwareConfig.h"
 
 namespace tarvix {
 namespace {
@@ -24,7 +23,8 @@ BusConfig BodyBus() {
   b.name = "body";
   b.bitRate = 500000;
   b.traffic = {
-      Can(0x100, false, driver::kFrameCanData, 8, 10, PayloadPattern::CounterThen({1, 2, 3, 4, 5, 6, 7})),
+      Can(0x100, false, driver::kFrameCanData, 8, 10,
+          PayloadPattern::CounterThen({1, 2, 3, 4, 5, 6, 7})),
       Can(0x1A0, false, driver::kFrameCanData, 3, 50, PayloadPattern::Bytes({0xAA, 0xBB, 0xCC})),
       Can(0x321, false, driver::kFrameCanRemote, 0, 500, {}),
       Can(0x18FEF100, true, driver::kFrameCanData, 8, 100,
@@ -92,7 +92,8 @@ BusConfig FlexRayBus() {
   b.flexRayCycleMs = 5;
   FlexRaySlot key = Slot(1, true, true, 16, PayloadPattern::Ramp(0x10));
   key.startup = key.sync = true;
-  FlexRaySlot odd = Slot(3, true, false, 8, PayloadPattern::Bytes({0x30, 0x31, 0x32, 0x33, 0x34, 0x35, 0x36, 0x37}));
+  FlexRaySlot odd = Slot(3, true, false, 8,
+                         PayloadPattern::Bytes({0x30, 0x31, 0x32, 0x33, 0x34, 0x35, 0x36, 0x37}));
   odd.nullCycles = NullCycles::Odd;
   b.flexRaySlots = {key, Slot(2, true, false, 16, PayloadPattern::CounterThen({})), odd,
                     Slot(40, false, true, 32, PayloadPattern::Ramp(0x40))};
@@ -112,9 +113,11 @@ HardwareConfig DefaultHardware() {
   h.buses = {BodyBus(), TestBus(), FdBus(), LinBus(), FlexRayBus()};
   h.devices = {
       {"SIM-CAN",
-       {Interface("CAN1", "body", 1, kProtocolCan, 0), Interface("CAN2", "body", 2, kProtocolCan, 0),
-        Interface("CAN3", "test", 3, kProtocolCan, 1), Interface("CAN4", "test", 4, kProtocolCan, 1),
-        Interface("CAN5", "fd", 5, kProtocolCan, 1), Interface("CAN6", "fd", 6, kProtocolCan, 1)}},
+       {Interface("CAN1", "body", 1, kProtocolCan, 0),
+        Interface("CAN2", "body", 2, kProtocolCan, 0),
+        Interface("CAN3", "test", 3, kProtocolCan, 1),
+        Interface("CAN4", "test", 4, kProtocolCan, 1), Interface("CAN5", "fd", 5, kProtocolCan, 1),
+        Interface("CAN6", "fd", 6, kProtocolCan, 1)}},
       {"SIM-LIN",
        {Interface("LIN1", "lin", 1, driver::kProtocolLin, 0),
         Interface("LIN2", "lin", 2, driver::kProtocolLin, 0)}},

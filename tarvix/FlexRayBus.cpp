@@ -13,10 +13,14 @@ namespace {
 
 bool IsNullCycle(NullCycles rule, uint64_t cycle) {
   switch (rule) {
-    case NullCycles::None: return false;
-    case NullCycles::Odd: return cycle % 2 == 1;
-    case NullCycles::Even: return cycle % 2 == 0;
-    case NullCycles::All: return true;
+    case NullCycles::None:
+      return false;
+    case NullCycles::Odd:
+      return cycle % 2 == 1;
+    case NullCycles::Even:
+      return cycle % 2 == 0;
+    case NullCycles::All:
+      return true;
   }
   return false;
 }
@@ -52,7 +56,8 @@ void FlexRayBus::normalise(Position& p) const {
 
 int64_t FlexRayBus::endNs(const Position& p) const {
   const FlexRaySlot& s = config().flexRaySlots[p.entry];
-  const int64_t start = epochNs() + static_cast<int64_t>(p.cycle) * cycleNs_ + (s.slot - 1) * slotNs_;
+  const int64_t start =
+      epochNs() + static_cast<int64_t>(p.cycle) * cycleNs_ + (s.slot - 1) * slotNs_;
   return start + BitsToNs(FlexRayFrameBits(s.length), config().bitRate);
 }
 
@@ -64,7 +69,8 @@ SimFrame FlexRayBus::frameAt(const Position& p) const {
   f.info = static_cast<uint8_t>(p.cycle % kCyclesPerRound);
   f.length = static_cast<uint8_t>(std::min<uint32_t>(s.length, driver::kMaxCanFdPayload));
   f.flags = (p.channel == 0 ? driver::kFlagFlexRayChannelA : driver::kFlagFlexRayChannelB) |
-            (s.startup ? driver::kFlagFlexRayStartup : 0) | (s.sync ? driver::kFlagFlexRaySync : 0) |
+            (s.startup ? driver::kFlagFlexRayStartup : 0) |
+            (s.sync ? driver::kFlagFlexRaySync : 0) |
             (s.preamble ? driver::kFlagFlexRayPreamble : 0);
   if (IsNullCycle(s.nullCycles, p.cycle)) {
     f.type = driver::kFrameFlexRayNull;  // a null frame carries its slot's length, all zero
@@ -100,7 +106,8 @@ uint64_t FlexRayBus::cyclesAt(int64_t nowNs) const {
 }
 
 uint32_t FlexRayBus::syncSlots() const {
-  return static_cast<uint32_t>(std::count_if(config().flexRaySlots.begin(), config().flexRaySlots.end(),
+  return static_cast<uint32_t>(std::count_if(config().flexRaySlots.begin(),
+                                             config().flexRaySlots.end(),
                                              [](const FlexRaySlot& s) { return s.sync; }));
 }
 

@@ -93,8 +93,8 @@ BitLength FdBitLength(const SimFrame& f) {
   StuffCounter data;
   data.add(FdDlc(length), 5);  // ESI and DLC
   for (uint32_t i = 0; i < length; ++i) data.add(i < f.length ? f.payload[i] : 0, 8);
-  // Arbitration phase and the nominal-rate tail (CRC delimiter to interframe space); data phase with
-  // stuff count, CRC-17/21 and their fixed stuff bits.
+  // Arbitration phase and the nominal-rate tail (CRC delimiter to interframe space); data phase
+  // with stuff count, CRC-17/21 and their fixed stuff bits.
   const uint32_t a = (extended ? 41 : 22) + 12 + arbitration.stuffBits();
   const uint32_t crcBits = length > 16 ? 29 : 24;
   const uint32_t d = 8 * length + crcBits + data.stuffBits();
@@ -127,7 +127,8 @@ int64_t BitsToNs(uint64_t bits, uint64_t bitRate) {
 
 int64_t CanFrameNs(const SimFrame& f, uint64_t bitRate, uint64_t dataBitRate) {
   const BitLength b = CanBitLength(f);
-  return BitsToNs(b.nominalBits, bitRate) + BitsToNs(b.dataBits, dataBitRate ? dataBitRate : bitRate);
+  return BitsToNs(b.nominalBits, bitRate) +
+         BitsToNs(b.dataBits, dataBitRate ? dataBitRate : bitRate);
 }
 
 uint8_t LinProtectedId(uint8_t id) {

@@ -14,14 +14,15 @@ struct BitLength {
   uint32_t dataBits = 0;
 };
 
-// A CAN frame (classic, remote, FD, FD with bit-rate switching) or a bus-error frame. Stuff bits are
-// counted on the frame's real bit stream (classic: with its CRC-15).
+// A CAN frame (classic, remote, FD, FD with bit-rate switching) or a bus-error frame. Stuff bits
+// are counted on the frame's real bit stream (classic: with its CRC-15).
 BitLength CanBitLength(const SimFrame& f);
 
 // Time in ns that `bits` take at `bitRate` bit/s, rounded to the nearest ns.
 int64_t BitsToNs(uint64_t bits, uint64_t bitRate);
 
-// Bus time of a CAN frame; the data rate applies to the data phase of frames with bit-rate switching.
+// Bus time of a CAN frame; the data rate applies to the data phase of frames with bit-rate
+// switching.
 int64_t CanFrameNs(const SimFrame& f, uint64_t bitRate, uint64_t dataBitRate);
 
 // Smallest CAN FD payload length (0-8, 12, 16, 20, 24, 32, 48, 64) that holds `length` bytes.

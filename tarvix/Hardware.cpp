@@ -18,14 +18,18 @@ constexpr uint32_t kGenerationShift = 12;
 
 uint32_t ProtocolCode(BusProtocol p) {
   switch (p) {
-    case BusProtocol::Lin: return driver::kProtocolLin;
-    case BusProtocol::FlexRay: return driver::kProtocolFlexRay;
-    default: return driver::kProtocolCan;
+    case BusProtocol::Lin:
+      return driver::kProtocolLin;
+    case BusProtocol::FlexRay:
+      return driver::kProtocolFlexRay;
+    default:
+      return driver::kProtocolCan;
   }
 }
 
 std::shared_ptr<Bus> MakeBus(BusConfig config, int64_t epochNs, std::string& error) {
-  if (config.protocol == BusProtocol::Lin) return std::make_shared<LinBus>(std::move(config), epochNs);
+  if (config.protocol == BusProtocol::Lin)
+    return std::make_shared<LinBus>(std::move(config), epochNs);
   if (config.protocol == BusProtocol::FlexRay) {
     std::sort(config.flexRaySlots.begin(), config.flexRaySlots.end(),
               [](const FlexRaySlot& a, const FlexRaySlot& b) { return a.slot < b.slot; });
@@ -37,7 +41,8 @@ std::shared_ptr<Bus> MakeBus(BusConfig config, int64_t epochNs, std::string& err
     if (!ReadCandumpFile(r.file, all, error)) return nullptr;
     std::vector<LoggedFrame> chosen;
     for (LoggedFrame& f : all) {
-      if (r.logInterface.empty() || f.interfaceName == r.logInterface) chosen.push_back(std::move(f));
+      if (r.logInterface.empty() || f.interfaceName == r.logInterface)
+        chosen.push_back(std::move(f));
     }
     replays.push_back(std::move(chosen));
   }
@@ -46,7 +51,8 @@ std::shared_ptr<Bus> MakeBus(BusConfig config, int64_t epochNs, std::string& err
 
 }  // namespace
 
-std::shared_ptr<Hardware> Hardware::Build(const HardwareConfig& config, uint32_t generation, std::string& error) {
+std::shared_ptr<Hardware> Hardware::Build(const HardwareConfig& config, uint32_t generation,
+                                          std::string& error) {
   auto hw = std::shared_ptr<Hardware>(new Hardware());
   hw->config_ = config;
   if (!hw->buildBuses(generation, error) || !hw->buildDevices(generation, error)) return nullptr;
@@ -76,7 +82,8 @@ bool Hardware::buildBuses(uint32_t, std::string& error) {
 bool Hardware::buildDevices(uint32_t generation, std::string& error) {
   const uint32_t base = (generation & 0xFFF) << kGenerationShift;
   for (const DeviceConfig& d : config_.devices) {
-    SimDevice device{d.name, MakeRef(kRefDevice, base + static_cast<uint32_t>(devices_.size()) + 1), {}};
+    SimDevice device{
+        d.name, MakeRef(kRefDevice, base + static_cast<uint32_t>(devices_.size()) + 1), {}};
     for (const InterfaceConfig& i : d.interfaces) {
       const auto bus = std::find_if(buses_.begin(), buses_.end(),
                                     [&i](const auto& b) { return b->config().name == i.bus; });

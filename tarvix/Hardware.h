@@ -31,7 +31,8 @@ class Hardware {
   // Builds the hardware of a checked configuration; null with a message when it is inconsistent
   // (unknown bus, protocol mismatch, unreadable replay log, capture file that cannot be written).
   // `generation` keeps the references of successive hardware apart.
-  static std::shared_ptr<Hardware> Build(const HardwareConfig& config, uint32_t generation, std::string& error);
+  static std::shared_ptr<Hardware> Build(const HardwareConfig& config, uint32_t generation,
+                                         std::string& error);
   // No devices at all (a configuration that could not be used), with the given version values.
   static std::shared_ptr<Hardware> Empty(const VersionValues& versions);
 

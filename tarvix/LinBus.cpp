@@ -21,13 +21,16 @@ LinBus::LinBus(BusConfig config, int64_t epochNs)
     : Bus(std::move(config), epochNs),
       slotNs_(std::max<int64_t>(1, std::llround(this->config().linSlotMs * 1e6))) {}
 
-int64_t LinBus::slotStartNs(uint64_t k) const { return epochNs() + static_cast<int64_t>(k) * slotNs_; }
+int64_t LinBus::slotStartNs(uint64_t k) const {
+  return epochNs() + static_cast<int64_t>(k) * slotNs_;
+}
 
 int64_t LinBus::slotEndNs(uint64_t k) const {
   const auto& schedule = config().linSchedule;
   const LinSlot& s = schedule[k % schedule.size()];
   uint64_t bits = LinHeaderBits();
-  bits += s.response ? LinResponseBits(s.length) : LinResponseBits(s.length) * kResponseTimeoutTenths / 10;
+  bits += s.response ? LinResponseBits(s.length)
+                     : LinResponseBits(s.length) * kResponseTimeoutTenths / 10;
   return slotStartNs(k) + BitsToNs(bits, config().bitRate);
 }
 

@@ -15,7 +15,9 @@ inline constexpr uint32_t kRefFrame = 7;
 
 inline constexpr uint32_t kRefSerialMask = 0x00FFFFFF;
 
-constexpr uint32_t MakeRef(uint32_t kind, uint32_t serial) { return (kind << 24) | (serial & kRefSerialMask); }
+constexpr uint32_t MakeRef(uint32_t kind, uint32_t serial) {
+  return (kind << 24) | (serial & kRefSerialMask);
+}
 constexpr uint32_t RefKind(uint32_t ref) { return ref >> 24; }
 
 }  // namespace tarvix

@@ -32,7 +32,8 @@ void OutputQueue::write(const SimFrame& frame, const FrameDefinition& definition
   periodNs_ = cyclic ? std::max<int64_t>(1, std::llround(definition.cyclicRateS * 1e9)) : 0;
   // A cyclic frame keeps its rhythm when its value changes; the first write starts it, and
   // "cyclic and event" frames also go out at once on every write.
-  const bool keepSchedule = cyclic && due_ && definition.timingType != driver::kTimingCyclicAndEvent;
+  const bool keepSchedule =
+      cyclic && due_ && definition.timingType != driver::kTimingCyclicAndEvent;
   if (keepSchedule) p.dueNs = latest_.dueNs;
   latest_ = p;
   due_ = true;

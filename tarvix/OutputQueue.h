@@ -32,11 +32,11 @@ class OutputQueue final : public CanSource {
   const uint32_t mode_;
   const uint32_t capacity_;
   bool blocked_ = true;
-  std::deque<Pending> queue_;  // mode 10
-  Pending latest_;             // mode 11
-  bool due_ = false;           // mode 11: latest_ waits for the bus
-  bool sentSinceWrite_ = true; // mode 11
-  int64_t periodNs_ = 0;       // mode 11: cyclic repetition, 0 none
+  std::deque<Pending> queue_;   // mode 10
+  Pending latest_;              // mode 11
+  bool due_ = false;            // mode 11: latest_ waits for the bus
+  bool sentSinceWrite_ = true;  // mode 11
+  int64_t periodNs_ = 0;        // mode 11: cyclic repetition, 0 none
 };
 
 }  // namespace tarvix

@@ -11,10 +11,14 @@ bool ParseHexByte(std::string_view token, uint8_t& out) {
   unsigned value = 0;
   for (char c : token) {
     value <<= 4;
-    if (c >= '0' && c <= '9') value |= static_cast<unsigned>(c - '0');
-    else if (c >= 'a' && c <= 'f') value |= static_cast<unsigned>(c - 'a' + 10);
-    else if (c >= 'A' && c <= 'F') value |= static_cast<unsigned>(c - 'A' + 10);
-    else return false;
+    if (c >= '0' && c <= '9')
+      value |= static_cast<unsigned>(c - '0');
+    else if (c >= 'a' && c <= 'f')
+      value |= static_cast<unsigned>(c - 'a' + 10);
+    else if (c >= 'A' && c <= 'F')
+      value |= static_cast<unsigned>(c - 'A' + 10);
+    else
+      return false;
   }
   out = static_cast<uint8_t>(value);
   return true;
@@ -30,7 +34,8 @@ bool PayloadPattern::Parse(std::string_view text, PayloadPattern& out, std::stri
     uint8_t value = 0;
     if (token == "ctr") {
       out.items_.push_back({Kind::Counter, 0});
-    } else if (token.rfind("ramp:", 0) == 0 && ParseHexByte(std::string_view(token).substr(5), value)) {
+    } else if (token.rfind("ramp:", 0) == 0 &&
+               ParseHexByte(std::string_view(token).substr(5), value)) {
       out.items_.push_back({Kind::Ramp, value});
     } else if (ParseHexByte(token, value)) {
       out.items_.push_back({Kind::Literal, value});

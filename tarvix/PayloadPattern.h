@@ -10,8 +10,9 @@ namespace tarvix {
 
 // Text form: blank-separated tokens, one per byte from byte 0:
 //   "AA"        a hexadecimal byte
-//   "ctr"       the frame counter: rises by one with every frame of this traffic entry, wraps at 256
-//   "ramp:XX"   this and every following byte count up from XX (wrapping), to the end of the payload
+//   "ctr"       the frame counter: rises by one with every frame of this traffic entry, wraps at
+//   256 "ramp:XX"   this and every following byte count up from XX (wrapping), to the end of the
+//   payload
 // Bytes beyond the pattern are 0. Example: "ctr 01 02 03", "ramp:A0".
 class PayloadPattern {
  public:

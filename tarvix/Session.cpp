@@ -86,9 +86,12 @@ void Session::offer(const SimFrame& frame, const BusConfig& bus) {
   ++framesSeen_;
   lastFrameNs_ = frame.endNs;
   switch (setup_.cluster.protocol) {
-    case driver::kProtocolCan: return offerCan(frame, own, bus);
-    case driver::kProtocolLin: return offerLin(frame, own, bus);
-    default: return offerFlexRay(frame, bus);
+    case driver::kProtocolCan:
+      return offerCan(frame, own, bus);
+    case driver::kProtocolLin:
+      return offerLin(frame, own, bus);
+    default:
+      return offerFlexRay(frame, bus);
   }
 }
 
@@ -244,11 +247,13 @@ int32_t Session::parseRecords(const uint8_t* data, uint32_t size,
     if (h.length > (fd ? driver::kMaxCanFdPayload : 8u)) return driver::kInvalidFrame;
     SimFrame f;
     f.identifier = def->identifier | (def->extended ? driver::kExtendedIdFlag : 0);
-    const bool remote = h.type == driver::kFrameCanRemote || def->timingType == driver::kTimingCyclicRemote ||
+    const bool remote = h.type == driver::kFrameCanRemote ||
+                        def->timingType == driver::kTimingCyclicRemote ||
                         def->timingType == driver::kTimingEventRemote;
-    f.type = remote ? driver::kFrameCanRemote
+    f.type = remote                                           ? driver::kFrameCanRemote
              : def->canIoMode == driver::kFrameCanIoModeFdBrs ? driver::kFrameCanFdBrsData
-             : fd ? driver::kFrameCanFdData : driver::kFrameCanData;
+             : fd                                             ? driver::kFrameCanFdData
+                                                              : driver::kFrameCanData;
     f.length = h.length;
     if (!remote) std::memcpy(f.payload.data(), data + offset + driver::kRawHeaderSize, h.length);
     f.origin = setup_.interfaceIndex;
@@ -295,7 +300,8 @@ bool Session::conditionMet(uint32_t condition, int64_t nowNs) const {
 }
 
 int32_t Session::wait(uint32_t condition, double timeoutS) {
-  if (condition != driver::kWaitTransmitComplete && condition != driver::kWaitInterfaceCommunicating) {
+  if (condition != driver::kWaitTransmitComplete &&
+      condition != driver::kWaitInterfaceCommunicating) {
     return driver::kInvalidCondition;
   }
   if (condition == driver::kWaitTransmitComplete && !isOutput()) return driver::kWrongSessionMode;

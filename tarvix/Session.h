@@ -20,8 +20,8 @@ struct SessionSettings {
   uint32_t isoFdMode = 0;
   bool listenOnly = false;
   bool echo = false;
-  uint8_t busErrorFrames = 0;       // byte 0 of 0x02100015: bus-error frames in the stream
-  uint8_t busErrorListenOnly = 0;   // byte 1 of 0x02100015: kept, reported back
+  uint8_t busErrorFrames = 0;      // byte 0 of 0x02100015: bus-error frames in the stream
+  uint8_t busErrorListenOnly = 0;  // byte 1 of 0x02100015: kept, reported back
   bool linNoResponse = false;
   bool linChecksum = false;
   uint32_t flexRayTermination = 0;
@@ -71,7 +71,8 @@ class Session {
   void pushError(const SimFrame& cause, uint8_t type);
   void startLocked(int64_t nowNs);
   int32_t readLocked(uint8_t* buffer, uint32_t size, uint32_t& bytes);
-  int32_t parseRecords(const uint8_t* data, uint32_t size, std::vector<std::pair<SimFrame, const FrameDefinition*>>& out) const;
+  int32_t parseRecords(const uint8_t* data, uint32_t size,
+                       std::vector<std::pair<SimFrame, const FrameDefinition*>>& out) const;
   bool conditionMet(uint32_t condition, int64_t nowNs) const;
   void updateOutputBlock();
 

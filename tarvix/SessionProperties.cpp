@@ -48,7 +48,8 @@ struct Rule {
 
 bool ValidBaudRate(uint32_t protocol, uint64_t rate) {
   if (protocol == driver::kProtocolLin) return rate >= kMinLinRate && rate <= kMaxLinRate;
-  if (protocol == driver::kProtocolFlexRay) return rate == 10000000 || rate == 5000000 || rate == 2500000;
+  if (protocol == driver::kProtocolFlexRay)
+    return rate == 10000000 || rate == 5000000 || rate == 2500000;
   return rate >= kMinCanRate && rate <= kMaxCanRate;
 }
 
@@ -77,7 +78,8 @@ struct PropertyHandlers {
   static int32_t DataBaudRate(Session&, SessionSettings& st, const void* v) {
     const uint64_t rate = Load<uint64_t>(v);
     // 0 runs the data phase at the nominal rate.
-    if (rate != 0 && (rate < kMinCanRate || rate > kMaxCanDataRate)) return driver::kInvalidPropertyValue;
+    if (rate != 0 && (rate < kMinCanRate || rate > kMaxCanDataRate))
+      return driver::kInvalidPropertyValue;
     st.dataBaudRate = rate;
     return driver::kSuccess;
   }
@@ -94,7 +96,9 @@ const Rule kRules[] = {
      [](Session&, SessionSettings& s, const void* v) { return SetRange(s.termination, v, 1); },
      [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.termination); }},
     {driver::kPropTransceiverType, 4, kCan | kOutput, true,
-     [](Session&, SessionSettings& s, const void* v) { return SetRange(s.transceiver, v, kMaxTransceiverType); },
+     [](Session&, SessionSettings& s, const void* v) {
+       return SetRange(s.transceiver, v, kMaxTransceiverType);
+     },
      [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.transceiver); }},
     {driver::kPropIsoFdMode, 4, kCan | kOutput, true,
      [](Session&, SessionSettings& s, const void* v) { return SetRange(s.isoFdMode, v, 1); },
@@ -122,13 +126,17 @@ const Rule kRules[] = {
      [](Session&, SessionSettings& s, const void* v) { return SetBool(s.linChecksum, v); },
      [](const SessionSettings& s, void* v) { Store<uint8_t>(v, s.linChecksum); }},
     {driver::kPropFlexRayTermination, 4, kFr, true,
-     [](Session&, SessionSettings& s, const void* v) { return SetRange(s.flexRayTermination, v, 1); },
+     [](Session&, SessionSettings& s, const void* v) {
+       return SetRange(s.flexRayTermination, v, 1);
+     },
      [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.flexRayTermination); }},
     {driver::kPropFlexRayNullFrames, 1, kFr, false,
      [](Session&, SessionSettings& s, const void* v) { return SetBool(s.nullFrames, v); },
      [](const SessionSettings& s, void* v) { Store<uint8_t>(v, s.nullFrames); }},
     {driver::kPropKeySlot, 4, kFr, true,
-     [](Session&, SessionSettings& s, const void* v) { return SetRange(s.keySlot, v, kMaxKeySlot); },
+     [](Session&, SessionSettings& s, const void* v) {
+       return SetRange(s.keySlot, v, kMaxKeySlot);
+     },
      [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.keySlot); }},
     {driver::kPropJ1939NodeName, 8, kCan | kJ1939, false,
      [](Session&, SessionSettings& s, const void* v) {
@@ -137,7 +145,9 @@ const Rule kRules[] = {
      },
      [](const SessionSettings& s, void* v) { Store<uint64_t>(v, s.nodeName); }},
     {driver::kPropJ1939NodeAddress, 4, kCan | kJ1939, false,
-     [](Session&, SessionSettings& s, const void* v) { return SetRange(s.nodeAddress, v, driver::kJ1939NullAddress); },
+     [](Session&, SessionSettings& s, const void* v) {
+       return SetRange(s.nodeAddress, v, driver::kJ1939NullAddress);
+     },
      nullptr},  // read through the bus's claims (below)
     {driver::kPropCanIoMode, 4, kCan | kOutput, false, nullptr, nullptr},  // from the database
 };
@@ -155,7 +165,7 @@ bool AppliesTo(const Rule& r, const Session& s) {
   if (s.isOutput()) return (r.applies & kOutput) != 0;
   const uint8_t bit = setup.cluster.protocol == driver::kProtocolLin       ? kLin
                       : setup.cluster.protocol == driver::kProtocolFlexRay ? kFr
-                                                                            : kCan;
+                                                                           : kCan;
   return (r.applies & bit) != 0;
 }
 
@@ -169,7 +179,8 @@ int32_t Check(const Rule* r, const Session& s, uint32_t size, const void* value)
 
 }  // namespace
 
-int32_t SessionProperties::Set(Session& s, uint32_t id, uint32_t size, const void* value, int64_t nowNs) {
+int32_t SessionProperties::Set(Session& s, uint32_t id, uint32_t size, const void* value,
+                               int64_t nowNs) {
   const Rule* r = Find(id);
   if (const int32_t st = Check(r, s, size, value); st != driver::kSuccess) return st;
   if (r->set == nullptr) return driver::kPropertyReadOnly;

@@ -10,7 +10,8 @@ class Session;
 // Called by Session with the bus's mutex held.
 class SessionProperties {
  public:
-  static int32_t Set(Session& session, uint32_t id, uint32_t size, const void* value, int64_t nowNs);
+  static int32_t Set(Session& session, uint32_t id, uint32_t size, const void* value,
+                     int64_t nowNs);
   static int32_t Get(Session& session, uint32_t id, uint32_t size, void* value, int64_t nowNs);
 };
 

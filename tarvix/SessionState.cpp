@@ -40,8 +40,10 @@ class SessionStateWords {
  public:
   static uint32_t Can(const Session& s) {
     uint32_t comm = driver::kCanCommErrorActive;
-    if (!s.started_) comm = driver::kCanCommStopped;
-    else if (std::max(s.receiveErrors_, s.transmitErrors_) >= kErrorPassiveLimit) comm = driver::kCanCommErrorPassive;
+    if (!s.started_)
+      comm = driver::kCanCommStopped;
+    else if (std::max(s.receiveErrors_, s.transmitErrors_) >= kErrorPassiveLimit)
+      comm = driver::kCanCommErrorPassive;
     return comm | (s.lastError_ & 0xF) << 8 | (std::min(s.transmitErrors_, 255u) << 16) |
            (std::min(s.receiveErrors_, 255u) << 24);
   }
@@ -49,10 +51,13 @@ class SessionStateWords {
   static uint64_t Lin(const Session& s, int64_t nowNs) {
     const auto& bus = static_cast<const LinBus&>(*s.bus_);
     uint32_t comm = driver::kLinCommIdle;
-    if (s.framesSeen_ > 0) comm = nowNs - s.lastFrameNs_ > kLinInactiveNs ? driver::kLinCommInactive : driver::kLinCommActive;
-    const uint32_t word = (s.framesSeen_ > 0 ? 1u : 0u) | (comm << 2) | ((s.lastError_ & 0xF) << 4) |
-                          ((s.lastErrorId_ & 0xFF) << 8) | ((s.framesSeen_ & 0xFF) << 16) |
-                          ((bus.lastSlot() & 0x3F) << 24) | (s.started_ ? 0u : 1u << 31);
+    if (s.framesSeen_ > 0)
+      comm = nowNs - s.lastFrameNs_ > kLinInactiveNs ? driver::kLinCommInactive
+                                                     : driver::kLinCommActive;
+    const uint32_t word = (s.framesSeen_ > 0 ? 1u : 0u) | (comm << 2) |
+                          ((s.lastError_ & 0xF) << 4) | ((s.lastErrorId_ & 0xFF) << 8) |
+                          ((s.framesSeen_ & 0xFF) << 16) | ((bus.lastSlot() & 0x3F) << 24) |
+                          (s.started_ ? 0u : 1u << 31);
     return word;
   }
 
@@ -64,7 +69,8 @@ class SessionStateWords {
                               nowNs >= s.startedAtNs_ + 2 * bus.cycleNs();
       poc = integrated ? driver::kFlexRayStateNormalActive : driver::kFlexRayStateStartup;
     }
-    const uint32_t syncs = poc == driver::kFlexRayStateNormalActive ? std::min(bus.syncSlots(), 31u) : 0;
+    const uint32_t syncs =
+        poc == driver::kFlexRayStateNormalActive ? std::min(bus.syncSlots(), 31u) : 0;
     return poc | (syncs << 8);
   }
 
@@ -104,14 +110,26 @@ int32_t SessionState::Read(const Session& s, uint32_t stateId, uint32_t size, vo
   uint32_t words[6] = {};
   uint64_t lin = 0;
   switch (stateId) {
-    case driver::kStateCan: words[0] = SessionStateWords::Can(s); break;
-    case driver::kStateLin: lin = SessionStateWords::Lin(s, nowNs); break;
-    case driver::kStateFlexRay: words[0] = SessionStateWords::FlexRay(s, nowNs); break;
-    case driver::kStateFlexRayCounters: SessionStateWords::FlexRayCounters(s, nowNs, words); break;
-    default: words[0] = SessionStateWords::FlexRayChannels(s); break;
+    case driver::kStateCan:
+      words[0] = SessionStateWords::Can(s);
+      break;
+    case driver::kStateLin:
+      lin = SessionStateWords::Lin(s, nowNs);
+      break;
+    case driver::kStateFlexRay:
+      words[0] = SessionStateWords::FlexRay(s, nowNs);
+      break;
+    case driver::kStateFlexRayCounters:
+      SessionStateWords::FlexRayCounters(s, nowNs, words);
+      break;
+    default:
+      words[0] = SessionStateWords::FlexRayChannels(s);
+      break;
   }
-  if (stateId == driver::kStateLin) std::memcpy(state, &lin, sizeof lin);
-  else std::memcpy(state, words, size);
+  if (stateId == driver::kStateLin)
+    std::memcpy(state, &lin, sizeof lin);
+  else
+    std::memcpy(state, words, size);
   return driver::kSuccess;
 }
 

@@ -1,4 +1,5 @@
-// Virtual time of the simulated hardware: the monotonic clock, and its mapping to driver time stamps.
+// Virtual time of the simulated hardware: the monotonic clock, and its mapping to driver time
+// stamps.
 #pragma once
 
 #include <cstdint>

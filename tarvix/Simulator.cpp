@@ -105,28 +105,36 @@ int32_t Simulator::systemClose(uint32_t ref) {
 int32_t Simulator::systemProperty(uint32_t id, uint32_t size, void* value) {
   const VersionValues& v = hardware_->config().versions;
   switch (id) {
-    case driver::kPropSystemVersionPacked: return GetWord(v.packed, size, value);
-    case driver::kPropSystemVersionMajor: return GetWord(v.major, size, value);
-    case driver::kPropSystemVersionMinor: return GetWord(v.minor, size, value);
-    case driver::kPropSystemVersionPhase: return GetWord(v.phase, size, value);
-    case driver::kPropSystemVersionUpdate: return GetWord(v.update, size, value);
+    case driver::kPropSystemVersionPacked:
+      return GetWord(v.packed, size, value);
+    case driver::kPropSystemVersionMajor:
+      return GetWord(v.major, size, value);
+    case driver::kPropSystemVersionMinor:
+      return GetWord(v.minor, size, value);
+    case driver::kPropSystemVersionPhase:
+      return GetWord(v.phase, size, value);
+    case driver::kPropSystemVersionUpdate:
+      return GetWord(v.update, size, value);
     case driver::kPropSystemDevices: {
       std::vector<uint32_t> refs;
       for (const SimDevice& d : hardware_->devices()) refs.push_back(d.ref);
       return GetRefList(refs, size, value);
     }
-    default: return driver::kUnknownProperty;
+    default:
+      return driver::kUnknownProperty;
   }
 }
 
-int32_t Simulator::deviceProperty(const SimDevice& device, uint32_t id, uint32_t size, void* value) {
+int32_t Simulator::deviceProperty(const SimDevice& device, uint32_t id, uint32_t size,
+                                  void* value) {
   if (id != driver::kPropDeviceInterfaces) return driver::kUnknownProperty;
   std::vector<uint32_t> refs;
   for (int32_t i : device.interfaces) refs.push_back(hardware_->interfaces()[i].ref);
   return GetRefList(refs, size, value);
 }
 
-int32_t Simulator::interfaceProperty(const SimInterface& i, uint32_t id, uint32_t size, void* value) {
+int32_t Simulator::interfaceProperty(const SimInterface& i, uint32_t id, uint32_t size,
+                                     void* value) {
   switch (id) {
     case driver::kPropInterfaceName: {
       const std::string& name = i.config.name;
@@ -143,9 +151,12 @@ int32_t Simulator::interfaceProperty(const SimInterface& i, uint32_t id, uint32_
       std::memset(value, 0, size);
       Store(value, i.config.port);
       return driver::kSuccess;
-    case driver::kPropInterfaceProtocol: return GetWord(i.config.protocol, size, value);
-    case driver::kPropInterfaceCanFd: return GetWord(i.config.canFd, size, value);
-    default: return driver::kUnknownProperty;
+    case driver::kPropInterfaceProtocol:
+      return GetWord(i.config.protocol, size, value);
+    case driver::kPropInterfaceCanFd:
+      return GetWord(i.config.canFd, size, value);
+    default:
+      return driver::kUnknownProperty;
   }
 }
 
@@ -179,8 +190,8 @@ int32_t Simulator::setProperty(uint32_t ref, uint32_t id, uint32_t size, const v
   // System, device and interface properties are read only.
   std::vector<uint8_t> scratch(size);
   const int32_t status = getProperty(ref, id, size, size ? scratch.data() : nullptr);
-  if (status == driver::kSuccess || status == driver::kWrongPropertySize || status == driver::kBufferTooSmall ||
-      status == driver::kBufferMissing) {
+  if (status == driver::kSuccess || status == driver::kWrongPropertySize ||
+      status == driver::kBufferTooSmall || status == driver::kBufferMissing) {
     return value == nullptr ? driver::kBufferMissing : driver::kPropertyReadOnly;
   }
   return status;
@@ -196,7 +207,8 @@ int32_t Simulator::notASession(uint32_t ref) {
   std::lock_guard lock(mutex_);
   const uint32_t kind = RefKind(ref);
   if ((kind == kRefSystem && systems_.count(ref)) || databases_.owns(ref) ||
-      (kind == kRefDevice && hardware_->deviceByRef(ref)) || (kind == kRefInterface && hardware_->interfaceByRef(ref))) {
+      (kind == kRefDevice && hardware_->deviceByRef(ref)) ||
+      (kind == kRefInterface && hardware_->interfaceByRef(ref))) {
     return driver::kWrongObjectKind;
   }
   return driver::kInvalidReference;
@@ -238,7 +250,8 @@ int32_t Simulator::dbOpen(const char* name, uint32_t& ref) {
   return databases_.open(name, ref);
 }
 
-int32_t Simulator::dbCreateObject(uint32_t parent, uint32_t objectClass, const char* name, uint32_t& ref) {
+int32_t Simulator::dbCreateObject(uint32_t parent, uint32_t objectClass, const char* name,
+                                  uint32_t& ref) {
   std::lock_guard lock(mutex_);
   return databases_.createObject(parent, objectClass, name, ref);
 }

@@ -50,8 +50,9 @@ class Simulator {
   int32_t systemProperty(uint32_t id, uint32_t size, void* value);
   int32_t deviceProperty(const SimDevice& device, uint32_t id, uint32_t size, void* value);
   int32_t interfaceProperty(const SimInterface& i, uint32_t id, uint32_t size, void* value);
-  int32_t buildSetup(const std::string& database, const std::string& cluster, const std::string& frameList,
-                     const SimInterface& i, uint32_t mode, SessionSetup& setup);
+  int32_t buildSetup(const std::string& database, const std::string& cluster,
+                     const std::string& frameList, const SimInterface& i, uint32_t mode,
+                     SessionSetup& setup);
 
   std::mutex mutex_;
   std::shared_ptr<Hardware> hardware_;                               // guarded by mutex_

@@ -25,16 +25,19 @@ int32_t Simulator::buildSetup(const std::string& database, const std::string& cl
                               const std::string& frameList, const SimInterface& i, uint32_t mode,
                               SessionSetup& setup) {
   ResolvedDatabase db;
-  if (const int32_t st = databases_.resolve(database, cluster, frameList, db); st != driver::kSuccess) return st;
+  if (const int32_t st = databases_.resolve(database, cluster, frameList, db);
+      st != driver::kSuccess)
+    return st;
   const BusConfig& bus = i.bus->config();
   if (db.fromBus) {
     const bool j1939 = db.cluster.j1939;
     if (j1939 && i.config.protocol != driver::kProtocolCan) return driver::kProtocolMismatch;
-    db.cluster = ClusterSettings{i.config.protocol, bus.bitRate, bus.dataBitRate, bus.canIoMode, j1939};
+    db.cluster =
+        ClusterSettings{i.config.protocol, bus.bitRate, bus.dataBitRate, bus.canIoMode, j1939};
   }
   if (db.cluster.protocol != i.config.protocol) return driver::kProtocolMismatch;
-  if (db.cluster.protocol == driver::kProtocolCan && db.cluster.canIoMode != driver::kCanIoModeClassic &&
-      i.config.canFd == 0 && !db.subordinate) {
+  if (db.cluster.protocol == driver::kProtocolCan &&
+      db.cluster.canIoMode != driver::kCanIoModeClassic && i.config.canFd == 0 && !db.subordinate) {
     return driver::kInterfaceNotCapable;
   }
   if (IsOutputMode(mode)) {
@@ -55,7 +58,8 @@ int32_t Simulator::buildSetup(const std::string& database, const std::string& cl
 
 int32_t Simulator::createSession(const char* database, const char* cluster, const char* frameList,
                                  const char* interfaceName, uint32_t mode, uint32_t& ref) {
-  if (!ValidText(database) || !ValidText(cluster) || !ValidText(frameList) || !ValidText(interfaceName)) {
+  if (!ValidText(database) || !ValidText(cluster) || !ValidText(frameList) ||
+      !ValidText(interfaceName)) {
     return driver::kInvalidName;
   }
   if (mode != driver::kModeReceiveStream && !IsOutputMode(mode)) return driver::kInvalidMode;
@@ -65,7 +69,8 @@ int32_t Simulator::createSession(const char* database, const char* cluster, cons
     std::lock_guard lock(mutex_);
     const SimInterface* i = hardware_->findInterface(interfaceName);
     if (i == nullptr) return driver::kInterfaceNotFound;
-    if (const int32_t st = buildSetup(database, cluster, frameList, *i, mode, setup); st != driver::kSuccess) {
+    if (const int32_t st = buildSetup(database, cluster, frameList, *i, mode, setup);
+        st != driver::kSuccess) {
       return st;
     }
     bus = i->bus;

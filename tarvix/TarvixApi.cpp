@@ -28,7 +28,8 @@ template <typename Body, typename After>
 kxStatus Run(CallRecord call, uint32_t interfaceRef, Body&& body, After&& after) {
   CallLog& log = CallLog::Instance();
   if (!log.active()) return body();
-  if (call.interfaceName.empty()) call.interfaceName = Simulator::Instance().interfaceOf(interfaceRef);
+  if (call.interfaceName.empty())
+    call.interfaceName = Simulator::Instance().interfaceOf(interfaceRef);
   const std::optional<int32_t> injected = log.injected(call.operation, call.interfaceName);
   call.status = injected ? *injected : body();
   after(call);
@@ -70,14 +71,16 @@ extern "C" {
 kxStatus kxCreateSession(const char* databaseName, const char* clusterName, const char* frameList,
                          const char* interfaceName, uint32_t mode, kxRef* outSession) {
   CallRecord c = Call("kxCreateSession", 0, mode);
-  c.texts = {tarvix::Text(databaseName), tarvix::Text(clusterName), tarvix::Text(frameList), tarvix::Text(interfaceName)};
+  c.texts = {tarvix::Text(databaseName), tarvix::Text(clusterName), tarvix::Text(frameList),
+             tarvix::Text(interfaceName)};
   const std::string& name = c.texts[3];
   c.interfaceName = name.substr(0, name.find('@'));
   return Run(
       std::move(c), 0,
       [&] {
         if (outSession == nullptr) return driver::kBufferMissing;
-        return Simulator::Instance().createSession(databaseName, clusterName, frameList, interfaceName, mode, *outSession);
+        return Simulator::Instance().createSession(databaseName, clusterName, frameList,
+                                                   interfaceName, mode, *outSession);
       },
       [&](CallRecord& r) { r.result = r.status == 0 && outSession ? *outSession : 0; });
 }
@@ -159,7 +162,8 @@ kxStatus kxWait(kxRef session, uint32_t condition, uint32_t parameter, double ti
   });
 }
 
-kxStatus kxReadState(kxRef session, uint32_t stateId, uint32_t size, void* outState, uint32_t* outFaultCode) {
+kxStatus kxReadState(kxRef session, uint32_t stateId, uint32_t size, void* outState,
+                     uint32_t* outFaultCode) {
   return Run(
       Call("kxReadState", session, stateId, size), session,
       [&] {
@@ -179,12 +183,15 @@ kxStatus kxClear(kxRef ref) {
 kxStatus kxSystemOpen(kxRef* outSystem) {
   return Run(
       Call("kxSystemOpen", 0), 0,
-      [&] { return outSystem ? Simulator::Instance().systemOpen(*outSystem) : driver::kBufferMissing; },
+      [&] {
+        return outSystem ? Simulator::Instance().systemOpen(*outSystem) : driver::kBufferMissing;
+      },
       [&](CallRecord& r) { r.result = r.status == 0 && outSystem ? *outSystem : 0; });
 }
 
 kxStatus kxSystemClose(kxRef system) {
-  return Run(Call("kxSystemClose", system), system, [&] { return Simulator::Instance().systemClose(system); });
+  return Run(Call("kxSystemClose", system), system,
+             [&] { return Simulator::Instance().systemClose(system); });
 }
 
 kxStatus kxdbOpenDatabase(const char* name, kxRef* outDatabase) {
@@ -192,7 +199,10 @@ kxStatus kxdbOpenDatabase(const char* name, kxRef* outDatabase) {
   c.texts = {tarvix::Text(name)};
   return Run(
       std::move(c), 0,
-      [&] { return outDatabase ? Simulator::Instance().dbOpen(name, *outDatabase) : driver::kBufferMissing; },
+      [&] {
+        return outDatabase ? Simulator::Instance().dbOpen(name, *outDatabase)
+                           : driver::kBufferMissing;
+      },
       [&](CallRecord& r) { r.result = r.status == 0 && outDatabase ? *outDatabase : 0; });
 }
 
@@ -202,8 +212,9 @@ kxStatus kxdbCreateObject(kxRef parent, uint32_t objectClass, const char* name, 
   return Run(
       std::move(c), 0,
       [&] {
-        return outObject ? Simulator::Instance().dbCreateObject(parent, objectClass, name, *outObject)
-                         : driver::kBufferMissing;
+        return outObject
+                   ? Simulator::Instance().dbCreateObject(parent, objectClass, name, *outObject)
+                   : driver::kBufferMissing;
       },
       [&](CallRecord& r) { r.result = r.status == 0 && outObject ? *outObject : 0; });
 }

@@ -13,8 +13,10 @@ void StartRecording() { CallLog::Instance().startRecording(); }
 void StopRecording() { CallLog::Instance().stopRecording(); }
 std::vector<CallRecord> RecordedCalls() { return CallLog::Instance().calls(); }
 
-void InjectStatus(std::string_view operation, std::string_view interfaceName, int32_t status, bool always) {
-  CallLog::Instance().inject(FaultConfig{std::string(operation), std::string(interfaceName), status, always});
+void InjectStatus(std::string_view operation, std::string_view interfaceName, int32_t status,
+                  bool always) {
+  CallLog::Instance().inject(
+      FaultConfig{std::string(operation), std::string(interfaceName), status, always});
 }
 
 void ClearInjections() { CallLog::Instance().clearFaults(); }
@@ -25,12 +27,14 @@ void ResetToDefaults() {
   Simulator::Instance().installConfig(DefaultHardware(), error);
 }
 
-bool LoadConfiguration(std::string_view json, const std::string& baseDirectory, std::string* error) {
+bool LoadConfiguration(std::string_view json, const std::string& baseDirectory,
+                       std::string* error) {
   HardwareConfig config;
   std::string message;
   Simulator& sim = Simulator::Instance();
   if (!ParseHardwareConfig(json, baseDirectory, config, message)) {
-    std::fprintf(stderr, "tarvix: configuration: %s; the driver offers no hardware\n", message.c_str());
+    std::fprintf(stderr, "tarvix: configuration: %s; the driver offers no hardware\n",
+                 message.c_str());
     sim.install(Hardware::Empty(VersionValues{}));
     if (error) *error = message;
     return false;
@@ -45,7 +49,8 @@ bool LoadConfigurationFile(const std::string& path, std::string* error) {
   std::string message;
   Simulator& sim = Simulator::Instance();
   if (!LoadHardwareConfigFile(path, config, message)) {
-    std::fprintf(stderr, "tarvix: %s: %s; the driver offers no hardware\n", path.c_str(), message.c_str());
+    std::fprintf(stderr, "tarvix: %s: %s; the driver offers no hardware\n", path.c_str(),
+                 message.c_str());
     sim.install(Hardware::Empty(VersionValues{}));
     if (error) *error = message;
     return false;

@@ -11,7 +11,9 @@ constexpr uint64_t kPicosecondsPerSecond = 1000000000000ULL;
 
 class PlatformCounter final : public iClockSource {
  public:
-  uint64_t ReadCounter() override { return static_cast<uint64_t>(platform::ReadPerformanceCounter()); }
+  uint64_t ReadCounter() override {
+    return static_cast<uint64_t>(platform::ReadPerformanceCounter());
+  }
   uint64_t CounterFrequency() override {
     return static_cast<uint64_t>(platform::PerformanceCounterFrequency());
   }

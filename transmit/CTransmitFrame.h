@@ -54,12 +54,12 @@ class CTransmitFrame {
   // The frame fields. Unset fields start at 0.
   uint32_t txPayloadLength = 0;  // bytes to send: its low byte, at most 64
   uint32_t txIdentifier = 0;
-  uint8_t txExtendedId = 0;      // non-zero: txIdentifier is an extended identifier
+  uint8_t txExtendedId = 0;  // non-zero: txIdentifier is an extended identifier
   std::vector<uint8_t> txPayload;
-  uint32_t txTimingType = 1;     // 0 cyclic data, 1 event data (the driver's frame timing types)
-  double txCyclicRate = 0.0;     // seconds between repetitions
-  uint8_t txFrameType = 0;       // 1 remote; 0x08, 0x10, 0x18 choose the frame's CAN I/O mode
-  bool txActive = false;         // started and not stopped
+  uint32_t txTimingType = 1;  // 0 cyclic data, 1 event data (the driver's frame timing types)
+  double txCyclicRate = 0.0;  // seconds between repetitions
+  uint8_t txFrameType = 0;    // 1 remote; 0x08, 0x10, 0x18 choose the frame's CAN I/O mode
+  bool txActive = false;      // started and not stopped
 
   // Driver references; 0 while none is held.
   uint32_t txSession = 0;

@@ -40,11 +40,13 @@ void CTransmitFrame::CreateTransmitSession() {
   txDatabaseNumber_ = TransmitDatabaseName::Acquire();
   const std::string name = TransmitDatabaseName::Format(txDatabaseNumber_);
   if ((status_ = kxdbOpenDatabase(name.c_str(), &txDatabase)) != 0) return;
-  if ((status_ = kxdbCreateObject(txDatabase, driver::kClassCluster, kClusterName, &txCluster)) != 0) {
+  if ((status_ = kxdbCreateObject(txDatabase, driver::kClassCluster, kClusterName, &txCluster)) !=
+      0) {
     return;
   }
   if (setClusterProperties() != 0) return;
-  if ((status_ = kxdbCreateObject(txCluster, driver::kClassFrame, kFrameName, &txFrameObject)) != 0) {
+  if ((status_ = kxdbCreateObject(txCluster, driver::kClassFrame, kFrameName, &txFrameObject)) !=
+      0) {
     return;
   }
   if (setFrameProperties() != 0) return;
@@ -78,15 +80,18 @@ int32_t CTransmitFrame::setClusterProperties() {
 
 int32_t CTransmitFrame::setFrameProperties() {
   // Without an extended identifier the frame keeps the driver's default for a new frame.
-  if (txExtendedId != 0 &&
-      (status_ = SetObjectProperty(txFrameObject, driver::kPropFrameExtendedId, txExtendedId)) != 0) {
+  if (txExtendedId != 0 && (status_ = SetObjectProperty(txFrameObject, driver::kPropFrameExtendedId,
+                                                        txExtendedId)) != 0) {
     return status_;
   }
-  if ((status_ = SetObjectProperty(txFrameObject, driver::kPropFrameIdentifier, txIdentifier)) != 0 ||
+  if ((status_ = SetObjectProperty(txFrameObject, driver::kPropFrameIdentifier, txIdentifier)) !=
+          0 ||
       (status_ = SetObjectProperty(txFrameObject, driver::kPropFramePayloadLength,
                                    txPayloadLength)) != 0 ||
-      (status_ = SetObjectProperty(txFrameObject, driver::kPropFrameTimingType, txTimingType)) != 0 ||
-      (status_ = SetObjectProperty(txFrameObject, driver::kPropFrameCyclicRate, txCyclicRate)) != 0) {
+      (status_ = SetObjectProperty(txFrameObject, driver::kPropFrameTimingType, txTimingType)) !=
+          0 ||
+      (status_ = SetObjectProperty(txFrameObject, driver::kPropFrameCyclicRate, txCyclicRate)) !=
+          0) {
     return status_;
   }
   return setFrameIoMode();
@@ -113,13 +118,14 @@ int32_t CTransmitFrame::setFrameIoMode() {
 }
 
 int32_t CTransmitFrame::setOutputSessionProperties() {
-  if ((status_ = SetSessionProperty(txSession, driver::kPropBaudRate, settings_.baudRate.load())) != 0 ||
+  if ((status_ = SetSessionProperty(txSession, driver::kPropBaudRate, settings_.baudRate.load())) !=
+          0 ||
       (status_ = SetSessionProperty(txSession, driver::kPropTermination,
                                     settings_.termination.load())) != 0) {
     return status_;
   }
-  status_ = SetSessionProperty(txSession, driver::kPropTransceiverType,
-                               settings_.transceiverType.load());
+  status_ =
+      SetSessionProperty(txSession, driver::kPropTransceiverType, settings_.transceiverType.load());
   return status_;
 }
 

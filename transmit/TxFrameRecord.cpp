@@ -13,7 +13,8 @@ uint32_t BuildTxFrameRecord(const TxFrameFields& fields, TxFrameRecord& record) 
   record.header.identifier = fields.identifier | (fields.extended ? driver::kExtendedIdFlag : 0u);
   record.header.type = fields.remote ? driver::kFrameCanRemote : driver::kFrameCanData;
   record.header.length = static_cast<uint8_t>(length);
-  const size_t given = fields.payload != nullptr ? std::min<size_t>(fields.payload->size(), length) : 0;
+  const size_t given =
+      fields.payload != nullptr ? std::min<size_t>(fields.payload->size(), length) : 0;
   if (given > 0) std::copy_n(fields.payload->data(), given, record.payload);
   return kRawFrameHeaderSize + RawPayloadArea(length);
 }

@@ -1,4 +1,5 @@
-// The entry points of the measurement-data library vora.dll that the runtime calls, and their constants.
+// The entry points of the measurement-data library vora.dll that the runtime calls, and their
+// constants.
 //
 // The runtime does not link the library: it loads vora.dll at run time and resolves these names,
 // calling them through the function pointer types below. Every entry point returns kVorOk (0) or a
@@ -29,8 +30,8 @@ inline constexpr int32_t kVorTypeInt32 = 3;  // one signed 32-bit integer (prope
 inline constexpr int32_t kVorTypeUInt8 = 5;  // unsigned bytes (channel raw data, byte properties)
 
 // Scopes of VorFileBufFlush, a bit set.
-inline constexpr int32_t kVorFlushData = 1;        // buffered channel data
-inline constexpr int32_t kVorFlushStructure = 2;   // objects and properties
+inline constexpr int32_t kVorFlushData = 1;       // buffered channel data
+inline constexpr int32_t kVorFlushStructure = 2;  // objects and properties
 inline constexpr int32_t kVorFlushAll = kVorFlushData | kVorFlushStructure;
 
 // A handle that names no file or object; callers preset out handles with it.
@@ -38,14 +39,15 @@ inline constexpr int32_t kVorNoHandle = -1;
 
 // Results.
 inline constexpr int32_t kVorOk = 0;
-inline constexpr int32_t kVorErrArgument = -1;   // a null pointer, an unknown code or mode, a bad combination
-inline constexpr int32_t kVorErrHandle = -2;     // no open file or object of that handle
-inline constexpr int32_t kVorErrFile = -3;       // the file cannot be created, opened, written or closed
-inline constexpr int32_t kVorErrPath = -4;       // the object path is not of the form /'group'/'channel'
-inline constexpr int32_t kVorErrDataType = -5;   // the data-type code is not accepted for the call
-inline constexpr int32_t kVorErrRevision = -6;   // the interface revision is not kVorApiRevision
-inline constexpr int32_t kVorErrReadOnly = -7;   // a write to a file opened for reading
-inline constexpr int32_t kVorErrObject = -8;     // the object cannot be created or opened
+inline constexpr int32_t kVorErrArgument =
+    -1;  // a null pointer, an unknown code or mode, a bad combination
+inline constexpr int32_t kVorErrHandle = -2;  // no open file or object of that handle
+inline constexpr int32_t kVorErrFile = -3;  // the file cannot be created, opened, written or closed
+inline constexpr int32_t kVorErrPath = -4;  // the object path is not of the form /'group'/'channel'
+inline constexpr int32_t kVorErrDataType = -5;  // the data-type code is not accepted for the call
+inline constexpr int32_t kVorErrRevision = -6;  // the interface revision is not kVorApiRevision
+inline constexpr int32_t kVorErrReadOnly = -7;  // a write to a file opened for reading
+inline constexpr int32_t kVorErrObject = -8;    // the object cannot be created or opened
 
 extern "C" {
 // Sets the platform the caller runs on (kVorPlatform*). Called once right after loading.
@@ -57,7 +59,8 @@ using VorFileOpenExAFn = int32_t (*)(const char* path, int32_t openMode, int32_t
                                      int32_t revision, int32_t* fileHandle);
 // Creates the object at `objectPath` ("/'group'/'channel'", "/'group'" or "/"), or opens it when it
 // exists, and returns its handle inside `fileHandle`.
-using VorObjCreateAFn = int32_t (*)(const char* objectPath, int32_t fileHandle, int32_t* objectHandle);
+using VorObjCreateAFn = int32_t (*)(const char* objectPath, int32_t fileHandle,
+                                    int32_t* objectHandle);
 // Sets (or replaces) the property `name` of an object to the value at `value`.
 using VorPropSetAFn = int32_t (*)(const char* name, int32_t dataType, const void* value,
                                   int32_t fileHandle, int32_t objectHandle);

@@ -23,12 +23,16 @@ class HidGuard {
   hid_t id_;
 };
 
-bool LinkExists(hid_t parent, const std::string& name) { return H5Lexists(parent, name.c_str(), H5P_DEFAULT) > 0; }
+bool LinkExists(hid_t parent, const std::string& name) {
+  return H5Lexists(parent, name.c_str(), H5P_DEFAULT) > 0;
+}
 
 std::string ObjectKey(const ObjectPath& path) {
   switch (path.kind) {
-    case ObjectPath::Kind::kRoot: return "/";
-    case ObjectPath::Kind::kGroup: return "g:" + path.group;
+    case ObjectPath::Kind::kRoot:
+      return "/";
+    case ObjectPath::Kind::kGroup:
+      return "g:" + path.group;
     case ObjectPath::Kind::kChannel:
       return "c:" + std::to_string(path.group.size()) + ":" + path.group + path.channel;
   }
@@ -77,7 +81,8 @@ hid_t VoraFile::OpenOrCreateGroup(hid_t parent, const std::string& storedName) {
   return H5Gcreate2(parent, storedName.c_str(), H5P_DEFAULT, H5P_DEFAULT, H5P_DEFAULT);
 }
 
-hid_t VoraFile::OpenOrCreateChannel(hid_t group, const std::string& storedName, hsize_t& storedBytes) {
+hid_t VoraFile::OpenOrCreateChannel(hid_t group, const std::string& storedName,
+                                    hsize_t& storedBytes) {
   if (LinkExists(group, storedName)) {
     const hid_t dataset = H5Dopen2(group, storedName.c_str(), H5P_DEFAULT);
     if (dataset < 0) return dataset;
@@ -135,7 +140,8 @@ VoraFile::Object* VoraFile::Find(int32_t handle) {
   return &objects_[static_cast<size_t>(handle)];
 }
 
-int32_t VoraFile::SetProperty(int32_t handle, const char* name, int32_t dataType, const void* value) {
+int32_t VoraFile::SetProperty(int32_t handle, const char* name, int32_t dataType,
+                              const void* value) {
   Object* object = Find(handle);
   if (object == nullptr) return kVorErrHandle;
   if (name == nullptr || *name == '\0' || value == nullptr) return kVorErrArgument;
@@ -150,7 +156,8 @@ int32_t VoraFile::SetProperty(int32_t handle, const char* name, int32_t dataType
   return kVorOk;
 }
 
-int32_t VoraFile::AppendRaw(int32_t handle, int32_t dataType, const uint8_t* bytes, uint32_t count) {
+int32_t VoraFile::AppendRaw(int32_t handle, int32_t dataType, const uint8_t* bytes,
+                            uint32_t count) {
   Object* object = Find(handle);
   if (object == nullptr || !object->isChannel) return kVorErrHandle;
   if (dataType != kVorTypeUInt8) return kVorErrDataType;

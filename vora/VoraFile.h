@@ -45,8 +45,8 @@ class VoraFile {
   struct Object {
     hid_t id = H5I_INVALID_HID;
     bool isChannel = false;
-    std::string key;             // the path as parsed, to hand out one handle per object
-    hsize_t storedBytes = 0;     // bytes already in the dataset
+    std::string key;          // the path as parsed, to hand out one handle per object
+    hsize_t storedBytes = 0;  // bytes already in the dataset
     std::vector<uint8_t> pending;
   };
 

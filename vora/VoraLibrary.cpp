@@ -32,14 +32,16 @@ VoraFile* VoraLibrary::Find(int32_t fileHandle) {
 
 // Handles count up and are not reused soon, so a stale handle rarely names another file.
 int32_t VoraLibrary::NextHandle() {
-  while (files_.contains(nextHandle_)) nextHandle_ = nextHandle_ == std::numeric_limits<int32_t>::max() ? 0 : nextHandle_ + 1;
+  while (files_.contains(nextHandle_))
+    nextHandle_ = nextHandle_ == std::numeric_limits<int32_t>::max() ? 0 : nextHandle_ + 1;
   const int32_t handle = nextHandle_;
   nextHandle_ = handle == std::numeric_limits<int32_t>::max() ? 0 : handle + 1;
   return handle;
 }
 
 int32_t VoraLibrary::SetPlatform(int32_t platformCode) {
-  if (platformCode != kVorPlatformDesktop && platformCode != kVorPlatformRealTime) return kVorErrArgument;
+  if (platformCode != kVorPlatformDesktop && platformCode != kVorPlatformRealTime)
+    return kVorErrArgument;
   std::lock_guard lock(mutex_);
   platformCode_ = platformCode;
   return kVorOk;
@@ -68,7 +70,8 @@ int32_t VoraLibrary::OpenFile(const char* path, int32_t openMode, int32_t access
   return kVorOk;
 }
 
-int32_t VoraLibrary::CreateObject(const char* objectPath, int32_t fileHandle, int32_t* objectHandle) {
+int32_t VoraLibrary::CreateObject(const char* objectPath, int32_t fileHandle,
+                                  int32_t* objectHandle) {
   if (objectPath == nullptr || objectHandle == nullptr) return kVorErrArgument;
   ObjectPath path;
   if (!ParseObjectPath(objectPath, path)) return kVorErrPath;
@@ -93,7 +96,8 @@ int32_t VoraLibrary::AppendRaw(int32_t dataType, uint32_t byteCount, const void*
   std::lock_guard lock(mutex_);
   VoraFile* file = Find(fileHandle);
   return file == nullptr ? kVorErrHandle
-                         : file->AppendRaw(objectHandle, dataType, static_cast<const uint8_t*>(bytes), byteCount);
+                         : file->AppendRaw(objectHandle, dataType,
+                                           static_cast<const uint8_t*>(bytes), byteCount);
 }
 
 int32_t VoraLibrary::Flush(int32_t scope, int32_t fileHandle) {

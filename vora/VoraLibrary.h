@@ -20,7 +20,8 @@ class VoraLibrary {
 
   int32_t SetPlatform(int32_t platformCode);
   int32_t SetApiFlags(uint32_t flags);
-  int32_t OpenFile(const char* path, int32_t openMode, int32_t access, int32_t revision, int32_t* fileHandle);
+  int32_t OpenFile(const char* path, int32_t openMode, int32_t access, int32_t revision,
+                   int32_t* fileHandle);
   int32_t CreateObject(const char* objectPath, int32_t fileHandle, int32_t* objectHandle);
   int32_t SetProperty(const char* name, int32_t dataType, const void* value, int32_t fileHandle,
                       int32_t objectHandle);
@@ -31,7 +32,7 @@ class VoraLibrary {
 
  private:
   VoraLibrary() = default;
-  void QuietHdf5();                   // guarded by mutex_
+  void QuietHdf5();                    // guarded by mutex_
   VoraFile* Find(int32_t fileHandle);  // guarded by mutex_
   int32_t NextHandle();                // guarded by mutex_
 

@@ -21,7 +21,8 @@ bool ParseObjectPath(std::string_view text, ObjectPath& out) {
     out = ObjectPath{};
     return true;
   }
-  if (text.size() < kOpen.size() + 1 || !text.starts_with(kOpen) || !text.ends_with('\'')) return false;
+  if (text.size() < kOpen.size() + 1 || !text.starts_with(kOpen) || !text.ends_with('\''))
+    return false;
   const std::string_view inner = text.substr(kOpen.size(), text.size() - kOpen.size() - 1);
   const size_t separator = inner.find(kSeparator);
   out = ObjectPath{};

@@ -19,7 +19,7 @@ namespace vora {
 struct ObjectPath {
   enum class Kind { kRoot, kGroup, kChannel };
   Kind kind = Kind::kRoot;
-  std::string group;    // names as the caller wrote them
+  std::string group;  // names as the caller wrote them
   std::string channel;
 };
 

@@ -103,11 +103,20 @@ void BM_SendIdentifierRecordsAgain(benchmark::State& state) {
 
 BENCHMARK(BM_UpdateIdentifierTable<Indexed>)->Arg(100)->Arg(2000)->Arg(65535)->MinTime(0.3);
 BENCHMARK(BM_UpdateIdentifierTable<Literal>)->Arg(100)->Arg(2000)->Arg(65535)->MinTime(0.3);
-BENCHMARK(BM_SendIdentifierRecords<Indexed>)->Arg(2000)->Arg(65535)->MinTime(0.3)
+BENCHMARK(BM_SendIdentifierRecords<Indexed>)
+    ->Arg(2000)
+    ->Arg(65535)
+    ->MinTime(0.3)
     ->Unit(benchmark::kMicrosecond);
-BENCHMARK(BM_SendIdentifierRecords<Literal>)->Arg(2000)->Arg(65535)->MinTime(0.3)
+BENCHMARK(BM_SendIdentifierRecords<Literal>)
+    ->Arg(2000)
+    ->Arg(65535)
+    ->MinTime(0.3)
     ->Unit(benchmark::kMicrosecond);
-BENCHMARK(BM_SendIdentifierRecordsAgain)->Arg(2000)->Arg(65535)->MinTime(0.3)
+BENCHMARK(BM_SendIdentifierRecordsAgain)
+    ->Arg(2000)
+    ->Arg(65535)
+    ->MinTime(0.3)
     ->Unit(benchmark::kMicrosecond);
 
 }  // namespace

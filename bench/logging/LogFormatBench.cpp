@@ -1,4 +1,5 @@
-// Text lines and binary records formatted per second, per bus, over batches like the default traffic.
+// Text lines and binary records formatted per second, per bus, over batches like the default
+// traffic.
 #include <benchmark/benchmark.h>
 
 #include <cstring>
@@ -40,11 +41,14 @@ std::vector<uint8_t> MakeBatch(Bus bus) {
         Append(batch, {ts, i % 4 == 3 ? 0x38FEF100u : 0x100u + (i % 7), 0, 0, 0, 8}, payload);
         break;
       case Bus::kCanFd:
-        Append(batch, {ts, 0x200u + (i % 3), 0x18, 0, 0, static_cast<uint8_t>(i % 2 ? 64 : 12)}, payload);
+        Append(batch, {ts, 0x200u + (i % 3), 0x18, 0, 0, static_cast<uint8_t>(i % 2 ? 64 : 12)},
+               payload);
         break;
       case Bus::kLin:
-        Append(batch, {ts, 0x10u + (i % 4), static_cast<uint8_t>(i % 4 == 2 ? 0x42 : 0x40), 0, 0x5a,
-                       static_cast<uint8_t>(i % 4 == 2 ? 0 : 8)}, payload);
+        Append(batch,
+               {ts, 0x10u + (i % 4), static_cast<uint8_t>(i % 4 == 2 ? 0x42 : 0x40), 0, 0x5a,
+                static_cast<uint8_t>(i % 4 == 2 ? 0 : 8)},
+               payload);
         break;
       case Bus::kFlexRay:
         Append(batch, {ts, 1u + (i % 40), 0x20, 0x12, static_cast<uint8_t>(i % 64), 16}, payload);
@@ -57,9 +61,12 @@ std::vector<uint8_t> MakeBatch(Bus bus) {
 size_t FormatLine(Bus bus, char* out, size_t cap, const RawFrameView& v) {
   switch (bus) {
     case Bus::kCan:
-    case Bus::kCanFd: return FormatCanTextLine(out, cap, v);
-    case Bus::kLin: return FormatLinTextLine(out, cap, v, 1);
-    case Bus::kFlexRay: return FormatFlexRayTextLine(out, cap, v);
+    case Bus::kCanFd:
+      return FormatCanTextLine(out, cap, v);
+    case Bus::kLin:
+      return FormatLinTextLine(out, cap, v, 1);
+    case Bus::kFlexRay:
+      return FormatFlexRayTextLine(out, cap, v);
   }
   return 0;
 }
@@ -67,9 +74,12 @@ size_t FormatLine(Bus bus, char* out, size_t cap, const RawFrameView& v) {
 BinaryRecordLayout LayoutOf(Bus bus) {
   switch (bus) {
     case Bus::kCan:
-    case Bus::kLin: return BinaryRecordLayout::kFixed24;
-    case Bus::kCanFd: return BinaryRecordLayout::kCanVariable;
-    case Bus::kFlexRay: return BinaryRecordLayout::kFlexRayVariable;
+    case Bus::kLin:
+      return BinaryRecordLayout::kFixed24;
+    case Bus::kCanFd:
+      return BinaryRecordLayout::kCanVariable;
+    case Bus::kFlexRay:
+      return BinaryRecordLayout::kFlexRayVariable;
   }
   return BinaryRecordLayout::kFixed24;
 }

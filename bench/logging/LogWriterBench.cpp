@@ -57,15 +57,22 @@ std::vector<uint8_t> MakeBatch(Bus bus) {
     const uint64_t ts = kStart + i * kTicksPerFrame;
     payload[0] = static_cast<uint8_t>(i);
     switch (bus) {
-      case Bus::kCan: Append(batch, {ts, i % 4 == 3 ? 0x38FEF100u : 0x100u + (i % 7), 0, 0, 0, 8}, payload); break;
+      case Bus::kCan:
+        Append(batch, {ts, i % 4 == 3 ? 0x38FEF100u : 0x100u + (i % 7), 0, 0, 0, 8}, payload);
+        break;
       case Bus::kCanFd:
-        Append(batch, {ts, 0x200u + (i % 3), 0x18, 0, 0, static_cast<uint8_t>(i % 2 ? 64 : 12)}, payload);
+        Append(batch, {ts, 0x200u + (i % 3), 0x18, 0, 0, static_cast<uint8_t>(i % 2 ? 64 : 12)},
+               payload);
         break;
       case Bus::kLin:
-        Append(batch, {ts, 0x10u + (i % 4), static_cast<uint8_t>(i % 4 == 2 ? 0x42 : 0x40), 0, 0x5a,
-                       static_cast<uint8_t>(i % 4 == 2 ? 0 : 8)}, payload);
+        Append(batch,
+               {ts, 0x10u + (i % 4), static_cast<uint8_t>(i % 4 == 2 ? 0x42 : 0x40), 0, 0x5a,
+                static_cast<uint8_t>(i % 4 == 2 ? 0 : 8)},
+               payload);
         break;
-      case Bus::kFlexRay: Append(batch, {ts, 1u + (i % 40), 0x20, 0x12, static_cast<uint8_t>(i % 64), 16}, payload); break;
+      case Bus::kFlexRay:
+        Append(batch, {ts, 1u + (i % 40), 0x20, 0x12, static_cast<uint8_t>(i % 64), 16}, payload);
+        break;
     }
   }
   return batch;
@@ -100,7 +107,9 @@ void RunWriter(benchmark::State& state, Bus bus, uint8_t logType) {
   BenchSession session(&connection);
   const std::vector<uint8_t> batch = MakeBatch(bus);
   const uint32_t bytes = static_cast<uint32_t>(batch.size());
-  const auto writer = bus == Bus::kLin ? &WriteLinLog : bus == Bus::kFlexRay ? &WriteFlexRayLog : &WriteCanLog;
+  const auto writer = bus == Bus::kLin       ? &WriteLinLog
+                      : bus == Bus::kFlexRay ? &WriteFlexRayLog
+                                             : &WriteCanLog;
   OpenLogFile(session.log(), kCanTextLogHeader);
   if (!session.log().isOpen()) state.SkipWithError("the log could not be opened");
   for (auto _ : state) writer(session.log(), batch.data(), bytes, kFramesPerBatch);

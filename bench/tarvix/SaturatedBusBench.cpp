@@ -40,10 +40,15 @@ void BM_SaturatedBusOneSecond(benchmark::State& state) {
       std::this_thread::sleep_for(std::chrono::milliseconds(1));
     }
   }
-  state.counters["frames_per_s"] = benchmark::Counter(static_cast<double>(frames), benchmark::Counter::kIsRate);
+  state.counters["frames_per_s"] =
+      benchmark::Counter(static_cast<double>(frames), benchmark::Counter::kIsRate);
   kxClear(s);
 }
-BENCHMARK(BM_SaturatedBusOneSecond)->Iterations(5)->Unit(benchmark::kMillisecond)->MeasureProcessCPUTime()->UseRealTime();
+BENCHMARK(BM_SaturatedBusOneSecond)
+    ->Iterations(5)
+    ->Unit(benchmark::kMillisecond)
+    ->MeasureProcessCPUTime()
+    ->UseRealTime();
 
 // Pure simulation cost per frame: one read after a pause catches up with everything the bus
 // carried in the meantime. "speedup" is bus time carried per unit of time spent simulating and
@@ -73,8 +78,10 @@ void BM_CatchUpPerFrame(benchmark::State& state) {
     bus += start - pauseStart;
   }
   state.counters["frames"] = static_cast<double>(frames);
-  state.counters["ns_per_frame"] = frames ? static_cast<double>(busy.count()) / static_cast<double>(frames) : 0;
-  state.counters["speedup"] = busy.count() ? static_cast<double>(bus.count()) / static_cast<double>(busy.count()) : 0;
+  state.counters["ns_per_frame"] =
+      frames ? static_cast<double>(busy.count()) / static_cast<double>(frames) : 0;
+  state.counters["speedup"] =
+      busy.count() ? static_cast<double>(bus.count()) / static_cast<double>(busy.count()) : 0;
   kxClear(s);
 }
 BENCHMARK(BM_CatchUpPerFrame)->Iterations(20)->Unit(benchmark::kMicrosecond);

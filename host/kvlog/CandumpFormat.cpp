@@ -24,12 +24,17 @@ Kind KindOf(const RawFrameView& f) {
   const bool whole = f.payloadLength == length;
   switch (f.header.type) {
     case 0x00:
-    case nKV_DLL300::kFrameTypeJ1939: return whole && length <= kClassicMax ? Kind::kData : Kind::kNone;
-    case 0x01: return Kind::kRemote;
-    case 0x02: return Kind::kBusError;
+    case nKV_DLL300::kFrameTypeJ1939:
+      return whole && length <= kClassicMax ? Kind::kData : Kind::kNone;
+    case 0x01:
+      return Kind::kRemote;
+    case 0x02:
+      return Kind::kBusError;
     case 0x10:
-    case 0x18: return whole && length <= kFdMax ? Kind::kFd : Kind::kNone;
-    default: return Kind::kNone;
+    case 0x18:
+      return whole && length <= kFdMax ? Kind::kFd : Kind::kNone;
+    default:
+      return Kind::kNone;
   }
 }
 
@@ -44,12 +49,14 @@ char* AppendHexUpper(char* p, const uint8_t* bytes, uint32_t count) {
 
 char* AppendIdentifier(char* p, uint32_t identifier) {
   const bool extended = (identifier & kExtendedFlag) != 0;
-  return p + std::sprintf(p, extended ? "%08X" : "%03X", identifier & (extended ? 0x1FFF'FFFFu : 0x7FFu));
+  return p + std::sprintf(p, extended ? "%08X" : "%03X",
+                          identifier & (extended ? 0x1FFF'FFFFu : 0x7FFu));
 }
 
 char* AppendTime(char* p, uint64_t fileTime) {
-  const uint64_t micros =
-      fileTime < nKV_DLL300::kFileTimeUnixEpoch ? 0 : (fileTime - nKV_DLL300::kFileTimeUnixEpoch) / 10;
+  const uint64_t micros = fileTime < nKV_DLL300::kFileTimeUnixEpoch
+                              ? 0
+                              : (fileTime - nKV_DLL300::kFileTimeUnixEpoch) / 10;
   return p + std::sprintf(p, "(%llu.%06llu) ", static_cast<unsigned long long>(micros / 1'000'000),
                           static_cast<unsigned long long>(micros % 1'000'000));
 }
@@ -82,9 +89,11 @@ bool IsValidInterfaceName(std::string_view name) {
   return true;
 }
 
-size_t FormatCandumpLine(char* out, size_t cap, const RawFrameView& frame, std::string_view interfaceName) {
+size_t FormatCandumpLine(char* out, size_t cap, const RawFrameView& frame,
+                         std::string_view interfaceName) {
   const Kind kind = KindOf(frame);
-  if (kind == Kind::kNone || cap < kCandumpLineCapacity || !IsValidInterfaceName(interfaceName)) return 0;
+  if (kind == Kind::kNone || cap < kCandumpLineCapacity || !IsValidInterfaceName(interfaceName))
+    return 0;
   char* p = AppendTime(out, frame.header.timestamp);
   std::memcpy(p, interfaceName.data(), interfaceName.size());
   p += interfaceName.size();

@@ -21,9 +21,9 @@ namespace kvlog {
 inline constexpr size_t kMaxInterfaceName = 32;
 inline constexpr size_t kCandumpLineCapacity = 64 + kMaxInterfaceName + 2 * 64;
 
-// Writes the line of one CAN frame and returns its length, or 0 (nothing written) when the frame has
-// no form in this format: a J1939 or classic payload over 8 bytes, an FD payload over 64 bytes, a
-// payload the record does not hold whole, a type that is not CAN, or a `cap` below
+// Writes the line of one CAN frame and returns its length, or 0 (nothing written) when the frame
+// has no form in this format: a J1939 or classic payload over 8 bytes, an FD payload over 64 bytes,
+// a payload the record does not hold whole, a type that is not CAN, or a `cap` below
 // kCandumpLineCapacity. Time stamps before 1970 are written as 0.
 size_t FormatCandumpLine(char* out, size_t cap, const nKV_DLL300::RawFrameView& frame,
                          std::string_view interfaceName);

@@ -33,7 +33,8 @@ const char kUsage[] =
     "\n"
     "Converts the controller's logs: binary logs (.zfl) and measurement-data files (.vora) to the\n"
     "lines of the controller's text log, and CAN logs to the candump -l format that can-utils\n"
-    "(canplayer, log2asc) and python-can (can.LogReader) read. A binary log does not name its bus:\n"
+    "(canplayer, log2asc) and python-can (can.LogReader) read. A binary log does not name its "
+    "bus:\n"
     "give it with --bus. Measurement-data channels name theirs.\n"
     "\n"
     "Options:\n"
@@ -70,8 +71,8 @@ void ReportTrailing(uint64_t bytes, std::FILE* err) {
   }
 }
 
-int ConvertRecords(const uint8_t* records, size_t size, RecordBus bus, const ConvertOptions& options,
-                   std::FILE* out, std::FILE* err) {
+int ConvertRecords(const uint8_t* records, size_t size, RecordBus bus,
+                   const ConvertOptions& options, std::FILE* out, std::FILE* err) {
   if (options.format == OutputFormat::kText) {
     const auto result = voradump::WriteTextLog(records, size, bus, options.decode, out);
     ReportTrailing(result.trailingBytes, err);
@@ -85,13 +86,16 @@ int ConvertRecords(const uint8_t* records, size_t size, RecordBus bus, const Con
   const auto result = WriteCandumpLog(records, size, layout, options.interfaceName, out);
   ReportTrailing(result.trailingBytes, err);
   if (result.skipped > 0) {
-    std::fprintf(err, "kvlog: %llu frames have no candump form (J1939 payloads over 8 bytes) and were left out\n",
-                 static_cast<unsigned long long>(result.skipped));
+    std::fprintf(
+        err,
+        "kvlog: %llu frames have no candump form (J1939 payloads over 8 bytes) and were left out\n",
+        static_cast<unsigned long long>(result.skipped));
   }
   return result.writeFailed ? 1 : 0;
 }
 
-int ConvertMeasurementFile(const std::string& path, const ConvertOptions& options, std::FILE* out, std::FILE* err) {
+int ConvertMeasurementFile(const std::string& path, const ConvertOptions& options, std::FILE* out,
+                           std::FILE* err) {
   voradump::DumpSelection selection;
   selection.decode = true;
   selection.group = options.group;
@@ -99,7 +103,8 @@ int ConvertMeasurementFile(const std::string& path, const ConvertOptions& option
   selection.channel = options.channel;
   selection.hasChannel = options.hasChannel;
   selection.options = options.decode;
-  if (options.format == OutputFormat::kText) return voradump::DumpVoraFile(path, selection, out, err);
+  if (options.format == OutputFormat::kText)
+    return voradump::DumpVoraFile(path, selection, out, err);
 
   std::string error;
   const auto reader = voradump::VoraReader::Open(path, error);
@@ -112,13 +117,15 @@ int ConvertMeasurementFile(const std::string& path, const ConvertOptions& option
   for (const auto& group : reader->Groups()) {
     for (const auto& channel : group.channels) {
       const auto protocol = channel.IntegerProperty("QV_network_protocol");
-      if ((options.hasGroup && group.name != options.group) || (options.hasChannel && channel.name != options.channel) ||
-          !protocol || voradump::BusOfProtocol(*protocol) != RecordBus::kCan) {
+      if ((options.hasGroup && group.name != options.group) ||
+          (options.hasChannel && channel.name != options.channel) || !protocol ||
+          voradump::BusOfProtocol(*protocol) != RecordBus::kCan) {
         continue;
       }
       std::vector<uint8_t> bytes;
       if (!reader->ReadBytes(channel, bytes)) return 1;
-      status = std::max(status, ConvertRecords(bytes.data(), bytes.size(), RecordBus::kCan, options, out, err));
+      status = std::max(
+          status, ConvertRecords(bytes.data(), bytes.size(), RecordBus::kCan, options, out, err));
       ++converted;
     }
   }
@@ -155,31 +162,37 @@ CandumpResult WriteCandumpLog(const uint8_t* records, size_t size, BinaryRecordL
   return result;
 }
 
-int ConvertBinaryLog(const std::vector<uint8_t>& file, const ConvertOptions& options, std::FILE* out,
-                     std::FILE* err) {
+int ConvertBinaryLog(const std::vector<uint8_t>& file, const ConvertOptions& options,
+                     std::FILE* out, std::FILE* err) {
   if (file.size() < kBinaryLogFileHeaderSize || !HasBinaryLogMagic(file.data(), file.size())) {
-    std::fprintf(err, "kvlog: not a binary log: it does not begin with the 12-byte \"QV\" file header\n");
+    std::fprintf(
+        err, "kvlog: not a binary log: it does not begin with the 12-byte \"QV\" file header\n");
     return 1;
   }
   if (!options.bus) {
-    std::fprintf(err, "kvlog: a binary log does not name its bus: give --bus can, lin or flexray\n");
+    std::fprintf(err,
+                 "kvlog: a binary log does not name its bus: give --bus can, lin or flexray\n");
     return 2;
   }
-  return ConvertRecords(file.data() + kBinaryLogFileHeaderSize, file.size() - kBinaryLogFileHeaderSize,
-                        *options.bus, options, out, err);
+  return ConvertRecords(file.data() + kBinaryLogFileHeaderSize,
+                        file.size() - kBinaryLogFileHeaderSize, *options.bus, options, out, err);
 }
 
 namespace {
 
 bool ParseOptions(int argc, char** argv, ConvertOptions& options, std::string& output, bool& help) {
   enum { kCandump = 256, kLinChecksum, kCanRecords };
-  static const option kOptions[] = {
-      {"bus", required_argument, nullptr, 'b'},       {"format", required_argument, nullptr, 'f'},
-      {"candump", no_argument, nullptr, kCandump},    {"interface", required_argument, nullptr, 'i'},
-      {"output", required_argument, nullptr, 'o'},    {"group", required_argument, nullptr, 'g'},
-      {"channel", required_argument, nullptr, 'c'},   {"lin-checksum", no_argument, nullptr, kLinChecksum},
-      {"can-records", required_argument, nullptr, kCanRecords}, {"help", no_argument, nullptr, 'h'},
-      {nullptr, 0, nullptr, 0}};
+  static const option kOptions[] = {{"bus", required_argument, nullptr, 'b'},
+                                    {"format", required_argument, nullptr, 'f'},
+                                    {"candump", no_argument, nullptr, kCandump},
+                                    {"interface", required_argument, nullptr, 'i'},
+                                    {"output", required_argument, nullptr, 'o'},
+                                    {"group", required_argument, nullptr, 'g'},
+                                    {"channel", required_argument, nullptr, 'c'},
+                                    {"lin-checksum", no_argument, nullptr, kLinChecksum},
+                                    {"can-records", required_argument, nullptr, kCanRecords},
+                                    {"help", no_argument, nullptr, 'h'},
+                                    {nullptr, 0, nullptr, 0}};
   optind = 1;
   for (int opt; (opt = getopt_long(argc, argv, "b:f:i:o:g:c:h", kOptions, nullptr)) != -1;) {
     switch (opt) {
@@ -188,27 +201,49 @@ bool ParseOptions(int argc, char** argv, ConvertOptions& options, std::string& o
         if (!options.bus) return false;
         break;
       case 'f':
-        if (std::strcmp(optarg, "text") == 0) options.format = OutputFormat::kText;
-        else if (std::strcmp(optarg, "candump") == 0) options.format = OutputFormat::kCandump;
-        else return false;
+        if (std::strcmp(optarg, "text") == 0)
+          options.format = OutputFormat::kText;
+        else if (std::strcmp(optarg, "candump") == 0)
+          options.format = OutputFormat::kCandump;
+        else
+          return false;
         break;
-      case kCandump: options.format = OutputFormat::kCandump; break;
+      case kCandump:
+        options.format = OutputFormat::kCandump;
+        break;
       case 'i':
         options.interfaceName = optarg;
         if (!IsValidInterfaceName(options.interfaceName)) return false;
         break;
-      case 'o': output = optarg; break;
-      case 'g': options.group = optarg; options.hasGroup = true; break;
-      case 'c': options.channel = optarg; options.hasChannel = true; break;
-      case kLinChecksum: options.decode.linChecksum = 1; break;
-      case kCanRecords:
-        if (std::strcmp(optarg, "auto") == 0) options.decode.canRecords = voradump::CanRecords::kAuto;
-        else if (std::strcmp(optarg, "fixed") == 0) options.decode.canRecords = voradump::CanRecords::kFixed;
-        else if (std::strcmp(optarg, "variable") == 0) options.decode.canRecords = voradump::CanRecords::kVariable;
-        else return false;
+      case 'o':
+        output = optarg;
         break;
-      case 'h': help = true; return true;
-      default: return false;
+      case 'g':
+        options.group = optarg;
+        options.hasGroup = true;
+        break;
+      case 'c':
+        options.channel = optarg;
+        options.hasChannel = true;
+        break;
+      case kLinChecksum:
+        options.decode.linChecksum = 1;
+        break;
+      case kCanRecords:
+        if (std::strcmp(optarg, "auto") == 0)
+          options.decode.canRecords = voradump::CanRecords::kAuto;
+        else if (std::strcmp(optarg, "fixed") == 0)
+          options.decode.canRecords = voradump::CanRecords::kFixed;
+        else if (std::strcmp(optarg, "variable") == 0)
+          options.decode.canRecords = voradump::CanRecords::kVariable;
+        else
+          return false;
+        break;
+      case 'h':
+        help = true;
+        return true;
+      default:
+        return false;
     }
   }
   return optind + 1 == argc;

@@ -30,12 +30,13 @@ struct CandumpResult {
 };
 
 // Writes CAN records of `layout` as candump lines.
-CandumpResult WriteCandumpLog(const uint8_t* records, size_t size, nKV_DLL300::BinaryRecordLayout layout,
+CandumpResult WriteCandumpLog(const uint8_t* records, size_t size,
+                              nKV_DLL300::BinaryRecordLayout layout,
                               const std::string& interfaceName, std::FILE* out);
 
 // Converts one binary log (file header and records) held in `file`. Returns the exit code.
-int ConvertBinaryLog(const std::vector<uint8_t>& file, const ConvertOptions& options, std::FILE* out,
-                     std::FILE* err);
+int ConvertBinaryLog(const std::vector<uint8_t>& file, const ConvertOptions& options,
+                     std::FILE* out, std::FILE* err);
 
 // The command line of kvlog. Returns the exit code: 0 done, 1 a file problem, 2 a usage error.
 int RunKvlog(int argc, char** argv);

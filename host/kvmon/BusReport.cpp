@@ -54,8 +54,9 @@ BusReport LinReport(const kvhost::LinStatisticsView& s) {
                    {"no-resp", s.noResponseFramesPerSecond, s.noResponseFrames},
                    {"error", s.errorFramesPerSecond, s.errorFrames}};
   report.faultCode = s.faultCode;
-  report.state = {Words("state", "", s.stateBit31 ? "stopped" : Word(kActivity, 3, s.stateBits2to3)),
-                  Words("last_error", "last error", Word(kErrors, 3, s.stateBits4to7))};
+  report.state = {
+      Words("state", "", s.stateBit31 ? "stopped" : Word(kActivity, 3, s.stateBits2to3)),
+      Words("last_error", "last error", Word(kErrors, 3, s.stateBits4to7))};
   if (s.stateBits4to7 != 0) {
     char id[8];
     std::snprintf(id, sizeof id, "%02X", s.stateBits8to15);
@@ -73,11 +74,12 @@ std::string ChannelsText(uint32_t word) {
 }
 
 BusReport FlexRayReport(const kvhost::FlexRayStatisticsView& s) {
-  static const char* const kStates[] = {"config", "code 1", "normal active", "code 3", "code 4",
-                                        "code 5", "startup"};
+  static const char* const kStates[] = {"config", "code 1", "normal active", "code 3",
+                                        "code 4", "code 5", "startup"};
   BusReport report;
   report.bus = Bus::kFlexRay;
-  report.frames = {{"data", s.dataFramesPerSecond, s.dataFrames}, {"null", s.nullFramesPerSecond, s.nullFrames}};
+  report.frames = {{"data", s.dataFramesPerSecond, s.dataFrames},
+                   {"null", s.nullFramesPerSecond, s.nullFrames}};
   report.faultCode = s.faultCode;
   report.state = {Words("state", "", Word(kStates, 7, s.stateBits0to3)),
                   Number("sync_frames", "sync frames", s.stateBits8to12),

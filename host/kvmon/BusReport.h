@@ -12,7 +12,7 @@
 namespace kvmon {
 
 struct NamedCount {
-  std::string name;   // "standard", "extended", "remote", "error", "data", "null", "no-resp"
+  std::string name;  // "standard", "extended", "remote", "error", "data", "null", "no-resp"
   uint32_t perSecond = 0;
   uint32_t total = 0;
 };
@@ -30,7 +30,7 @@ struct BusReport {
   std::optional<uint32_t> busLoad;   // 0.01 % units (CAN only)
   std::optional<uint32_t> peakLoad;  // 0.01 % units (CAN only)
   uint32_t faultCode = 0;
-  std::vector<NamedValue> state;     // the state word decoded, most important first
+  std::vector<NamedValue> state;  // the state word decoded, most important first
 };
 
 // nullopt when the payload is none of the three statistics blocks.

@@ -27,20 +27,24 @@ bool IsReply(const kvhost::HostMessage& message, ControllerLink::Reply reply) {
   if (type == kvhost::kErrorText) {
     const auto& p = message.payload;
     return !(p.size() >= kLogErrorPrefix.size() &&
-             std::string_view(reinterpret_cast<const char*>(p.data()), kLogErrorPrefix.size()) == kLogErrorPrefix);
+             std::string_view(reinterpret_cast<const char*>(p.data()), kLogErrorPrefix.size()) ==
+                 kLogErrorPrefix);
   }
-  return reply == ControllerLink::Reply::kText ? type == kvhost::kText : type == kvhost::kHardwareTable;
+  return reply == ControllerLink::Reply::kText ? type == kvhost::kText
+                                               : type == kvhost::kHardwareTable;
 }
 
-std::string Where(const std::string& host, uint16_t port) { return host + ":" + std::to_string(port); }
+std::string Where(const std::string& host, uint16_t port) {
+  return host + ":" + std::to_string(port);
+}
 
 }  // namespace
 
 ControllerLink::ControllerLink(kvhost::HostClient client)
     : client_(std::move(client)), lastHeartbeat_(Clock::now()) {}
 
-std::optional<ControllerLink> ControllerLink::Open(const std::string& host, uint16_t port, double waitSeconds,
-                                                   std::string& error) {
+std::optional<ControllerLink> ControllerLink::Open(const std::string& host, uint16_t port,
+                                                   double waitSeconds, std::string& error) {
   kvhost::HostClient client;
   const auto deadline = Clock::now() + std::chrono::duration_cast<Clock::duration>(
                                            std::chrono::duration<double>(waitSeconds));
@@ -51,14 +55,17 @@ std::optional<ControllerLink> ControllerLink::Open(const std::string& host, uint
               " (is it running? it listens 10 s after its start)";
       return std::nullopt;
     }
-    if (!announced) std::fprintf(stderr, "kvmon: waiting for the controller at %s to listen ...\n", Where(host, port).c_str());
+    if (!announced)
+      std::fprintf(stderr, "kvmon: waiting for the controller at %s to listen ...\n",
+                   Where(host, port).c_str());
     announced = true;
     std::this_thread::sleep_for(kConnectRetry);
   }
   auto greeting = client.Receive(kReplyDeadline);
   if (!greeting || greeting->text() != kGreeting) {
-    error = "the controller at " + Where(host, port) +
-            " sent no greeting (it serves at most eight hosts at once, or this is not a controller)";
+    error =
+        "the controller at " + Where(host, port) +
+        " sent no greeting (it serves at most eight hosts at once, or this is not a controller)";
     return std::nullopt;
   }
   return ControllerLink(std::move(client));
@@ -68,7 +75,8 @@ bool ControllerLink::SendAfterPause(const std::string& text, const MessageSink& 
   if (unansweredSince_) {
     const auto until = *unansweredSince_ + kCommandPause;
     while (Clock::now() < until) {
-      if (auto message = client_.Receive(std::chrono::duration_cast<std::chrono::milliseconds>(until - Clock::now()))) {
+      if (auto message = client_.Receive(
+              std::chrono::duration_cast<std::chrono::milliseconds>(until - Clock::now()))) {
         if (sink) sink(*message);
       } else if (client_.closed()) {
         break;
@@ -83,8 +91,8 @@ bool ControllerLink::SendAfterPause(const std::string& text, const MessageSink& 
   return true;
 }
 
-std::optional<kvhost::HostMessage> ControllerLink::Request(const std::string& command, const MessageSink& sink,
-                                                           Reply reply) {
+std::optional<kvhost::HostMessage> ControllerLink::Request(const std::string& command,
+                                                           const MessageSink& sink, Reply reply) {
   if (!SendAfterPause(command, sink)) return std::nullopt;
   const auto deadline = Clock::now() + kReplyDeadline;
   while (Clock::now() < deadline) {

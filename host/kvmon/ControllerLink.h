@@ -28,8 +28,8 @@ class ControllerLink {
 
   // Connects, retrying until `waitSeconds` passed (the controller listens 10 s after its start),
   // and receives the greeting. nullopt with `error` in plain words.
-  static std::optional<ControllerLink> Open(const std::string& host, uint16_t port, double waitSeconds,
-                                            std::string& error);
+  static std::optional<ControllerLink> Open(const std::string& host, uint16_t port,
+                                            double waitSeconds, std::string& error);
 
   enum class Reply : uint8_t { kText, kHardwareTable };
 

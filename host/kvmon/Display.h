@@ -16,7 +16,8 @@ class Display {
   virtual ~Display() = default;
   // One identifier-record message of `messageBytes` payload bytes: the controller's whole table,
   // or part of it when the table needs more than one message.
-  virtual void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, size_t messageBytes) = 0;
+  virtual void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
+                           size_t messageBytes) = 0;
   virtual void ShowStatistics(const BusReport& report) = 0;
   // Something the controller said during the session, in plain words.
   virtual void ShowNotice(const std::string& words) = 0;

@@ -9,7 +9,8 @@ namespace kvmon {
 namespace {
 
 constexpr uint32_t kExtendedBit = 0x20000000;
-constexpr uint64_t kUnixEpochIn1601Units = 116444736000000000ULL;  // 1970-01-01 in 100 ns since 1601
+constexpr uint64_t kUnixEpochIn1601Units =
+    116444736000000000ULL;  // 1970-01-01 in 100 ns since 1601
 constexpr size_t kCanStatisticsSize = 68, kLinStatisticsSize = 60, kFlexRayStatisticsSize = 72;
 
 struct TypeName {
@@ -19,9 +20,9 @@ struct TypeName {
 };
 
 constexpr TypeName kTypeNames[] = {
-    {Bus::kCan, 0x00, "data"},    {Bus::kCan, 0x01, "remote"},  {Bus::kCan, 0x02, "error"},
-    {Bus::kCan, 0x10, "fd"},      {Bus::kCan, 0x18, "fd-brs"},  {Bus::kCan, 0xC0, "j1939"},
-    {Bus::kLin, 0x40, "data"},    {Bus::kLin, 0x41, "error"},   {Bus::kLin, 0x42, "no-resp"},
+    {Bus::kCan, 0x00, "data"},     {Bus::kCan, 0x01, "remote"},   {Bus::kCan, 0x02, "error"},
+    {Bus::kCan, 0x10, "fd"},       {Bus::kCan, 0x18, "fd-brs"},   {Bus::kCan, 0xC0, "j1939"},
+    {Bus::kLin, 0x40, "data"},     {Bus::kLin, 0x41, "error"},    {Bus::kLin, 0x42, "no-resp"},
     {Bus::kFlexRay, 0x20, "data"}, {Bus::kFlexRay, 0x21, "null"},
 };
 
@@ -29,19 +30,27 @@ constexpr TypeName kTypeNames[] = {
 
 std::optional<Bus> BusOfRecordType(uint8_t messageType) {
   switch (messageType) {
-    case kvhost::kCanRecords: return Bus::kCan;
-    case kvhost::kLinRecords: return Bus::kLin;
-    case kvhost::kFlexRayRecords: return Bus::kFlexRay;
-    default: return std::nullopt;
+    case kvhost::kCanRecords:
+      return Bus::kCan;
+    case kvhost::kLinRecords:
+      return Bus::kLin;
+    case kvhost::kFlexRayRecords:
+      return Bus::kFlexRay;
+    default:
+      return std::nullopt;
   }
 }
 
 std::optional<Bus> BusOfStatistics(size_t payloadSize) {
   switch (payloadSize) {
-    case kCanStatisticsSize: return Bus::kCan;
-    case kLinStatisticsSize: return Bus::kLin;
-    case kFlexRayStatisticsSize: return Bus::kFlexRay;
-    default: return std::nullopt;
+    case kCanStatisticsSize:
+      return Bus::kCan;
+    case kLinStatisticsSize:
+      return Bus::kLin;
+    case kFlexRayStatisticsSize:
+      return Bus::kFlexRay;
+    default:
+      return std::nullopt;
   }
 }
 
@@ -54,9 +63,12 @@ std::optional<Bus> BusOfInterface(const std::string& name) {
 
 const char* BusName(Bus bus) {
   switch (bus) {
-    case Bus::kCan: return "CAN";
-    case Bus::kLin: return "LIN";
-    case Bus::kFlexRay: return "FlexRay";
+    case Bus::kCan:
+      return "CAN";
+    case Bus::kLin:
+      return "LIN";
+    case Bus::kFlexRay:
+      return "FlexRay";
   }
   return "?";
 }
@@ -98,9 +110,11 @@ std::optional<double> PeriodMs(const kvhost::IdentifierRecord& record) {
 }
 
 std::string UnixTimeText(uint64_t timestamp) {
-  const uint64_t since1970 = timestamp < kUnixEpochIn1601Units ? 0 : timestamp - kUnixEpochIn1601Units;
+  const uint64_t since1970 =
+      timestamp < kUnixEpochIn1601Units ? 0 : timestamp - kUnixEpochIn1601Units;
   char text[40];
-  std::snprintf(text, sizeof text, "%llu.%06llu", static_cast<unsigned long long>(since1970 / 10000000),
+  std::snprintf(text, sizeof text, "%llu.%06llu",
+                static_cast<unsigned long long>(since1970 / 10000000),
                 static_cast<unsigned long long>(since1970 % 10000000 / 10));
   return text;
 }
@@ -118,9 +132,12 @@ std::string HexBytes(const std::vector<uint8_t>& bytes, const char* separator) {
 
 RowKey KeyOf(Bus bus, const kvhost::IdentifierRecord& record) {
   switch (bus) {
-    case Bus::kCan: return {record.identifier, record.type};
-    case Bus::kLin: return {record.identifier, 0};
-    case Bus::kFlexRay: return {record.identifier, record.channel};
+    case Bus::kCan:
+      return {record.identifier, record.type};
+    case Bus::kLin:
+      return {record.identifier, 0};
+    case Bus::kFlexRay:
+      return {record.identifier, record.channel};
   }
   return {record.identifier, 0};
 }

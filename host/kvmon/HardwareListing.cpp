@@ -17,21 +17,27 @@ const char* CanFdText(const kvhost::HardwareEntry& entry) {
 
 std::string ProtocolName(uint32_t protocol) {
   switch (protocol) {
-    case 0: return "CAN";
-    case 1: return "FlexRay";
-    case 2: return "LIN";
-    default: return std::to_string(protocol);
+    case 0:
+      return "CAN";
+    case 1:
+      return "FlexRay";
+    case 2:
+      return "LIN";
+    default:
+      return std::to_string(protocol);
   }
 }
 
-void PrintHardwareTable(const std::vector<kvhost::HardwareEntry>& entries, const kvhost::MessageHeaderView& header,
-                        const std::string& controller, std::FILE* out) {
-  std::fprintf(out, "Controller %s, driver version %u.%u.%u.%u, %zu interfaces\n\n", controller.c_str(),
-               header.version[0], header.version[1], header.version[2], header.version[3], entries.size());
+void PrintHardwareTable(const std::vector<kvhost::HardwareEntry>& entries,
+                        const kvhost::MessageHeaderView& header, const std::string& controller,
+                        std::FILE* out) {
+  std::fprintf(out, "Controller %s, driver version %u.%u.%u.%u, %zu interfaces\n\n",
+               controller.c_str(), header.version[0], header.version[1], header.version[2],
+               header.version[3], entries.size());
   std::fprintf(out, "%-16s %5s  %-8s %s\n", "Interface", "Port", "Bus", "CAN FD");
   for (const auto& entry : entries) {
-    std::fprintf(out, "%-16s %5u  %-8s %s\n", entry.name.c_str(), entry.port, ProtocolName(entry.protocol).c_str(),
-                 CanFdText(entry));
+    std::fprintf(out, "%-16s %5u  %-8s %s\n", entry.name.c_str(), entry.port,
+                 ProtocolName(entry.protocol).c_str(), CanFdText(entry));
   }
 }
 

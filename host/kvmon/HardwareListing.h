@@ -13,10 +13,12 @@ namespace kvmon {
 std::string ProtocolName(uint32_t protocol);
 
 // The table with a title line naming `controller` and the driver version of `header`.
-void PrintHardwareTable(const std::vector<kvhost::HardwareEntry>& entries, const kvhost::MessageHeaderView& header,
-                        const std::string& controller, std::FILE* out);
+void PrintHardwareTable(const std::vector<kvhost::HardwareEntry>& entries,
+                        const kvhost::MessageHeaderView& header, const std::string& controller,
+                        std::FILE* out);
 
-// One JSON object per interface: {"interface":"CAN1","port":1,"protocol":0,"bus":"CAN","can_fd":false}.
+// One JSON object per interface:
+// {"interface":"CAN1","port":1,"protocol":0,"bus":"CAN","can_fd":false}.
 void PrintHardwareJson(const std::vector<kvhost::HardwareEntry>& entries, std::FILE* out);
 
 }  // namespace kvmon

@@ -1,4 +1,5 @@
-// kvmon's machine format: one JSON object per line for each identifier record and statistics report.
+// kvmon's machine format: one JSON object per line for each identifier record and statistics
+// report.
 #pragma once
 
 #include <cstdio>
@@ -20,12 +21,14 @@ class JsonLines : public Display {
   JsonLines(std::string interfaceName, std::FILE* out, std::FILE* err)
       : interfaceName_(std::move(interfaceName)), out_(out), err_(err) {}
 
-  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, size_t messageBytes) override;
+  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
+                   size_t messageBytes) override;
   void ShowStatistics(const BusReport& report) override;
   void ShowNotice(const std::string& words) override;
   bool failed() const override { return failed_; }
 
-  static std::string RecordObject(const std::string& interfaceName, Bus bus, const kvhost::IdentifierRecord& record);
+  static std::string RecordObject(const std::string& interfaceName, Bus bus,
+                                  const kvhost::IdentifierRecord& record);
   static std::string StatisticsObject(const std::string& interfaceName, const BusReport& report);
 
  private:

@@ -67,7 +67,8 @@ const char kUsage[] =
     "      --transceiver N       transceiver type (0 to 4)\n"
     "      --key-slot N          FlexRay key slot\n"
     "      --data-period MS      identifier reports every MS milliseconds (controller: 1000)\n"
-    "      --stats-period MS     statistics every MS milliseconds, 1000 or more (controller: 1000)\n"
+    "      --stats-period MS     statistics every MS milliseconds, 1000 or more (controller: "
+    "1000)\n"
     "      --table-size N        identifiers the controller keeps (controller: 1000)\n"
     "\n"
     "Logging on the controller:\n"
@@ -78,7 +79,8 @@ const char kUsage[] =
     "      --log-checksum        LIN text logs: checksum column\n"
     "\n"
     "Transmit (CAN):\n"
-    "  -t, --tx FRAME            send FRAME once: 123#DEADBEEF, 18FEF100#0011 (extended: more than\n"
+    "  -t, --tx FRAME            send FRAME once: 123#DEADBEEF, 18FEF100#0011 (extended: more "
+    "than\n"
     "                            three hex digits), 123#R or 123#R4 (remote), 123##1AABB (CAN FD;\n"
     "                            flag 1: bit-rate switching)\n"
     "      --tx-every MS         send the --tx frame every MS milliseconds instead\n"
@@ -89,9 +91,31 @@ const char kUsage[] =
     "failed, 2 a usage error.\n";
 
 enum LongOnly : int {
-  kHardware = 1000, kLines, kFdBaud, kIoMode, kIsoFd, kAlias, kCluster, kJ1939, kNodeAddress,
-  kNodeName, kListenOnly, kBusErrors, kEcho, kNullFrames, kNoResponse, kTermination, kTransceiver,
-  kKeySlot, kDataPeriod, kStatsPeriod, kTableSize, kLogName, kLogGroup, kLogChannel, kLogChecksum,
+  kHardware = 1000,
+  kLines,
+  kFdBaud,
+  kIoMode,
+  kIsoFd,
+  kAlias,
+  kCluster,
+  kJ1939,
+  kNodeAddress,
+  kNodeName,
+  kListenOnly,
+  kBusErrors,
+  kEcho,
+  kNullFrames,
+  kNoResponse,
+  kTermination,
+  kTransceiver,
+  kKeySlot,
+  kDataPeriod,
+  kStatsPeriod,
+  kTableSize,
+  kLogName,
+  kLogGroup,
+  kLogChannel,
+  kLogChecksum,
   kTxEvery,
 };
 
@@ -144,7 +168,8 @@ struct Collected {
 
 // Reads a whole unsigned number, decimal or 0x hexadecimal, no larger than `max`.
 bool ReadUnsigned(const char* text, uint64_t max, uint64_t& value) {
-  if (text == nullptr || *text == '\0' || *text == '-' || std::isspace(static_cast<unsigned char>(*text))) {
+  if (text == nullptr || *text == '\0' || *text == '-' ||
+      std::isspace(static_cast<unsigned char>(*text))) {
     return false;
   }
   errno = 0;
@@ -177,14 +202,16 @@ bool AddNumber(Collected& c, std::FILE* err, const char* option, const char* pro
                const char* text, uint64_t min, uint64_t max) {
   uint64_t value = 0;
   if (!ReadUnsigned(text, max, value) || value < min) {
-    return Fail(err, std::string("--") + option + ": '" + (text ? text : "") + "' is not a number from " +
-                         std::to_string(min) + " to " + std::to_string(max));
+    return Fail(err, std::string("--") + option + ": '" + (text ? text : "") +
+                         "' is not a number from " + std::to_string(min) + " to " +
+                         std::to_string(max));
   }
   c.properties.push_back(std::string(property) + "=" + std::to_string(value));
   return true;
 }
 
-bool AddText(Collected& c, std::FILE* err, const char* option, const char* property, const char* text) {
+bool AddText(Collected& c, std::FILE* err, const char* option, const char* property,
+             const char* text) {
   const std::string value = text ? text : "";
   if (value.empty() || value.size() > 200) {
     return Fail(err, std::string("--") + option + " needs a name of 1 to 200 characters");
@@ -206,7 +233,10 @@ bool AddIoMode(Collected& c, std::FILE* err, const char* text) {
 
 bool AddLogType(Collected& c, std::FILE* err, const char* text) {
   const std::string type = Lower(text ? text : "");
-  const char* value = type == "text" ? "0" : type == "binary" ? "1" : type == "vora" ? "2" : nullptr;
+  const char* value = type == "text"     ? "0"
+                      : type == "binary" ? "1"
+                      : type == "vora"   ? "2"
+                                         : nullptr;
   if (value == nullptr) return Fail(err, "--log: '" + type + "' is not text, binary or vora");
   c.properties.push_back("SET_PROP_LOGFILE=1");
   c.properties.push_back(std::string("SET_PROP_LOGFILE_TYPE=") + value);
@@ -246,13 +276,15 @@ bool SetTransmit(Options& options, std::FILE* err, const char* text) {
 
 bool SetCount(std::FILE* err, const char* text, std::optional<uint64_t>& target) {
   uint64_t value = 0;
-  if (!ReadUnsigned(text, UINT32_MAX, value) || value == 0) return Fail(err, "--messages needs a count of 1 or more");
+  if (!ReadUnsigned(text, UINT32_MAX, value) || value == 0)
+    return Fail(err, "--messages needs a count of 1 or more");
   target = value;
   return true;
 }
 
 bool SetSeconds(std::FILE* err, const char* option, const char* text, double& target) {
-  if (!ReadPositiveNumber(text, target)) return Fail(err, std::string("--") + option + " needs a number of seconds above 0");
+  if (!ReadPositiveNumber(text, target))
+    return Fail(err, std::string("--") + option + " needs a number of seconds above 0");
   return true;
 }
 
@@ -262,10 +294,14 @@ struct FlagOption {
   const char* property;
 };
 constexpr FlagOption kFlagOptions[] = {
-    {kJ1939, "SET_PROP_SESSION_APPLICATION_PROTOCOL"},  {kListenOnly, "SET_PROP_SESSION_LISTEN_ONLY"},
-    {kBusErrors, "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES"}, {kEcho, "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES"},
-    {kNullFrames, "SET_PROP_SESSION_SHOW_NULL_FRAMES"},    {kNoResponse, "SET_PROP_SESSION_NO_RESPONSE_FRAMES"},
-    {kTermination, "SET_PROP_SESSION_TERMINATION"},        {kLogChecksum, "SET_PROP_SESSION_LOG_CHECKSUM"},
+    {kJ1939, "SET_PROP_SESSION_APPLICATION_PROTOCOL"},
+    {kListenOnly, "SET_PROP_SESSION_LISTEN_ONLY"},
+    {kBusErrors, "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES"},
+    {kEcho, "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES"},
+    {kNullFrames, "SET_PROP_SESSION_SHOW_NULL_FRAMES"},
+    {kNoResponse, "SET_PROP_SESSION_NO_RESPONSE_FRAMES"},
+    {kTermination, "SET_PROP_SESSION_TERMINATION"},
+    {kLogChecksum, "SET_PROP_SESSION_LOG_CHECKSUM"},
 };
 
 // Session options with a number, checked against the range the controller accepts.
@@ -325,34 +361,59 @@ bool ApplySessionOption(int code, const char* arg, Collected& c, std::FILE* err)
 }
 
 // Connection, output and transmit options; nullopt when `code` is a session option.
-std::optional<bool> ApplyToolOption(int code, const char* arg, Options& options, Collected& c, std::FILE* err) {
+std::optional<bool> ApplyToolOption(int code, const char* arg, Options& options, Collected& c,
+                                    std::FILE* err) {
   double seconds = 0;
   switch (code) {
-    case 'c': return SetController(options, err, arg ? arg : "");
-    case 'w': if (!SetSeconds(err, "wait", arg, seconds)) return false; options.waitSeconds = seconds; return true;
-    case kHardware: options.hardware = true; return true;
-    case 'j': options.output = OutputMode::kJson; return true;
-    case kLines: options.output = OutputMode::kPlain; return true;
-    case 'd': if (!SetSeconds(err, "duration", arg, seconds)) return false; options.durationSeconds = seconds; return true;
-    case 'n': return SetCount(err, arg, options.recordMessages);
-    case 't': return SetTransmit(options, err, arg);
-    case kTxEvery: if (!SetSeconds(err, "tx-every", arg, seconds)) return false; c.txEveryMs = seconds; return true;
-    case 'h': options.help = true; return true;
-    default: return std::nullopt;
+    case 'c':
+      return SetController(options, err, arg ? arg : "");
+    case 'w':
+      if (!SetSeconds(err, "wait", arg, seconds)) return false;
+      options.waitSeconds = seconds;
+      return true;
+    case kHardware:
+      options.hardware = true;
+      return true;
+    case 'j':
+      options.output = OutputMode::kJson;
+      return true;
+    case kLines:
+      options.output = OutputMode::kPlain;
+      return true;
+    case 'd':
+      if (!SetSeconds(err, "duration", arg, seconds)) return false;
+      options.durationSeconds = seconds;
+      return true;
+    case 'n':
+      return SetCount(err, arg, options.recordMessages);
+    case 't':
+      return SetTransmit(options, err, arg);
+    case kTxEvery:
+      if (!SetSeconds(err, "tx-every", arg, seconds)) return false;
+      c.txEveryMs = seconds;
+      return true;
+    case 'h':
+      options.help = true;
+      return true;
+    default:
+      return std::nullopt;
   }
 }
 
 // The run mode and port name go first; the rest keep the order of the command line.
 bool Finish(Options& options, Collected& c, std::FILE* err) {
   if (options.hardware) return true;
-  if (options.interfaceName.empty()) return Fail(err, "name the interface to watch, for example CAN1");
-  if (options.interfaceName.size() > 64 || options.interfaceName.find_first_of("= \t\r\n") != std::string::npos) {
+  if (options.interfaceName.empty())
+    return Fail(err, "name the interface to watch, for example CAN1");
+  if (options.interfaceName.size() > 64 ||
+      options.interfaceName.find_first_of("= \t\r\n") != std::string::npos) {
     return Fail(err, "'" + options.interfaceName + "' is not an interface name");
   }
   if (c.runMode.empty() && !c.alias.empty() && !c.cluster.empty()) c.runMode = "NORMAL";
   if (c.txEveryMs && !options.transmit) return Fail(err, "--tx-every needs a --tx frame");
   if (options.transmit) {
-    if (options.interfaceName.rfind("CAN", 0) != 0) return Fail(err, "--tx sends on CAN interfaces only");
+    if (options.interfaceName.rfind("CAN", 0) != 0)
+      return Fail(err, "--tx sends on CAN interfaces only");
     options.transmit->periodMs = c.txEveryMs;
   }
   options.properties.push_back("SET_PROP_SESSION_PORTNAME=" + options.interfaceName);
@@ -370,7 +431,8 @@ ParseResult ParseOptions(int argc, char** argv, Options& options, std::FILE* err
   int code = 0;
   while ((code = getopt_long(argc, argv, "c:w:jd:n:m:b:l:t:h", kLongOptions, nullptr)) != -1) {
     if (code == '?' || code == ':') {
-      const std::string name = optopt != 0 ? std::string("-") + static_cast<char>(optopt) : std::string(argv[optind - 1]);
+      const std::string name = optopt != 0 ? std::string("-") + static_cast<char>(optopt)
+                                           : std::string(argv[optind - 1]);
       Fail(err, "unknown option or missing value: " + name);
       return ParseResult::kUsageError;
     }

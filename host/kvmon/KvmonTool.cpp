@@ -40,7 +40,8 @@ void InstallSignals() {
 
 TerminalSize QueryTerminalSize() {
   winsize size{};
-  if (ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) != 0 || size.ws_col == 0 || size.ws_row == 0) return {};
+  if (ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) != 0 || size.ws_col == 0 || size.ws_row == 0)
+    return {};
   return TerminalSize{size.ws_col, size.ws_row};
 }
 
@@ -50,16 +51,20 @@ std::string ControllerText(const Options& options) {
 
 std::unique_ptr<Display> MakeDisplay(const Options& options) {
   OutputMode mode = options.output;
-  if (mode == OutputMode::kAuto) mode = isatty(STDOUT_FILENO) ? OutputMode::kTerminal : OutputMode::kPlain;
-  if (mode == OutputMode::kJson) return std::make_unique<JsonLines>(options.interfaceName, stdout, stderr);
-  if (mode == OutputMode::kPlain) return std::make_unique<PlainLines>(options.interfaceName, stdout, stderr);
+  if (mode == OutputMode::kAuto)
+    mode = isatty(STDOUT_FILENO) ? OutputMode::kTerminal : OutputMode::kPlain;
+  if (mode == OutputMode::kJson)
+    return std::make_unique<JsonLines>(options.interfaceName, stdout, stderr);
+  if (mode == OutputMode::kPlain)
+    return std::make_unique<PlainLines>(options.interfaceName, stdout, stderr);
   const Bus bus = BusOfInterface(options.interfaceName).value_or(Bus::kCan);
-  return std::make_unique<TerminalView>(bus, options.interfaceName + " on " + ControllerText(options), stdout,
-                                        QueryTerminalSize);
+  return std::make_unique<TerminalView>(
+      bus, options.interfaceName + " on " + ControllerText(options), stdout, QueryTerminalSize);
 }
 
 int ListHardware(ControllerLink& link, const Options& options) {
-  const auto reply = link.Request("CMD_GET_HARDWARE_INFO", nullptr, ControllerLink::Reply::kHardwareTable);
+  const auto reply =
+      link.Request("CMD_GET_HARDWARE_INFO", nullptr, ControllerLink::Reply::kHardwareTable);
   if (!reply) {
     std::fprintf(stderr, "kvmon: %s\n", link.error().c_str());
     return 1;
@@ -124,15 +129,16 @@ class SessionMessages {
   std::string lastError_;
 };
 
-bool LimitReached(const Options& options, const SessionMessages& messages, Clock::time_point start) {
+bool LimitReached(const Options& options, const SessionMessages& messages,
+                  Clock::time_point start) {
   if (options.recordMessages && messages.recordMessages() >= *options.recordMessages) return true;
   return options.durationSeconds &&
          Clock::now() - start >= std::chrono::duration<double>(*options.durationSeconds);
 }
 
 // Runs until Ctrl-C, a limit, a failed output or the end of the connection; false on the last.
-bool Monitor(ControllerLink& link, const Options& options, Display& display, SessionMessages& messages,
-             std::string& error) {
+bool Monitor(ControllerLink& link, const Options& options, Display& display,
+             SessionMessages& messages, std::string& error) {
   const auto start = Clock::now();
   while (!gStopRequested && !LimitReached(options, messages, start) && !display.failed()) {
     if (!link.HeartbeatIfDue()) {
@@ -141,7 +147,8 @@ bool Monitor(ControllerLink& link, const Options& options, Display& display, Ses
     }
     if (auto message = link.Receive(kLoopSlice)) messages(*message);
     if (link.closed()) {
-      error = messages.lastError().empty() ? "the controller ended the connection" : messages.lastError();
+      error = messages.lastError().empty() ? "the controller ended the connection"
+                                           : messages.lastError();
       return false;
     }
   }
@@ -153,7 +160,8 @@ int RunSession(ControllerLink& link, const Options& options) {
   SessionMessages messages(*display, options.interfaceName);
   const MessageSink sink = [&messages](const kvhost::HostMessage& message) { messages(message); };
   std::string error;
-  const bool ok = SetUpSession(link, options, sink, error) && Monitor(link, options, *display, messages, error) &&
+  const bool ok = SetUpSession(link, options, sink, error) &&
+                  Monitor(link, options, *display, messages, error) &&
                   TerminateSession(link, sink, error);
   display->Close();
   if (!ok) std::fprintf(stderr, "kvmon: %s\n", error.c_str());
@@ -165,13 +173,18 @@ int RunSession(ControllerLink& link, const Options& options) {
 int RunKvmon(int argc, char** argv) {
   Options options;
   switch (ParseOptions(argc, argv, options, stderr)) {
-    case ParseResult::kHelp: PrintUsage(stdout); return 0;
-    case ParseResult::kUsageError: return 2;
-    case ParseResult::kRun: break;
+    case ParseResult::kHelp:
+      PrintUsage(stdout);
+      return 0;
+    case ParseResult::kUsageError:
+      return 2;
+    case ParseResult::kRun:
+      break;
   }
   InstallSignals();
   std::string error;
-  auto link = ControllerLink::Open(options.controllerHost, options.controllerPort, options.waitSeconds, error);
+  auto link = ControllerLink::Open(options.controllerHost, options.controllerPort,
+                                   options.waitSeconds, error);
   if (!link) {
     std::fprintf(stderr, "kvmon: %s\n", error.c_str());
     return 1;

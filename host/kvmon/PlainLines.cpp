@@ -19,7 +19,8 @@ std::string BusExtras(Bus bus, const kvhost::IdentifierRecord& r) {
   if (bus == Bus::kLin) {
     std::snprintf(text, sizeof text, " checksum=%02X", r.checksum & 0xFF);
   } else if (bus == Bus::kFlexRay) {
-    std::snprintf(text, sizeof text, " cycle=%u%s%s", r.cycle, r.startup ? " startup" : "", r.sync ? " sync" : "");
+    std::snprintf(text, sizeof text, " cycle=%u%s%s", r.cycle, r.startup ? " startup" : "",
+                  r.sync ? " sync" : "");
   } else {
     text[0] = '\0';
   }
@@ -38,9 +39,11 @@ std::string NowText() {
   return text;
 }
 
-std::string PlainLines::RecordLine(const std::string& interfaceName, Bus bus, const kvhost::IdentifierRecord& r) {
-  std::string line = UnixTimeText(r.lastTimestamp) + " " + interfaceName + " " + IdentifierText(bus, r) + " " +
-                     FrameTypeName(bus, r.type) + " [" + std::to_string(r.payloadLength) + "]";
+std::string PlainLines::RecordLine(const std::string& interfaceName, Bus bus,
+                                   const kvhost::IdentifierRecord& r) {
+  std::string line = UnixTimeText(r.lastTimestamp) + " " + interfaceName + " " +
+                     IdentifierText(bus, r) + " " + FrameTypeName(bus, r.type) + " [" +
+                     std::to_string(r.payloadLength) + "]";
   if (!r.payload.empty()) line += " " + HexBytes(r.payload, " ");
   line += " count=" + std::to_string(r.count);
   if (const auto period = PeriodMs(r)) {
@@ -55,15 +58,18 @@ std::string PlainLines::RecordLine(const std::string& interfaceName, Bus bus, co
 std::string PlainLines::StatisticsLine(const std::string& interfaceName, const std::string& when,
                                        const BusReport& report) {
   std::string line = when + " " + interfaceName + " statistics";
-  for (const auto& count : report.frames) line += " " + count.name + "=" + std::to_string(count.perSecond) + "/s";
+  for (const auto& count : report.frames)
+    line += " " + count.name + "=" + std::to_string(count.perSecond) + "/s";
   if (report.busLoad) line += " load=" + PercentText(*report.busLoad) + "%";
   if (report.peakLoad) line += " peak=" + PercentText(*report.peakLoad) + "%";
-  for (const auto& value : report.state) line += " " + Dashed(value.name) + "=" + Dashed(value.text);
+  for (const auto& value : report.state)
+    line += " " + Dashed(value.name) + "=" + Dashed(value.text);
   if (report.faultCode != 0) line += " fault=" + std::to_string(report.faultCode);
   return line;
 }
 
-void PlainLines::ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, size_t) {
+void PlainLines::ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
+                             size_t) {
   for (const auto& record : records) Write(RecordLine(interfaceName_, bus, record));
   if (std::fflush(out_) != 0) failed_ = true;
 }
@@ -73,7 +79,9 @@ void PlainLines::ShowStatistics(const BusReport& report) {
   if (std::fflush(out_) != 0) failed_ = true;
 }
 
-void PlainLines::ShowNotice(const std::string& words) { std::fprintf(err_, "kvmon: %s\n", words.c_str()); }
+void PlainLines::ShowNotice(const std::string& words) {
+  std::fprintf(err_, "kvmon: %s\n", words.c_str());
+}
 
 void PlainLines::Write(const std::string& line) {
   if (failed_) return;

@@ -104,7 +104,8 @@ std::string Inner(const std::string& reply) {
 }
 
 bool EndsWith(const std::string& text, std::string_view suffix) {
-  return text.size() >= suffix.size() && text.compare(text.size() - suffix.size(), suffix.size(), suffix) == 0;
+  return text.size() >= suffix.size() &&
+         text.compare(text.size() - suffix.size(), suffix.size(), suffix) == 0;
 }
 
 // "<ERROR: -1074384832>": a session that could not be opened.
@@ -121,11 +122,15 @@ std::string ExplainPropertyError(const std::string& inner) {
   const size_t colon = inner.find(": ");
   const std::string property = inner.substr(0, colon);
   const std::string option = OptionOfProperty(property);
-  if (EndsWith(inner, "Value range error")) return "the controller refused the value of " + option + " (out of range)";
-  if (EndsWith(inner, "Session yet created")) return option + " cannot be changed while a session runs";
+  if (EndsWith(inner, "Value range error"))
+    return "the controller refused the value of " + option + " (out of range)";
+  if (EndsWith(inner, "Session yet created"))
+    return option + " cannot be changed while a session runs";
   if (EndsWith(inner, "empty paramter")) return option + " needs a value";
-  if (EndsWith(inner, "logging is active")) return "the log file name cannot be changed while the session logs";
-  return "the controller refused " + option + ": " + inner.substr(colon == std::string::npos ? 0 : colon + 2);
+  if (EndsWith(inner, "logging is active"))
+    return "the log file name cannot be changed while the session logs";
+  return "the controller refused " + option + ": " +
+         inner.substr(colon == std::string::npos ? 0 : colon + 2);
 }
 
 std::string ExplainKnownText(const std::string& inner, const std::string& interfaceName) {
@@ -137,7 +142,8 @@ std::string ExplainKnownText(const std::string& inner, const std::string& interf
     return "a FlexRay session in normal run mode needs a database: give --alias and --cluster "
            "(for example --alias SimDB --cluster FlexRay)";
   }
-  if (EndsWith(inner, "session is already started")) return "this connection already has a session running";
+  if (EndsWith(inner, "session is already started"))
+    return "this connection already has a session running";
   if (inner == "Heartbeat message missing| TCP Client disconnect") {
     return "the controller ended the connection: it had no heartbeat from this host for 10 seconds";
   }
@@ -174,7 +180,8 @@ std::string DescribeStatus(int32_t status) {
 
 std::string ExplainError(const std::string& reply, const std::string& interfaceName) {
   const std::string inner = Inner(reply);
-  if (const std::string known = ExplainKnownText(inner, interfaceName); !known.empty()) return known;
+  if (const std::string known = ExplainKnownText(inner, interfaceName); !known.empty())
+    return known;
   long long number = 0;
   if (ReadNumber(inner, number)) {
     return "the controller could not open the session on " + interfaceName + ": " +

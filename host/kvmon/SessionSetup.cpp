@@ -25,7 +25,8 @@ bool Exchange(ControllerLink& link, const std::string& command, const std::strin
 
 }  // namespace
 
-bool SetUpSession(ControllerLink& link, const Options& options, const MessageSink& sink, std::string& error) {
+bool SetUpSession(ControllerLink& link, const Options& options, const MessageSink& sink,
+                  std::string& error) {
   for (const auto& property : options.properties) {
     if (!Exchange(link, property, options.interfaceName, sink, error)) return false;
   }

@@ -12,7 +12,8 @@ namespace kvmon {
 // Sends the options' properties one by one, starts the session and then defines and starts the
 // transmit frame, each after the reply to the one before. False at the first refusal, with
 // `error` in plain words.
-bool SetUpSession(ControllerLink& link, const Options& options, const MessageSink& sink, std::string& error);
+bool SetUpSession(ControllerLink& link, const Options& options, const MessageSink& sink,
+                  std::string& error);
 
 // Ends the session and the connection with CMD_SESSION_TERMINATE. False with `error` when the
 // controller did not acknowledge it.

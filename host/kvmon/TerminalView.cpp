@@ -23,8 +23,8 @@ constexpr int kLinesAroundRows = 6;  // title, column names, two statistics line
 std::string Columns(const std::string& id, const std::string& type, const std::string& length,
                     const std::string& count, const std::string& period) {
   char text[128];
-  std::snprintf(text, sizeof text, "%-9s %-7s %4s %10s %10s  ", id.c_str(), type.c_str(), length.c_str(),
-                count.c_str(), period.c_str());
+  std::snprintf(text, sizeof text, "%-9s %-7s %4s %10s %10s  ", id.c_str(), type.c_str(),
+                length.c_str(), count.c_str(), period.c_str());
   return text;
 }
 
@@ -45,14 +45,17 @@ std::string Fit(std::string text, int columns) {
 
 }  // namespace
 
-TerminalView::TerminalView(Bus bus, std::string title, std::FILE* out, std::function<TerminalSize()> size)
+TerminalView::TerminalView(Bus bus, std::string title, std::FILE* out,
+                           std::function<TerminalSize()> size)
     : table_(bus), title_(std::move(title)), out_(out), size_(std::move(size)) {}
 
 std::string TerminalView::RowLine(const LiveRow& row, int columns) const {
   const auto& r = row.record;
-  std::string line = Columns(IdentifierText(table_.bus(), r), FrameTypeName(table_.bus(), r.type),
-                             std::to_string(r.payloadLength), std::to_string(r.count), PeriodText(r));
-  // The payload gets the columns left of the last one; a cut payload ends in "+N" (at most " +2047").
+  std::string line =
+      Columns(IdentifierText(table_.bus(), r), FrameTypeName(table_.bus(), r.type),
+              std::to_string(r.payloadLength), std::to_string(r.count), PeriodText(r));
+  // The payload gets the columns left of the last one; a cut payload ends in "+N" (at most "
+  // +2047").
   constexpr int kMarkRoom = 6;
   constexpr int kLeastRoom = kMarkRoom + 2;  // one byte and the mark
   const int room = columns - 1 - kFixedColumns;
@@ -73,7 +76,8 @@ std::string TerminalView::RowLine(const LiveRow& row, int columns) const {
 std::string TerminalView::RatesLine() const {
   if (!report_) return "waiting for the first statistics report";
   std::string line = BusName(report_->bus);
-  for (const auto& count : report_->frames) line += "  " + count.name + " " + std::to_string(count.perSecond) + "/s";
+  for (const auto& count : report_->frames)
+    line += "  " + count.name + " " + std::to_string(count.perSecond) + "/s";
   if (report_->busLoad) line += "   load " + PercentText(*report_->busLoad) + " %";
   if (report_->peakLoad) line += "  peak " + PercentText(*report_->peakLoad) + " %";
   return line;
@@ -83,7 +87,8 @@ std::string TerminalView::StateLine() const {
   if (!report_) return "";
   std::string line = "bus";
   for (const auto& value : report_->state) {
-    line += (line.size() == 3 ? " " : "  ") + (value.label.empty() ? value.text : value.label + " " + value.text);
+    line += (line.size() == 3 ? " " : "  ") +
+            (value.label.empty() ? value.text : value.label + " " + value.text);
   }
   if (report_->faultCode != 0) line += "  fault " + std::to_string(report_->faultCode);
   return line;
@@ -93,13 +98,17 @@ std::vector<std::string> TerminalView::Lines(TerminalSize size) const {
   const auto& rows = table_.rows();
   std::vector<std::string> lines;
   const int width = size.columns;
-  lines.push_back(kBold + Fit("kvmon  " + title_ + "   " + std::to_string(rows.size()) +
-                                  " identifiers   Ctrl-C ends the session", width) + kReset);
+  lines.push_back(kBold +
+                  Fit("kvmon  " + title_ + "   " + std::to_string(rows.size()) +
+                          " identifiers   Ctrl-C ends the session",
+                      width) +
+                  kReset);
   lines.push_back(Fit(Columns("ID", "Type", "Len", "Count", "Period ms") + "Data", width));
   const size_t room = static_cast<size_t>(std::max(size.rows - kLinesAroundRows, 1));
   const size_t shown = rows.size() <= room ? rows.size() : room - 1;
   for (size_t i = 0; i < shown; ++i) lines.push_back(RowLine(rows[i], size.columns));
-  if (shown < rows.size()) lines.push_back("... " + std::to_string(rows.size() - shown) + " more identifiers");
+  if (shown < rows.size())
+    lines.push_back("... " + std::to_string(rows.size() - shown) + " more identifiers");
   if (rows.empty()) lines.push_back("waiting for the first identifier report");
   lines.push_back(Fit(RatesLine(), width));
   lines.push_back(Fit(StateLine(), width));
@@ -119,10 +128,12 @@ void TerminalView::Draw() {
     if (i + 1 < lines.size()) screen += '\n';
   }
   screen += kClearBelow;
-  if (std::fwrite(screen.data(), 1, screen.size(), out_) != screen.size() || std::fflush(out_) != 0) failed_ = true;
+  if (std::fwrite(screen.data(), 1, screen.size(), out_) != screen.size() || std::fflush(out_) != 0)
+    failed_ = true;
 }
 
-void TerminalView::ShowRecords(Bus, const std::vector<kvhost::IdentifierRecord>& records, size_t messageBytes) {
+void TerminalView::ShowRecords(Bus, const std::vector<kvhost::IdentifierRecord>& records,
+                               size_t messageBytes) {
   table_.Update(records, messageBytes);
   Draw();
 }

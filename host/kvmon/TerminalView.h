@@ -23,7 +23,8 @@ class TerminalView : public Display {
  public:
   TerminalView(Bus bus, std::string title, std::FILE* out, std::function<TerminalSize()> size);
 
-  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, size_t messageBytes) override;
+  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
+                   size_t messageBytes) override;
   void ShowStatistics(const BusReport& report) override;
   void ShowNotice(const std::string& words) override;
   void Close() override;

@@ -40,7 +40,8 @@ bool ReadIdentifier(const std::string& digits, TransmitFrame& frame, std::string
   }
   frame.extended = digits.size() > 3;
   if (value > (frame.extended ? 0x1FFFFFFFu : 0x7FFu)) {
-    error = frame.extended ? "an extended identifier is at most 1FFFFFFF" : "a standard identifier is at most 7FF";
+    error = frame.extended ? "an extended identifier is at most 1FFFFFFF"
+                           : "a standard identifier is at most 7FF";
     return false;
   }
   frame.identifier = value;

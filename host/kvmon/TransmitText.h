@@ -13,7 +13,7 @@ struct TransmitFrame {
   uint32_t identifier = 0;
   bool extended = false;
   bool remote = false;
-  uint8_t frameType = 0;           // 0 data, 1 remote, 0x10 CAN FD, 0x18 CAN FD with bit-rate switching
+  uint8_t frameType = 0;  // 0 data, 1 remote, 0x10 CAN FD, 0x18 CAN FD with bit-rate switching
   std::vector<uint8_t> payload;
   uint32_t length = 0;             // payload length on the bus (remote: the requested length)
   std::optional<double> periodMs;  // cyclic when set

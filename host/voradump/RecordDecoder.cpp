@@ -7,26 +7,37 @@ namespace voradump {
 
 using namespace nKV_DLL300;
 
-BinaryRecordLayout RecordLayout(RecordBus bus, CanRecords choice, const uint8_t* records, size_t size) {
+BinaryRecordLayout RecordLayout(RecordBus bus, CanRecords choice, const uint8_t* records,
+                                size_t size) {
   switch (bus) {
-    case RecordBus::kLin: return BinaryRecordLayout::kFixed24;
-    case RecordBus::kFlexRay: return BinaryRecordLayout::kFlexRayVariable;
-    case RecordBus::kCan: break;
+    case RecordBus::kLin:
+      return BinaryRecordLayout::kFixed24;
+    case RecordBus::kFlexRay:
+      return BinaryRecordLayout::kFlexRayVariable;
+    case RecordBus::kCan:
+      break;
   }
   switch (choice) {
-    case CanRecords::kFixed: return BinaryRecordLayout::kFixed24;
-    case CanRecords::kVariable: return BinaryRecordLayout::kCanVariable;
-    case CanRecords::kAuto: break;
+    case CanRecords::kFixed:
+      return BinaryRecordLayout::kFixed24;
+    case CanRecords::kVariable:
+      return BinaryRecordLayout::kCanVariable;
+    case CanRecords::kAuto:
+      break;
   }
   return DetectCanRecordLayout(records, size);
 }
 
 std::optional<RecordBus> BusOfProtocol(int64_t protocol) {
   switch (protocol) {
-    case 0: return RecordBus::kCan;
-    case 1: return RecordBus::kFlexRay;
-    case 2: return RecordBus::kLin;
-    default: return std::nullopt;
+    case 0:
+      return RecordBus::kCan;
+    case 1:
+      return RecordBus::kFlexRay;
+    case 2:
+      return RecordBus::kLin;
+    default:
+      return std::nullopt;
   }
 }
 
@@ -39,9 +50,12 @@ std::optional<RecordBus> BusOfName(std::string_view name) {
 
 const char* NameOfBus(RecordBus bus) {
   switch (bus) {
-    case RecordBus::kCan: return "CAN";
-    case RecordBus::kLin: return "LIN";
-    case RecordBus::kFlexRay: return "FlexRay";
+    case RecordBus::kCan:
+      return "CAN";
+    case RecordBus::kLin:
+      return "LIN";
+    case RecordBus::kFlexRay:
+      return "FlexRay";
   }
   return "?";
 }
@@ -50,29 +64,36 @@ namespace {
 
 std::string_view HeaderOf(RecordBus bus, uint8_t linChecksum) {
   switch (bus) {
-    case RecordBus::kCan: return kCanTextLogHeader;
-    case RecordBus::kLin: return LinTextLogHeader(linChecksum);
-    case RecordBus::kFlexRay: return kFlexRayTextLogHeader;
+    case RecordBus::kCan:
+      return kCanTextLogHeader;
+    case RecordBus::kLin:
+      return LinTextLogHeader(linChecksum);
+    case RecordBus::kFlexRay:
+      return kFlexRayTextLogHeader;
   }
   return {};
 }
 
 size_t FormatLine(RecordBus bus, char* line, const RawFrameView& frame, uint8_t linChecksum) {
   switch (bus) {
-    case RecordBus::kCan: return FormatCanTextLine(line, kTextLineCapacity, frame);
-    case RecordBus::kLin: return FormatLinTextLine(line, kTextLineCapacity, frame, linChecksum);
-    case RecordBus::kFlexRay: return FormatFlexRayTextLine(line, kTextLineCapacity, frame);
+    case RecordBus::kCan:
+      return FormatCanTextLine(line, kTextLineCapacity, frame);
+    case RecordBus::kLin:
+      return FormatLinTextLine(line, kTextLineCapacity, frame, linChecksum);
+    case RecordBus::kFlexRay:
+      return FormatFlexRayTextLine(line, kTextLineCapacity, frame);
   }
   return 0;
 }
 
 }  // namespace
 
-DecodeResult WriteTextLog(const uint8_t* records, size_t size, RecordBus bus, const DecodeOptions& options,
-                          std::FILE* out) {
+DecodeResult WriteTextLog(const uint8_t* records, size_t size, RecordBus bus,
+                          const DecodeOptions& options, std::FILE* out) {
   DecodeResult result;
   const std::string_view header = HeaderOf(bus, options.linChecksum);
-  if (std::fwrite(header.data(), 1, header.size(), out) != header.size() || std::fputc('\n', out) == EOF) {
+  if (std::fwrite(header.data(), 1, header.size(), out) != header.size() ||
+      std::fputc('\n', out) == EOF) {
     result.writeFailed = true;
     return result;
   }

@@ -1,4 +1,5 @@
-// Turns frame records (of a binary log or a measurement-data channel) into the controller's text log.
+// Turns frame records (of a binary log or a measurement-data channel) into the controller's text
+// log.
 #pragma once
 
 #include <cstdint>
@@ -30,7 +31,8 @@ struct DecodeResult {
 };
 
 // The layout of the records of `bus`, settled from `choice` (and the bytes, for kAuto).
-BinaryRecordLayout RecordLayout(RecordBus bus, CanRecords choice, const uint8_t* records, size_t size);
+BinaryRecordLayout RecordLayout(RecordBus bus, CanRecords choice, const uint8_t* records,
+                                size_t size);
 
 // The bus a channel's "QV_network_protocol" names: 0 CAN, 1 FlexRay, 2 LIN.
 std::optional<RecordBus> BusOfProtocol(int64_t protocol);
@@ -40,7 +42,7 @@ const char* NameOfBus(RecordBus bus);
 
 // Writes the header line and one line per record to `out`, exactly as the controller's text log of
 // the bus holds them.
-DecodeResult WriteTextLog(const uint8_t* records, size_t size, RecordBus bus, const DecodeOptions& options,
-                          std::FILE* out);
+DecodeResult WriteTextLog(const uint8_t* records, size_t size, RecordBus bus,
+                          const DecodeOptions& options, std::FILE* out);
 
 }  // namespace voradump

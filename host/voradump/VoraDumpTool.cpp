@@ -22,7 +22,8 @@ const char kUsage[] =
     "  vora-dump -d -g Bus -c CAN1 run.vora     only channel CAN1 of group Bus\n"
     "  vora-dump -d --lin-checksum lin.vora     LIN lines with the checksum column\n"
     "\n"
-    "Lists a measurement-data file (.vora) written by the controller and decodes the frames of its\n"
+    "Lists a measurement-data file (.vora) written by the controller and decodes the frames of "
+    "its\n"
     "channels into the lines of the controller's text log of their bus (the channel property\n"
     "QV_network_protocol: 0 CAN, 1 FlexRay, 2 LIN).\n"
     "\n"
@@ -54,13 +55,14 @@ void ListChannel(const Channel& c, std::FILE* out) {
 }
 
 // Decodes one channel; false when it cannot be read, its bus is unknown or the output fails.
-bool DecodeChannel(const VoraReader& reader, const Channel& c, const DecodeOptions& options, std::FILE* out,
-                   std::FILE* err) {
+bool DecodeChannel(const VoraReader& reader, const Channel& c, const DecodeOptions& options,
+                   std::FILE* out, std::FILE* err) {
   const std::string where = "group " + Quoted(c.group) + " channel " + Quoted(c.name);
   const auto protocol = c.IntegerProperty(kProtocolProperty);
   const auto bus = protocol ? BusOfProtocol(*protocol) : std::nullopt;
   if (!bus) {
-    std::fprintf(err, "vora-dump: %s: no known %s property, frames not decoded\n", where.c_str(), kProtocolProperty);
+    std::fprintf(err, "vora-dump: %s: no known %s property, frames not decoded\n", where.c_str(),
+                 kProtocolProperty);
     return false;
   }
   std::vector<uint8_t> bytes;
@@ -70,17 +72,21 @@ bool DecodeChannel(const VoraReader& reader, const Channel& c, const DecodeOptio
   }
   const DecodeResult result = WriteTextLog(bytes.data(), bytes.size(), *bus, options, out);
   if (result.trailingBytes > 0) {
-    std::fprintf(err, "vora-dump: %s: %llu bytes after the last whole frame record ignored\n", where.c_str(),
-                 static_cast<unsigned long long>(result.trailingBytes));
+    std::fprintf(err, "vora-dump: %s: %llu bytes after the last whole frame record ignored\n",
+                 where.c_str(), static_cast<unsigned long long>(result.trailingBytes));
   }
   return !result.writeFailed;
 }
 
 bool ParseCanRecords(const char* text, CanRecords& out) {
-  if (std::strcmp(text, "auto") == 0) out = CanRecords::kAuto;
-  else if (std::strcmp(text, "fixed") == 0) out = CanRecords::kFixed;
-  else if (std::strcmp(text, "variable") == 0) out = CanRecords::kVariable;
-  else return false;
+  if (std::strcmp(text, "auto") == 0)
+    out = CanRecords::kAuto;
+  else if (std::strcmp(text, "fixed") == 0)
+    out = CanRecords::kFixed;
+  else if (std::strcmp(text, "variable") == 0)
+    out = CanRecords::kVariable;
+  else
+    return false;
   return true;
 }
 
@@ -101,7 +107,8 @@ std::string Quoted(const std::string& name) {
   return quoted + "\"";
 }
 
-int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out, std::FILE* err) {
+int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out,
+                 std::FILE* err) {
   std::string error;
   const auto reader = VoraReader::Open(path, error);
   if (!reader) {
@@ -128,7 +135,9 @@ int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::F
   }
   bool ok = true;
   for (const Channel* c : chosen) {
-    if (chosen.size() > 1) std::fprintf(out, "== group %s channel %s ==\n", Quoted(c->group).c_str(), Quoted(c->name).c_str());
+    if (chosen.size() > 1)
+      std::fprintf(out, "== group %s channel %s ==\n", Quoted(c->group).c_str(),
+                   Quoted(c->name).c_str());
     ok = DecodeChannel(*reader, *c, selection.options, out, err) && ok;
   }
   return ok && std::fflush(out) == 0 ? 0 : 1;
@@ -136,27 +145,43 @@ int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::F
 
 int RunVoraDump(int argc, char** argv) {
   enum { kLinChecksum = 256, kCanRecords };
-  static const option kOptions[] = {
-      {"decode", no_argument, nullptr, 'd'},          {"group", required_argument, nullptr, 'g'},
-      {"channel", required_argument, nullptr, 'c'},   {"lin-checksum", no_argument, nullptr, kLinChecksum},
-      {"can-records", required_argument, nullptr, kCanRecords}, {"help", no_argument, nullptr, 'h'},
-      {nullptr, 0, nullptr, 0}};
+  static const option kOptions[] = {{"decode", no_argument, nullptr, 'd'},
+                                    {"group", required_argument, nullptr, 'g'},
+                                    {"channel", required_argument, nullptr, 'c'},
+                                    {"lin-checksum", no_argument, nullptr, kLinChecksum},
+                                    {"can-records", required_argument, nullptr, kCanRecords},
+                                    {"help", no_argument, nullptr, 'h'},
+                                    {nullptr, 0, nullptr, 0}};
   DumpSelection selection;
   optind = 1;
   for (int opt; (opt = getopt_long(argc, argv, "dg:c:h", kOptions, nullptr)) != -1;) {
     switch (opt) {
-      case 'd': selection.decode = true; break;
-      case 'g': selection.group = optarg; selection.hasGroup = true; break;
-      case 'c': selection.channel = optarg; selection.hasChannel = true; break;
-      case kLinChecksum: selection.options.linChecksum = 1; break;
+      case 'd':
+        selection.decode = true;
+        break;
+      case 'g':
+        selection.group = optarg;
+        selection.hasGroup = true;
+        break;
+      case 'c':
+        selection.channel = optarg;
+        selection.hasChannel = true;
+        break;
+      case kLinChecksum:
+        selection.options.linChecksum = 1;
+        break;
       case kCanRecords:
         if (!ParseCanRecords(optarg, selection.options.canRecords)) {
           std::fprintf(stderr, "vora-dump: --can-records takes auto, fixed or variable\n");
           return 2;
         }
         break;
-      case 'h': std::fputs(kUsage, stdout); return 0;
-      default: std::fputs(kUsage, stderr); return 2;
+      case 'h':
+        std::fputs(kUsage, stdout);
+        return 0;
+      default:
+        std::fputs(kUsage, stderr);
+        return 2;
     }
   }
   if (optind + 1 != argc) {

@@ -18,9 +18,10 @@ struct DumpSelection {
 };
 
 // Lists the file's groups, channels and properties, or (with `decode`) writes the text log of every
-// selected channel to `out`; problems go to `err`. Returns the process exit code: 0 done, 1 the file
-// or a channel could not be read or written.
-int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out, std::FILE* err);
+// selected channel to `out`; problems go to `err`. Returns the process exit code: 0 done, 1 the
+// file or a channel could not be read or written.
+int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out,
+                 std::FILE* err);
 
 // The command line of vora-dump. Returns the exit code (2 for a usage error).
 int RunVoraDump(int argc, char** argv);

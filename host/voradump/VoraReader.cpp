@@ -11,12 +11,13 @@ namespace {
 // Names of the links directly below `group`, in name order.
 std::vector<std::string> LinkNames(hid_t group) {
   std::vector<std::string> names;
-  H5Literate(group, H5_INDEX_NAME, H5_ITER_INC, nullptr,
-              [](hid_t, const char* name, const H5L_info_t*, void* data) -> herr_t {
-                static_cast<std::vector<std::string>*>(data)->emplace_back(name);
-                return 0;
-              },
-              &names);
+  H5Literate(
+      group, H5_INDEX_NAME, H5_ITER_INC, nullptr,
+      [](hid_t, const char* name, const H5L_info_t*, void* data) -> herr_t {
+        static_cast<std::vector<std::string>*>(data)->emplace_back(name);
+        return 0;
+      },
+      &names);
   return names;
 }
 
@@ -43,12 +44,13 @@ Property ReadProperty(hid_t object, const std::string& name) {
 
 std::vector<Property> Properties(hid_t object) {
   std::vector<std::string> names;
-  H5Aiterate2(object, H5_INDEX_NAME, H5_ITER_INC, nullptr,
-              [](hid_t, const char* name, const H5A_info_t*, void* data) -> herr_t {
-                static_cast<std::vector<std::string>*>(data)->emplace_back(name);
-                return 0;
-              },
-              &names);
+  H5Aiterate2(
+      object, H5_INDEX_NAME, H5_ITER_INC, nullptr,
+      [](hid_t, const char* name, const H5A_info_t*, void* data) -> herr_t {
+        static_cast<std::vector<std::string>*>(data)->emplace_back(name);
+        return 0;
+      },
+      &names);
   std::vector<Property> properties;
   for (const std::string& name : names) properties.push_back(ReadProperty(object, name));
   return properties;
@@ -60,7 +62,8 @@ std::optional<uint64_t> ChannelBytes(hid_t dataset) {
   const hid_t space = H5Dget_space(dataset);
   std::optional<uint64_t> bytes;
   hsize_t size = 0;
-  if (H5Tget_class(type) == H5T_INTEGER && H5Tget_size(type) == 1 && H5Sget_simple_extent_ndims(space) == 1 &&
+  if (H5Tget_class(type) == H5T_INTEGER && H5Tget_size(type) == 1 &&
+      H5Sget_simple_extent_ndims(space) == 1 &&
       H5Sget_simple_extent_dims(space, &size, nullptr) == 1) {
     bytes = size;
   }
@@ -71,16 +74,18 @@ std::optional<uint64_t> ChannelBytes(hid_t dataset) {
 
 H5O_type_t ObjectType(hid_t parent, const std::string& name) {
   H5O_info_t info{};
-  if (H5Oget_info_by_name2(parent, name.c_str(), &info, H5O_INFO_BASIC, H5P_DEFAULT) < 0) return H5O_TYPE_UNKNOWN;
+  if (H5Oget_info_by_name2(parent, name.c_str(), &info, H5O_INFO_BASIC, H5P_DEFAULT) < 0)
+    return H5O_TYPE_UNKNOWN;
   return info.type;
 }
 
-void AddChannel(hid_t group, const std::string& groupStored, const std::string& stored, Group& out) {
+void AddChannel(hid_t group, const std::string& groupStored, const std::string& stored,
+                Group& out) {
   const hid_t dataset = H5Dopen2(group, stored.c_str(), H5P_DEFAULT);
   if (dataset < 0) return;
   if (const auto bytes = ChannelBytes(dataset)) {
-    out.channels.push_back(Channel{out.name, vora::DecodeStoredName(stored), "/" + groupStored + "/" + stored,
-                                   *bytes, Properties(dataset)});
+    out.channels.push_back(Channel{out.name, vora::DecodeStoredName(stored),
+                                   "/" + groupStored + "/" + stored, *bytes, Properties(dataset)});
   }
   H5Dclose(dataset);
 }
@@ -133,7 +138,8 @@ bool VoraReader::ReadBytes(const Channel& channel, std::vector<uint8_t>& out) co
   bool ok = bytes.has_value();
   if (ok) {
     out.resize(*bytes);
-    ok = *bytes == 0 || H5Dread(dataset, H5T_NATIVE_UINT8, H5S_ALL, H5S_ALL, H5P_DEFAULT, out.data()) >= 0;
+    ok = *bytes == 0 ||
+         H5Dread(dataset, H5T_NATIVE_UINT8, H5S_ALL, H5S_ALL, H5P_DEFAULT, out.data()) >= 0;
   }
   H5Dclose(dataset);
   return ok;

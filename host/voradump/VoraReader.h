@@ -18,9 +18,9 @@ struct Property {
 };
 
 struct Channel {
-  std::string group;    // decoded names, as the writer gave them
+  std::string group;  // decoded names, as the writer gave them
   std::string name;
-  std::string hdf5Path; // the dataset's path in the file
+  std::string hdf5Path;  // the dataset's path in the file
   uint64_t bytes = 0;
   std::vector<Property> properties;
 

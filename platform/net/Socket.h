@@ -31,8 +31,7 @@ bool SetSendBufferSize(SocketHandle socket, int32_t bytes);
 // Waits until at least one socket is readable (data, end of stream or error pending) or
 // `timeoutMs` passed. Returns the number of readable sockets with readable[i] set for each, 0 on
 // time-out, -1 on failure (also when a handle is not an open socket).
-int32_t WaitReadable(const SocketHandle* sockets, size_t count, bool* readable,
-                     uint32_t timeoutMs);
+int32_t WaitReadable(const SocketHandle* sockets, size_t count, bool* readable, uint32_t timeoutMs);
 // Waits until the socket can take more data: 1 writable, 0 time-out, -1 failure.
 int32_t WaitWritable(SocketHandle socket, uint32_t timeoutMs);
 

@@ -32,7 +32,8 @@ TEST(CanStatistics, EachFrameTypeCountsIntoItsOwnFields) {
        &CanBusStatistics::extendedFramesPerSecond},
       {CanFrame(0x321, 0x01, 0), &CanBusStatistics::remoteFrames,
        &CanBusStatistics::remoteFramesPerSecond},
-      {CanFrame(0, 0x02, 0), &CanBusStatistics::errorFrames, &CanBusStatistics::errorFramesPerSecond},
+      {CanFrame(0, 0x02, 0), &CanBusStatistics::errorFrames,
+       &CanBusStatistics::errorFramesPerSecond},
   };
   for (const auto& row : rows) {
     CanBusStatistics s{};
@@ -82,8 +83,8 @@ TEST(CanStatistics, SendTurnsWindowCountsIntoRatesAndKeepsThePeakLoad) {
 
 TEST(FramesPerSecond, RoundsAndSurvivesLongWindowsAndZeroTime) {
   EXPECT_EQ(FramesPerSecond(3, 1000), 3u);
-  EXPECT_EQ(FramesPerSecond(2, 1500), 1u);   // 1.33
-  EXPECT_EQ(FramesPerSecond(5, 3000), 1u);   // 1.67, half a frame added
+  EXPECT_EQ(FramesPerSecond(2, 1500), 1u);  // 1.33
+  EXPECT_EQ(FramesPerSecond(5, 3000), 1u);  // 1.67, half a frame added
   EXPECT_EQ(FramesPerSecond(1, 3000), 0u);
   EXPECT_EQ(FramesPerSecond(36000000, 3600000), 10000u);  // an hour at 10 000 frames/s
   EXPECT_EQ(FramesPerSecond(7, 0), 7500u);

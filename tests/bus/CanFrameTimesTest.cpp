@@ -1,7 +1,7 @@
 // Frame-time tables, bus time and bus load of CAN.
-#include "bus/CanFrameTimes.h"
-
 #include <gtest/gtest.h>
+
+#include "bus/CanFrameTimes.h"
 
 namespace nKV_DLL300 {
 namespace {
@@ -13,10 +13,20 @@ constexpr uint32_t kStandard = 0, kExtended = 1;
 TEST(CanFrameTimes, LengthsMapToTheirIndexAndOthersToNone) {
   const struct {
     uint32_t length, index;
-  } rows[] = {{0, 0},  {8, 8},  {9, CanFrameTimes::kNoIndex}, {12, 9},  {16, 10},
-              {20, 11}, {24, 12}, {32, 13}, {48, 14}, {64, 15}, {63, CanFrameTimes::kNoIndex},
+  } rows[] = {{0, 0},
+              {8, 8},
+              {9, CanFrameTimes::kNoIndex},
+              {12, 9},
+              {16, 10},
+              {20, 11},
+              {24, 12},
+              {32, 13},
+              {48, 14},
+              {64, 15},
+              {63, CanFrameTimes::kNoIndex},
               {2047, CanFrameTimes::kNoIndex}};
-  for (const auto& row : rows) EXPECT_EQ(CanFrameTimes::indexOf(row.length), row.index) << row.length;
+  for (const auto& row : rows)
+    EXPECT_EQ(CanFrameTimes::indexOf(row.length), row.index) << row.length;
 }
 
 TEST(CanFrameTimes, ClassicTablesCountStuffBitsOnlyInTheMaximum) {
@@ -75,8 +85,8 @@ TEST(CanFrameTimes, BusLoadIsTruncatedPerMilleTimesTenAndCapped) {
   CanFrameTimes times;
   times.buildFrameTimeTables({0, 0, kClassicRate, 0});
   for (int i = 0; i < 100; ++i) times.addFrame(false, 8);  // mean 241 us each
-  EXPECT_EQ(times.busLoad(1000), 240u);                     // 24.1 per mille
-  EXPECT_EQ(times.busLoad(24), 10000u);                     // more bus time than time
+  EXPECT_EQ(times.busLoad(1000), 240u);                    // 24.1 per mille
+  EXPECT_EQ(times.busLoad(24), 10000u);                    // more bus time than time
   EXPECT_EQ(times.busLoad(0), 10000u);
   times.clearBusTime();
   EXPECT_EQ(times.busLoad(1000), 0u);

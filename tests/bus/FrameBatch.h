@@ -17,9 +17,10 @@ class FrameBatch {
  public:
   FrameBatch& add(uint64_t timestamp, uint32_t identifier, uint8_t type, uint8_t flags,
                   uint8_t info, const std::vector<uint8_t>& payload) {
-    RawFrameHeader h{timestamp, identifier, type, flags, info,
-                     static_cast<uint8_t>(payload.size() & 0xFF)};
-    if (type == kFrameTypeJ1939) h.info = static_cast<uint8_t>((info & ~7u) | (payload.size() >> 8));
+    RawFrameHeader h{timestamp, identifier, type,
+                     flags,     info,       static_cast<uint8_t>(payload.size() & 0xFF)};
+    if (type == kFrameTypeJ1939)
+      h.info = static_cast<uint8_t>((info & ~7u) | (payload.size() >> 8));
     const size_t at = bytes_.size();
     bytes_.resize(at + RawFrameSize(h), 0);
     std::memcpy(bytes_.data() + at, &h, sizeof h);
@@ -69,7 +70,7 @@ struct WireRecord {
   uint8_t type;
   uint8_t echo;
   uint32_t payloadLength;
-  std::vector<uint8_t> head;     // the whole record
+  std::vector<uint8_t> head;  // the whole record
   std::vector<uint8_t> payload;
 };
 

@@ -21,15 +21,11 @@ struct Traffic {
   uint32_t identifiers;  // identifiers are drawn from 0 to identifiers - 1
 };
 
-const Traffic kCanTraffic{{0x00, 0x01, 0x02, 0x10, 0x18, 0xC0},
-                          {0, 0, 0, 0x80},
-                          {0, 1, 3, 8, 12, 64, 300, 2047},
-                          300};
+const Traffic kCanTraffic{
+    {0x00, 0x01, 0x02, 0x10, 0x18, 0xC0}, {0, 0, 0, 0x80}, {0, 1, 3, 8, 12, 64, 300, 2047}, 300};
 const Traffic kLinTraffic{{0x40, 0x40, 0x41, 0x42}, {0, 1, 0x80, 0x81}, {0, 1, 2, 4, 8}, 64};
-const Traffic kFlexRayTraffic{{0x20, 0x20, 0x21},
-                              {0, 0x10, 0x20, 0x11, 0x22, 0x07, 0x90},
-                              {0, 8, 16, 32, 254},
-                              120};
+const Traffic kFlexRayTraffic{
+    {0x20, 0x20, 0x21}, {0, 0x10, 0x20, 0x11, 0x22, 0x07, 0x90}, {0, 8, 16, 32, 254}, 120};
 
 template <class T>
 T Pick(std::mt19937& random, const std::vector<T>& from) {
@@ -56,7 +52,8 @@ void CompareOnRandomTraffic(const Traffic& traffic, uint32_t seed) {
   std::mt19937 random(seed);
   const uint32_t capacity = std::uniform_int_distribution<uint32_t>(0, 80)(random);
   const uint32_t sendBuffer = std::uniform_int_distribution<uint32_t>(100, 6000)(random);
-  auto table = IdentifierTable<Rules>::Create(capacity, std::pmr::get_default_resource(), sendBuffer);
+  auto table =
+      IdentifierTable<Rules>::Create(capacity, std::pmr::get_default_resource(), sendBuffer);
   LiteralIdentifierTable<Rules> reference(capacity, sendBuffer);
   uint64_t clock = 0;
   for (int step = 0; step < 300; ++step) {
@@ -76,11 +73,13 @@ void CompareOnRandomTraffic(const Traffic& traffic, uint32_t seed) {
 }
 
 TEST(IdentifierTableReference, CanMessagesMatchThePlainSearchAndSort) {
-  for (uint32_t seed = 1; seed <= 40; ++seed) CompareOnRandomTraffic<CanIdentifierRules>(kCanTraffic, seed);
+  for (uint32_t seed = 1; seed <= 40; ++seed)
+    CompareOnRandomTraffic<CanIdentifierRules>(kCanTraffic, seed);
 }
 
 TEST(IdentifierTableReference, LinMessagesMatchThePlainSearchAndSort) {
-  for (uint32_t seed = 1; seed <= 40; ++seed) CompareOnRandomTraffic<LinIdentifierRules>(kLinTraffic, seed);
+  for (uint32_t seed = 1; seed <= 40; ++seed)
+    CompareOnRandomTraffic<LinIdentifierRules>(kLinTraffic, seed);
 }
 
 TEST(IdentifierTableReference, FlexRayMessagesMatchThePlainSearchAndSort) {

@@ -1,8 +1,7 @@
 // Identifier tables of the three buses: keys, capacity, reset, payload copies and record messages.
-#include "bus/IdentifierTable.h"
-
 #include <gtest/gtest.h>
 
+#include "bus/IdentifierTable.h"
 #include "tests/bus/FrameBatch.h"
 
 namespace nKV_DLL300 {
@@ -52,8 +51,10 @@ TEST(CanIdentifierTable, RepeatedIdentifierCountsAndListsSortedWithBothTimestamp
 TEST(CanIdentifierTable, TypeIsPartOfTheKeyAndTiesKeepTheirFirstSeenOrder) {
   auto table = CanIdentifierTable::Create(1000);
   FrameBatch batch;
-  batch.can(1, 0x321, {}, kCanRemote).can(2, 0x321, {1, 2}).can(3, 0x100, {}).can(4, 0x321, {},
-                                                                                  kCanRemote);
+  batch.can(1, 0x321, {}, kCanRemote)
+      .can(2, 0x321, {1, 2})
+      .can(3, 0x100, {})
+      .can(4, 0x321, {}, kCanRemote);
   ASSERT_EQ(table->updateIdentifierTable(batch.data(), batch.size(), kDefaults), 0);
   const auto records = DecodeRecords(Send(*table)[0], kCanRecordSize);
   ASSERT_EQ(records.size(), 3u);
@@ -68,9 +69,9 @@ TEST(IdentifierTable, EchoesAndBusErrorsEnterOnlyWhenTheirSettingAllowsIt) {
     uint8_t type, flags;
     TableSettings settings;
     bool taken;
-  } canRows[] = {{0, kEcho, kDefaults, false},          {0, kEcho, {1, 0}, true},
-                 {kCanBusError, 0, kDefaults, false},   {kCanBusError, 0, {0, 1}, true},
-                 {kCanBusError, kEcho, {0, 1}, false},  {kCanRemote, 0, kDefaults, true}};
+  } canRows[] = {{0, kEcho, kDefaults, false},         {0, kEcho, {1, 0}, true},
+                 {kCanBusError, 0, kDefaults, false},  {kCanBusError, 0, {0, 1}, true},
+                 {kCanBusError, kEcho, {0, 1}, false}, {kCanRemote, 0, kDefaults, true}};
   for (const auto& row : canRows) {
     auto table = CanIdentifierTable::Create(10);
     FrameBatch batch;
@@ -217,7 +218,8 @@ TEST(LinIdentifierTable, OneEntryPerIdentifierShowsItsLastFrame) {
   EXPECT_EQ(e.type, kLinData);
   EXPECT_EQ(e.echo, kEcho);
   EXPECT_EQ(e.flag, 1);
-  EXPECT_EQ((std::vector<uint8_t>(e.checksum, e.checksum + 4)), (std::vector<uint8_t>{0xC7, 0, 0, 0}));
+  EXPECT_EQ((std::vector<uint8_t>(e.checksum, e.checksum + 4)),
+            (std::vector<uint8_t>{0xC7, 0, 0, 0}));
   EXPECT_EQ(e.payloadLength, 2);
   // The shorter payload cleared the bytes the 8-byte one had left behind.
   EXPECT_EQ((std::vector<uint8_t>(e.payload, e.payload + 8)),
@@ -246,7 +248,8 @@ TEST(FlexRayIdentifierTable, ChannelKeyFollowsFlagsOrTheFrameBeforeIt) {
     uint32_t slot, count;
     uint8_t channel, type, startup, sync, cycle;
     uint32_t payloadLength;
-  } expected[] = {{5, 2, 0, kFrData, 0, 0, 9, 0}, {5, 2, 1, kFrData, 0, 0, 8, 0},
+  } expected[] = {{5, 2, 0, kFrData, 0, 0, 9, 0},
+                  {5, 2, 1, kFrData, 0, 0, 8, 0},
                   {9, 2, 1, kFrData, 0, 0, 9, 1}};
   for (size_t i = 0; i < 3; ++i) {
     EXPECT_EQ(records[i].identifier, expected[i].slot) << i;
@@ -263,7 +266,8 @@ TEST(IdentifierTable, RecordsBeyondTheSendBufferGoOutInFurtherMessages) {
   constexpr uint32_t kIdentifiers = 4000;
   auto table = CanIdentifierTable::Create(kIdentifiers);
   FrameBatch batch;
-  for (uint32_t id = 0; id < kIdentifiers; ++id) batch.can(id, kIdentifiers - id, std::vector<uint8_t>(64, 1), kCanFdBrs);
+  for (uint32_t id = 0; id < kIdentifiers; ++id)
+    batch.can(id, kIdentifiers - id, std::vector<uint8_t>(64, 1), kCanFdBrs);
   table->updateIdentifierTable(batch.data(), batch.size(), kDefaults);
   const auto messages = Send(*table);
   ASSERT_EQ(messages.size(), 4u);  // 92 bytes a record: 1086 fit in 100 000 bytes

@@ -1,8 +1,7 @@
 // Walking a read batch frame by frame.
-#include "bus/RawFrame.h"
-
 #include <gtest/gtest.h>
 
+#include "bus/RawFrame.h"
 #include "tests/bus/FrameBatch.h"
 
 namespace nKV_DLL300 {
@@ -24,7 +23,8 @@ TEST(RawFrameWalker, LongestJ1939PayloadsStayInsideTheirFrame) {
     test::FrameBatch batch;
     batch.add(1, 0x18FEF100, kFrameTypeJ1939, 0, 0, std::vector<uint8_t>(length, 0xEE))
         .can(2, 0x100, {1});
-    EXPECT_EQ(WalkIdentifiers(batch.data(), batch.size()), (std::vector<uint32_t>{0x18FEF100, 0x100}))
+    EXPECT_EQ(WalkIdentifiers(batch.data(), batch.size()),
+              (std::vector<uint32_t>{0x18FEF100, 0x100}))
         << length;
   }
 }

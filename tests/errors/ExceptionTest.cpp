@@ -1,7 +1,7 @@
 // qverr::Exception: default state, what(), and the report moving into copies.
-#include "errors/Exception.h"
-
 #include <gtest/gtest.h>
+
+#include "errors/Exception.h"
 
 namespace {
 

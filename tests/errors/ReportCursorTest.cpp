@@ -1,9 +1,9 @@
 // Report members: escaping of every byte class, commas, nesting and unscannable reports.
-#include "errors/ReportCursor.h"
-
 #include <gtest/gtest.h>
 
 #include <ostream>
+
+#include "errors/ReportCursor.h"
 
 namespace {
 
@@ -18,16 +18,18 @@ void PrintTo(const Escape& e, std::ostream* out) { *out << e.escaped; }
 
 class EscapeJsonTest : public ::testing::TestWithParam<Escape> {};
 
-TEST_P(EscapeJsonTest, EscapesByteClass) { EXPECT_EQ(escapeJson(GetParam().raw), GetParam().escaped); }
+TEST_P(EscapeJsonTest, EscapesByteClass) {
+  EXPECT_EQ(escapeJson(GetParam().raw), GetParam().escaped);
+}
 
 INSTANTIATE_TEST_SUITE_P(
     Bytes, EscapeJsonTest,
     ::testing::Values(Escape{"\b", "\\b"}, Escape{"\t", "\\t"}, Escape{"\n", "\\n"},
                       Escape{"\f", "\\f"}, Escape{"\r", "\\r"}, Escape{"\"", "\\\""},
                       Escape{"\\", "\\\\"}, Escape{"\x01", "\\u0001"}, Escape{"\x1b", "\\u001b"},
-                      Escape{"\x0b", "\\u000b"}, Escape{"\x1f", "\\u001f"}, Escape{"\x7f", "\\u007f"},
-                      Escape{"\xc3\xa9\xff", "\xc3\xa9\xff"}, Escape{"a/b", "a/b"},
-                      Escape{"C:\\QV-RT", "C:\\\\QV-RT"}));
+                      Escape{"\x0b", "\\u000b"}, Escape{"\x1f", "\\u001f"},
+                      Escape{"\x7f", "\\u007f"}, Escape{"\xc3\xa9\xff", "\xc3\xa9\xff"},
+                      Escape{"a/b", "a/b"}, Escape{"C:\\QV-RT", "C:\\\\QV-RT"}));
 
 TEST(ReportCursorTest, StringWithEveryClassIsWrittenEscaped) {
   Status status;
@@ -57,7 +59,8 @@ TEST(ReportCursorTest, NestedObjectsCloseBackIntoParent) {
   cursor.openObject("next");
   cursor.closeObject();
   cursor.addString("last", nullptr);
-  EXPECT_STREQ(status.report, R"({"line":1,"inner":{"api":"errno","deeper":{},"code":2},"next":{},"last":""})");
+  EXPECT_STREQ(status.report,
+               R"({"line":1,"inner":{"api":"errno","deeper":{},"code":2},"next":{},"last":""})");
 }
 
 TEST(ReportCursorTest, EmptyObjectWithBlanksGetsNoComma) {

@@ -1,6 +1,4 @@
 // Status precedence, reports of setError, buffer growth, moving and checking statuses.
-#include "errors/Status.h"
-
 #include <gtest/gtest.h>
 
 #include <cstring>
@@ -8,6 +6,7 @@
 
 #include "errors/Exception.h"
 #include "errors/ReportCursor.h"
+#include "errors/Status.h"
 
 namespace {
 
@@ -16,7 +15,8 @@ using namespace qverr;
 constexpr int32_t kError = -52013;
 constexpr int32_t kWarning = 7;
 constexpr uint32_t kFirstBuffer = 512;
-const SourceLocation kSite{"qvsysq\\stdpath_util", 124, "kelvanert", "qvapalerr_objectNameCollision"};
+const SourceLocation kSite{"qvsysq\\stdpath_util", 124, "kelvanert",
+                           "qvapalerr_objectNameCollision"};
 const char* const kSiteReport =
     R"({"error_constant":"qvapalerr_objectNameCollision","file":"qvsysq\\stdpath_util","line":124,"component":"kelvanert"})";
 
@@ -63,7 +63,9 @@ TEST(StatusTest, SetErrorWritesLocationMembersInOrder) {
 TEST(StatusTest, SetErrorWithoutComponentLeavesItOut) {
   Status status;
   setError(status, -52000, {"qvhtl/err/Allocator", 32, nullptr, "qvapalerr_memoryFull"});
-  EXPECT_STREQ(status.report, R"({"error_constant":"qvapalerr_memoryFull","file":"qvhtl/err/Allocator","line":32})");
+  EXPECT_STREQ(
+      status.report,
+      R"({"error_constant":"qvapalerr_memoryFull","file":"qvhtl/err/Allocator","line":32})");
 }
 
 TEST(StatusTest, MemberFillingExactlyTheFreeRoomDoesNotGrow) {

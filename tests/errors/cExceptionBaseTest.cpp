@@ -1,6 +1,4 @@
 // The code exception: location word bits, what() texts, and translation of foreign exceptions.
-#include "errors/cExceptionBase.h"
-
 #include <gtest/gtest.h>
 
 #include <new>
@@ -8,6 +6,7 @@
 
 #include "errors/Exception.h"
 #include "errors/RaiseSites.h"
+#include "errors/cExceptionBase.h"
 
 namespace {
 

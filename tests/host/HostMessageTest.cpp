@@ -1,7 +1,7 @@
 // The host library's decoders: short headers, hardware tables of the wrong length.
-#include "host/HostMessage.h"
-
 #include <gtest/gtest.h>
+
+#include "host/HostMessage.h"
 
 namespace kvhost {
 namespace {
@@ -14,8 +14,8 @@ TEST(HostMessageTest, HeaderNeedsAll28Bytes) {
 }
 
 TEST(HostMessageTest, HeaderFieldsAreLittleEndian) {
-  std::vector<uint8_t> bytes = {1, 0, 0, 0, 7, 0, 0, 0, 0xB8, 1, 0, 0, 2, 0,
-                                0, 0, 0xEC, 0xFF, 0xFF, 0xFF, 0, 0x0F, 0, 0, 21, 5, 0, 3};
+  std::vector<uint8_t> bytes = {1, 0, 0,    0,    7,    0,    0, 0,    0xB8, 1, 0,  0, 2, 0,
+                                0, 0, 0xEC, 0xFF, 0xFF, 0xFF, 0, 0x0F, 0,    0, 21, 5, 0, 3};
   auto header = DecodeHeader(bytes.data(), bytes.size());
   ASSERT_TRUE(header);
   EXPECT_EQ(header->sequence, 1u);

@@ -1,11 +1,10 @@
 // candump log lines of every kind of CAN frame, and the frames that have no such line.
-#include "host/kvlog/CandumpFormat.h"
-
 #include <gtest/gtest.h>
 
 #include <string>
 #include <vector>
 
+#include "host/kvlog/CandumpFormat.h"
 #include "tests/logging/FrameBuilder.h"
 
 namespace kvlog {
@@ -23,24 +22,42 @@ void PrintTo(const CandumpCase& c, std::ostream* os) { *os << c.name; }
 
 // 2024-05-17 09:05:03.042000 UTC
 const CandumpCase kCases[] = {
-    {"ClassicStandard", {.identifier = 0x123, .payload = {0x11, 0x22, 0xab}}, "(1715936703.042000) can0 123#1122AB\n"},
-    {"ClassicExtended", {.identifier = 0x38FEF100, .payload = {0, 0x11}}, "(1715936703.042000) can0 18FEF100#0011\n"},
-    {"StandardMaskedTo11Bits", {.identifier = 0xF801, .payload = {}}, "(1715936703.042000) can0 001#\n"},
+    {"ClassicStandard",
+     {.identifier = 0x123, .payload = {0x11, 0x22, 0xab}},
+     "(1715936703.042000) can0 123#1122AB\n"},
+    {"ClassicExtended",
+     {.identifier = 0x38FEF100, .payload = {0, 0x11}},
+     "(1715936703.042000) can0 18FEF100#0011\n"},
+    {"StandardMaskedTo11Bits",
+     {.identifier = 0xF801, .payload = {}},
+     "(1715936703.042000) can0 001#\n"},
     {"Remote", {.identifier = 0x321, .type = 0x01}, "(1715936703.042000) can0 321#R\n"},
-    {"RemoteWithLength", {.identifier = 0x321, .type = 0x01, .lengthByte = 3}, "(1715936703.042000) can0 321#R3\n"},
-    {"FdWithoutSwitch", {.identifier = 0x201, .type = 0x10, .payload = {0xa0, 0xa1}},
+    {"RemoteWithLength",
+     {.identifier = 0x321, .type = 0x01, .lengthByte = 3},
+     "(1715936703.042000) can0 321#R3\n"},
+    {"FdWithoutSwitch",
+     {.identifier = 0x201, .type = 0x10, .payload = {0xa0, 0xa1}},
      "(1715936703.042000) can0 201##4A0A1\n"},
-    {"FdWithSwitchExtended", {.identifier = 0x3ABCDE00, .type = 0x18, .payload = {0xf0}},
+    {"FdWithSwitchExtended",
+     {.identifier = 0x3ABCDE00, .type = 0x18, .payload = {0xf0}},
      "(1715936703.042000) can0 1ABCDE00##5F0\n"},
-    {"BusError", {.identifier = 0, .type = 0x02}, "(1715936703.042000) can0 20000080#0000000000000000\n"},
-    {"EchoEndsInT", {.identifier = 0x100, .flags = 0x80, .payload = {1}}, "(1715936703.042000) can0 100#01 T\n"},
-    {"ShortJ1939IsClassicExtended", {.identifier = 0x38FECA00, .type = 0xC0, .payload = {1, 2}},
+    {"BusError",
+     {.identifier = 0, .type = 0x02},
+     "(1715936703.042000) can0 20000080#0000000000000000\n"},
+    {"EchoEndsInT",
+     {.identifier = 0x100, .flags = 0x80, .payload = {1}},
+     "(1715936703.042000) can0 100#01 T\n"},
+    {"ShortJ1939IsClassicExtended",
+     {.identifier = 0x38FECA00, .type = 0xC0, .payload = {1, 2}},
      "(1715936703.042000) can0 18FECA00#0102\n"},
-    {"LongJ1939HasNoLine", {.identifier = 0x38FECA00, .type = 0xC0, .payload = std::vector<uint8_t>(20)}, ""},
+    {"LongJ1939HasNoLine",
+     {.identifier = 0x38FECA00, .type = 0xC0, .payload = std::vector<uint8_t>(20)},
+     ""},
     {"ClassicOverEightHasNoLine", {.identifier = 0x100, .payload = std::vector<uint8_t>(12)}, ""},
     {"LinTypeHasNoLine", {.identifier = 0x10, .type = 0x40, .payload = {1}}, ""},
     {"BeforeUnixEpochIsZero", {.timestamp = 5, .identifier = 0x1}, "(0.000000) can0 001#\n"},
-    {"MicrosecondsTruncated", {.timestamp = kvtest::kAt090503042 + 12'349, .identifier = 0x1},
+    {"MicrosecondsTruncated",
+     {.timestamp = kvtest::kAt090503042 + 12'349, .identifier = 0x1},
      "(1715936703.043234) can0 001#\n"},
 };
 
@@ -56,8 +73,11 @@ TEST_P(CandumpLines, FormatsTheFrame) {
 INSTANTIATE_TEST_SUITE_P(Kinds, CandumpLines, testing::ValuesIn(kCases));
 
 TEST(CandumpFormat, LongestLineFitsAndBadNamesAreRefused) {
-  const auto batch = kvtest::Batch({{.timestamp = 0x7FFF'FFFF'FFFF'FFFFull, .identifier = 0x3FFFFFFF, .type = 0x18,
-                                     .flags = 0x80, .payload = std::vector<uint8_t>(64, 0xff)}});
+  const auto batch = kvtest::Batch({{.timestamp = 0x7FFF'FFFF'FFFF'FFFFull,
+                                     .identifier = 0x3FFFFFFF,
+                                     .type = 0x18,
+                                     .flags = 0x80,
+                                     .payload = std::vector<uint8_t>(64, 0xff)}});
   char line[kCandumpLineCapacity];
   const std::string longest(kMaxInterfaceName, 'x');
   EXPECT_GT(FormatCandumpLine(line, sizeof line, kvtest::FirstView(batch), longest), 0u);

@@ -46,11 +46,20 @@ std::vector<FrameSpec> MixedCanFrames() {
       {.timestamp = kT0 + 2 * kStep, .identifier = 0x321, .type = 0x01},
       {.timestamp = kT0 + 3 * kStep, .identifier = 0x322, .type = 0x01, .lengthByte = 3},
       {.timestamp = kT0 + 4 * kStep, .identifier = 0x201, .type = 0x10, .payload = Bytes(12, 0xa0)},
-      {.timestamp = kT0 + 5 * kStep, .identifier = 0x3ABCDE00, .type = 0x18, .payload = Bytes(64, 0)},
+      {.timestamp = kT0 + 5 * kStep,
+       .identifier = 0x3ABCDE00,
+       .type = 0x18,
+       .payload = Bytes(64, 0)},
       {.timestamp = kT0 + 6 * kStep, .identifier = 0, .type = 0x02},
       {.timestamp = kT0 + 7 * kStep, .identifier = 0x100, .flags = 0x80, .payload = {0x7f}},
-      {.timestamp = kT0 + 8 * kStep, .identifier = 0x38FECA00, .type = 0xC0, .payload = Bytes(8, 1)},
-      {.timestamp = kT0 + 9 * kStep, .identifier = 0x38FECA00, .type = 0xC0, .payload = Bytes(20, 1)},
+      {.timestamp = kT0 + 8 * kStep,
+       .identifier = 0x38FECA00,
+       .type = 0xC0,
+       .payload = Bytes(8, 1)},
+      {.timestamp = kT0 + 9 * kStep,
+       .identifier = 0x38FECA00,
+       .type = 0xC0,
+       .payload = Bytes(20, 1)},
   };
 }
 
@@ -74,24 +83,30 @@ class Kvlog : public testing::Test {
 
 TEST_F(Kvlog, CandumpLogReadByPythonCanGivesTheSameFrames) {
   if (!std::filesystem::exists(PYTHON3_PATH)) GTEST_SKIP() << "python3 is not installed";
-  const std::string log = Write("run.zfl", BinaryLog(MixedCanFrames(), BinaryRecordLayout::kCanVariable));
+  const std::string log =
+      Write("run.zfl", BinaryLog(MixedCanFrames(), BinaryRecordLayout::kCanVariable));
   const auto converted = Kvlog_("--bus can --candump -o '" + (dir / "run.log") + "' " + log);
   ASSERT_EQ(converted.exitCode, 0) << converted.err;
-  EXPECT_NE(converted.err.find("1 frames have no candump form"), std::string::npos) << converted.err;
+  EXPECT_NE(converted.err.find("1 frames have no candump form"), std::string::npos)
+      << converted.err;
 
   // python-can reports error frames with its default extended flag and remote frames without data.
-  const auto read = RunTool(std::string(PYTHON3_PATH) + " " + READ_CANDUMP_PY + " '" + (dir / "run.log") + "'", dir.path);
+  const auto read = RunTool(
+      std::string(PYTHON3_PATH) + " " + READ_CANDUMP_PY + " '" + (dir / "run.log") + "'", dir.path);
   ASSERT_EQ(read.exitCode, 0) << read.err;
-  EXPECT_EQ(read.out,
-            "1715936703.042000 123 ext=0 rtr=0 fd=0 brs=0 err=0 dlc=4 rx=1 11223344\n"
-            "1715936703.042123 18FEF100 ext=1 rtr=0 fd=0 brs=0 err=0 dlc=8 rx=1 0001020304050607\n"
-            "1715936703.042246 321 ext=0 rtr=1 fd=0 brs=0 err=0 dlc=0 rx=1 \n"
-            "1715936703.042370 322 ext=0 rtr=1 fd=0 brs=0 err=0 dlc=3 rx=1 \n"
-            "1715936703.042493 201 ext=0 rtr=0 fd=1 brs=0 err=0 dlc=12 rx=1 a0a1a2a3a4a5a6a7a8a9aaab\n"
-            "1715936703.042617 1ABCDE00 ext=1 rtr=0 fd=1 brs=1 err=0 dlc=64 rx=1 " + CountingHex(64) + "\n"
-                "1715936703.042740 0 ext=1 rtr=0 fd=0 brs=0 err=1 dlc=0 rx=1 \n"
-                "1715936703.042863 100 ext=0 rtr=0 fd=0 brs=0 err=0 dlc=1 rx=0 7f\n"
-                "1715936703.042987 18FECA00 ext=1 rtr=0 fd=0 brs=0 err=0 dlc=8 rx=1 0102030405060708\n");
+  EXPECT_EQ(
+      read.out,
+      "1715936703.042000 123 ext=0 rtr=0 fd=0 brs=0 err=0 dlc=4 rx=1 11223344\n"
+      "1715936703.042123 18FEF100 ext=1 rtr=0 fd=0 brs=0 err=0 dlc=8 rx=1 0001020304050607\n"
+      "1715936703.042246 321 ext=0 rtr=1 fd=0 brs=0 err=0 dlc=0 rx=1 \n"
+      "1715936703.042370 322 ext=0 rtr=1 fd=0 brs=0 err=0 dlc=3 rx=1 \n"
+      "1715936703.042493 201 ext=0 rtr=0 fd=1 brs=0 err=0 dlc=12 rx=1 a0a1a2a3a4a5a6a7a8a9aaab\n"
+      "1715936703.042617 1ABCDE00 ext=1 rtr=0 fd=1 brs=1 err=0 dlc=64 rx=1 " +
+          CountingHex(64) +
+          "\n"
+          "1715936703.042740 0 ext=1 rtr=0 fd=0 brs=0 err=1 dlc=0 rx=1 \n"
+          "1715936703.042863 100 ext=0 rtr=0 fd=0 brs=0 err=0 dlc=1 rx=0 7f\n"
+          "1715936703.042987 18FECA00 ext=1 rtr=0 fd=0 brs=0 err=0 dlc=8 rx=1 0102030405060708\n");
 }
 
 TEST_F(Kvlog, BinaryLogsBecomeTheTextLogOfTheirBus) {
@@ -102,19 +117,22 @@ TEST_F(Kvlog, BinaryLogsBecomeTheTextLogOfTheirBus) {
     const char* expected;
   } cases[] = {
       {"--bus can",
-       {{.identifier = 0x321, .type = 0x01}, {.identifier = 0x2000'0100, .payload = {0xaa, 0xbb, 0xcc}}},
+       {{.identifier = 0x321, .type = 0x01},
+        {.identifier = 0x2000'0100, .payload = {0xaa, 0xbb, 0xcc}}},
        BinaryRecordLayout::kFixed24,
        "Timestamp\tID\tPayload\tPayload Length\tType\tName\n"
        "09:05:03,042\t321\t\t0\tS/R\n"
        "09:05:03,042\t100\taa  bb  cc  \t3\tE\n"},
       {"--bus can",
-       {{.identifier = 0x321, .type = 0x01}, {.identifier = 0x201, .type = 0x10, .payload = Bytes(12, 0)}},
+       {{.identifier = 0x321, .type = 0x01},
+        {.identifier = 0x201, .type = 0x10, .payload = Bytes(12, 0)}},
        BinaryRecordLayout::kCanVariable,
        "Timestamp\tID\tPayload\tPayload Length\tType\tName\n"
        "09:05:03,042\t321\t\t0\tS/R\n"
        "09:05:03,042\t201\t00  01  02  03  04  05  06  07  08  09  0a  0b  \t12\tFD\n"},
       {"--bus lin --lin-checksum",
-       {{.identifier = 0x12, .type = 0x42, .info = 0x5a}, {.identifier = 0x10, .type = 0x40, .payload = {0x12, 0x34}}},
+       {{.identifier = 0x12, .type = 0x42, .info = 0x5a},
+        {.identifier = 0x10, .type = 0x40, .payload = {0x12, 0x34}}},
        BinaryRecordLayout::kFixed24,
        "Timestamp\tID\tPayload\tPayload Length\tChecksum\tType\t\n"
        "09:05:03,042\t12\t00  00  00  00  00  00  00  00  \t0\t5a\tNR\n"
@@ -123,7 +141,8 @@ TEST_F(Kvlog, BinaryLogsBecomeTheTextLogOfTheirBus) {
        {{.identifier = 5, .type = 0x20, .flags = 0x12, .info = 3, .payload = {0x0a, 0x0b}},
         {.identifier = 3, .type = 0x21, .flags = 0x10, .info = 1}},
        BinaryRecordLayout::kFlexRayVariable,
-       "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle Number\tChannel\tStartup\tSync\tPreamble\n"
+       "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle "
+       "Number\tChannel\tStartup\tSync\tPreamble\n"
        "09:05:03,042\t5\t0a  0b  \t2\t3\tA\t-\tX\t-\n"
        "09:05:03,042\t3\t\t0\t1\tA\t-\t-\t-\n"},
   };
@@ -136,17 +155,21 @@ TEST_F(Kvlog, BinaryLogsBecomeTheTextLogOfTheirBus) {
 }
 
 TEST_F(Kvlog, CutLastRecordIsReportedAndTheWholeOnesConverted) {
-  auto bytes = BinaryLog({{.type = 0x40, .payload = {1}}, {.type = 0x40, .payload = {2}}}, BinaryRecordLayout::kFixed24);
+  auto bytes = BinaryLog({{.type = 0x40, .payload = {1}}, {.type = 0x40, .payload = {2}}},
+                         BinaryRecordLayout::kFixed24);
   bytes.resize(bytes.size() - 10);
   const auto run = Kvlog_("--bus lin " + Write("cut.zfl", bytes));
   EXPECT_EQ(run.exitCode, 0);
-  EXPECT_EQ(run.out, "Timestamp\tID\tPayload\tPayload Length\tType\t\n"
-                     "09:05:03,042\t0\t01  00  00  00  00  00  00  00  \t1\tS\n");
-  EXPECT_NE(run.err.find("14 bytes after the last whole frame record ignored"), std::string::npos) << run.err;
+  EXPECT_EQ(run.out,
+            "Timestamp\tID\tPayload\tPayload Length\tType\t\n"
+            "09:05:03,042\t0\t01  00  00  00  00  00  00  00  \t1\tS\n");
+  EXPECT_NE(run.err.find("14 bytes after the last whole frame record ignored"), std::string::npos)
+      << run.err;
 }
 
 TEST_F(Kvlog, BadInputsAreRefusedWithAReason) {
-  const std::string log = Write("run.zfl", BinaryLog({{.type = 0x40}}, BinaryRecordLayout::kFixed24));
+  const std::string log =
+      Write("run.zfl", BinaryLog({{.type = 0x40}}, BinaryRecordLayout::kFixed24));
   const std::string notALog = Write("notes.zfl", {'h', 'e', 'l', 'l', 'o', '\n'});
   const struct {
     std::string arguments;
@@ -183,15 +206,19 @@ TEST(KvlogMeasurementFile, CanChannelsBecomeCandumpLinesAndOtherBusesAreLeftOut)
   const std::string path = dir / "run.vora";
   int32_t file = -1;
   ASSERT_EQ(dll.FileOpenExA(path.c_str(), 2, 2, 4713, &file), 0);
-  const int32_t can = dll.OpenChannel(file, "/'Bus'/'CAN1'", 0), lin = dll.OpenChannel(file, "/'Bus'/'LIN1'", 2);
+  const int32_t can = dll.OpenChannel(file, "/'Bus'/'CAN1'", 0),
+                lin = dll.OpenChannel(file, "/'Bus'/'LIN1'", 2);
   const auto batch = kvtest::Batch({{.identifier = 0x1A0, .payload = {0xaa, 0xbb, 0xcc}}});
   uint8_t record[24];
-  ASSERT_EQ(CopyBinaryRecord(record, sizeof record, kvtest::FirstView(batch), BinaryRecordLayout::kFixed24), 24u);
+  ASSERT_EQ(CopyBinaryRecord(record, sizeof record, kvtest::FirstView(batch),
+                             BinaryRecordLayout::kFixed24),
+            24u);
   dll.ObjRawSet(5, 24, record, file, can);
   dll.ObjRawSet(5, 24, record, file, lin);
   dll.FileClose(file);
 
-  const auto run = RunTool(std::string(KVLOG_PATH) + " --candump -i vcan1 '" + path + "'", dir.path);
+  const auto run =
+      RunTool(std::string(KVLOG_PATH) + " --candump -i vcan1 '" + path + "'", dir.path);
   EXPECT_EQ(run.exitCode, 0) << run.err;
   EXPECT_EQ(run.out, "(1715936703.042000) vcan1 1A0#AABBCC\n");
 }

@@ -43,34 +43,39 @@ TEST(KvmonOptions, OptionsBecomeTheControllersPropertyMessagesInOrder) {
   const PropertyCase cases[] = {
       {{"CAN1"}, {"SET_PROP_SESSION_PORTNAME=CAN1"}},
       {{"--alias", "SimDB", "--cluster", "FlexRay", "FlexRay1"},
-       {"SET_PROP_SESSION_PORTNAME=FlexRay1", "SET_PROP_SESSION_RUNMODE=NORMAL", "SET_PROP_SESSION_ALIAS=SimDB",
-        "SET_PROP_SESSION_CLUSTER=FlexRay"}},
+       {"SET_PROP_SESSION_PORTNAME=FlexRay1", "SET_PROP_SESSION_RUNMODE=NORMAL",
+        "SET_PROP_SESSION_ALIAS=SimDB", "SET_PROP_SESSION_CLUSTER=FlexRay"}},
       {{"LIN1", "--run-mode", "Normal", "-b", "19200"},
-       {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_RUNMODE=NORMAL", "SET_PROP_SESSION_BAUDRATE=19200"}},
+       {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_RUNMODE=NORMAL",
+        "SET_PROP_SESSION_BAUDRATE=19200"}},
       {{"--run-mode", "subordinate", "--alias", "SimDB", "--cluster", "Body", "CAN1"},
-       {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_SESSION_RUNMODE=SUBORDINATE", "SET_PROP_SESSION_ALIAS=SimDB",
-        "SET_PROP_SESSION_CLUSTER=Body"}},
-      {{"--baud", "0x7A120", "--fd-baud", "2000000", "--io-mode", "fd-brs", "--iso-fd", "1", "CAN3"},
-       {"SET_PROP_SESSION_PORTNAME=CAN3", "SET_PROP_SESSION_BAUDRATE=500000", "SET_PROP_SESSION_CANFD_BAUDRATE=2000000",
-        "SET_PROP_SESSION_CAN_IOMODE=2", "SET_PROP_SESSION_ISOFD_MODE=1"}},
+       {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_SESSION_RUNMODE=SUBORDINATE",
+        "SET_PROP_SESSION_ALIAS=SimDB", "SET_PROP_SESSION_CLUSTER=Body"}},
+      {{"--baud", "0x7A120", "--fd-baud", "2000000", "--io-mode", "fd-brs", "--iso-fd", "1",
+        "CAN3"},
+       {"SET_PROP_SESSION_PORTNAME=CAN3", "SET_PROP_SESSION_BAUDRATE=500000",
+        "SET_PROP_SESSION_CANFD_BAUDRATE=2000000", "SET_PROP_SESSION_CAN_IOMODE=2",
+        "SET_PROP_SESSION_ISOFD_MODE=1"}},
       {{"--j1939", "--node-address", "0x80", "--node-name", "0x10", "CAN1"},
        {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_SESSION_APPLICATION_PROTOCOL=1",
         "SET_PROP_SESSION_NODE_ADDRESS=128", "SET_PROP_SESSION_NODE_NAME=16"}},
       {{"--listen-only", "--bus-errors", "--echo", "--termination", "--transceiver", "4", "CAN1"},
-       {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_SESSION_LISTEN_ONLY=1", "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1",
-        "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=1", "SET_PROP_SESSION_TERMINATION=1",
-        "SET_PROP_SESSION_TRANSCEIVER_TYPE=4"}},
+       {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_SESSION_LISTEN_ONLY=1",
+        "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1", "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=1",
+        "SET_PROP_SESSION_TERMINATION=1", "SET_PROP_SESSION_TRANSCEIVER_TYPE=4"}},
       {{"--data-period", "200", "--stats-period", "1000", "--table-size", "50", "LIN2"},
-       {"SET_PROP_SESSION_PORTNAME=LIN2", "SET_PROP_TX_TIME_DATA=200", "SET_PROP_TX_TIME_STATISTIC=1000",
-        "SET_PROP_DATA_LOG_IDS_MAX=50"}},
+       {"SET_PROP_SESSION_PORTNAME=LIN2", "SET_PROP_TX_TIME_DATA=200",
+        "SET_PROP_TX_TIME_STATISTIC=1000", "SET_PROP_DATA_LOG_IDS_MAX=50"}},
       {{"-l", "vora", "--log-name", "run", "--log-group", "g", "--log-channel", "c", "CAN1"},
-       {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE_NAME=run",
-        "SET_PROP_LOGFILE_VORA_GROUP_NAME=g", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=c"}},
+       {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=2",
+        "SET_PROP_LOGFILE_NAME=run", "SET_PROP_LOGFILE_VORA_GROUP_NAME=g",
+        "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=c"}},
       {{"--no-response", "--log-checksum", "--log", "text", "LIN1"},
-       {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1", "SET_PROP_SESSION_LOG_CHECKSUM=1",
-        "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=0"}},
+       {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1",
+        "SET_PROP_SESSION_LOG_CHECKSUM=1", "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=0"}},
       {{"--null-frames", "--key-slot", "5", "FlexRay2"},
-       {"SET_PROP_SESSION_PORTNAME=FlexRay2", "SET_PROP_SESSION_SHOW_NULL_FRAMES=1", "SET_PROP_SESSION_KEY_SLOT=5"}},
+       {"SET_PROP_SESSION_PORTNAME=FlexRay2", "SET_PROP_SESSION_SHOW_NULL_FRAMES=1",
+        "SET_PROP_SESSION_KEY_SLOT=5"}},
   };
   for (const auto& c : cases) {
     const auto parsed = Parse(c.args);
@@ -80,7 +85,8 @@ TEST(KvmonOptions, OptionsBecomeTheControllersPropertyMessagesInOrder) {
 }
 
 TEST(KvmonOptions, ConnectionAndOutputOptionsAreRead) {
-  const auto parsed = Parse({"-c", "10.0.0.7:2000", "--json", "-n", "3", "-d", "2.5", "-w", "1", "CAN2"});
+  const auto parsed =
+      Parse({"-c", "10.0.0.7:2000", "--json", "-n", "3", "-d", "2.5", "-w", "1", "CAN2"});
   ASSERT_EQ(parsed.result, ParseResult::kRun) << parsed.err;
   EXPECT_EQ(parsed.options.controllerHost, "10.0.0.7");
   EXPECT_EQ(parsed.options.controllerPort, 2000);
@@ -133,7 +139,12 @@ TEST(KvmonTransmitText, FrameTextsGiveIdentifierKindAndPayload) {
       {"0123#aa", 0x123, true, 0, {0xAA}, 1},
       {"321#R", 0x321, false, 1, {}, 0},
       {"321#R4", 0x321, false, 1, {}, 4},
-      {"200##1000102030405060708090A0B", 0x200, false, 0x18, {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11}, 12},
+      {"200##1000102030405060708090A0B",
+       0x200,
+       false,
+       0x18,
+       {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11},
+       12},
       {"201##0AB", 0x201, false, 0x10, {0xAB}, 1},
   };
   for (const auto& c : cases) {
@@ -150,8 +161,9 @@ TEST(KvmonTransmitText, FrameTextsGiveIdentifierKindAndPayload) {
 
 TEST(KvmonTransmitText, MalformedOrOversizedFramesAreRefused) {
   const std::string allFf64 = "200##0" + std::string(128, 'F');
-  for (const std::string text : {"123", "800#11", "20000000#00", "123#112", "123#1122334455667788AA", "12G#11",
-                                 "123#R9", "123##1001122334455667788", "#11", allFf64.c_str()}) {
+  for (const std::string text :
+       {"123", "800#11", "20000000#00", "123#112", "123#1122334455667788AA", "12G#11", "123#R9",
+        "123##1001122334455667788", "#11", allFf64.c_str()}) {
     std::string error;
     EXPECT_FALSE(ParseTransmitFrame(text, error)) << text;
     EXPECT_FALSE(error.empty()) << text;
@@ -162,17 +174,19 @@ TEST(KvmonTransmitText, MessagesDefineTheFrameThenStartIt) {
   std::string error;
   auto cyclic = *ParseTransmitFrame("18FEF100#0102000000", error);
   cyclic.periodMs = 100;
-  EXPECT_EQ(TransmitMessages(cyclic),
-            (std::vector<std::string>{"SET_TX_PROP_IDENTIFIER=419361024", "SET_TX_PROP_EXTENDED_ID=1",
-                                      "SET_TX_PROP_FRAME_TYPE=0", "SET_TX_PROP_PAYLOAD_LENGTH=5",
-                                      "SET_TX_PROP_TIMING_TYPE=0", "SET_TX_PROP_CYCLIC_RATE=0.1",
-                                      "SET_TX_PROP_PAYLOAD=1,2", "CMD_TX_START"}));
+  EXPECT_EQ(
+      TransmitMessages(cyclic),
+      (std::vector<std::string>{"SET_TX_PROP_IDENTIFIER=419361024", "SET_TX_PROP_EXTENDED_ID=1",
+                                "SET_TX_PROP_FRAME_TYPE=0", "SET_TX_PROP_PAYLOAD_LENGTH=5",
+                                "SET_TX_PROP_TIMING_TYPE=0", "SET_TX_PROP_CYCLIC_RATE=0.1",
+                                "SET_TX_PROP_PAYLOAD=1,2", "CMD_TX_START"}));
   const auto remote = *ParseTransmitFrame("321#R2", error);
   const auto messages = TransmitMessages(remote);
   EXPECT_EQ(messages[2], "SET_TX_PROP_FRAME_TYPE=1");
   EXPECT_EQ(messages[4], "SET_TX_PROP_TIMING_TYPE=3");
   EXPECT_EQ(messages[5], "SET_TX_PROP_CYCLIC_RATE=0");
-  for (const auto& message : TransmitMessages(*ParseTransmitFrame("200##0" + std::string(118, 'F') + std::string(10, '0'), error))) {
+  for (const auto& message : TransmitMessages(
+           *ParseTransmitFrame("200##0" + std::string(118, 'F') + std::string(10, '0'), error))) {
     EXPECT_LE(message.size(), 256u);
   }
 }

@@ -26,7 +26,8 @@ std::vector<char*> Argv(const std::string& program, const std::vector<std::strin
 
 }  // namespace
 
-KvmonProcess KvmonProcess::WithPipes(const std::string& program, const std::vector<std::string>& args) {
+KvmonProcess KvmonProcess::WithPipes(const std::string& program,
+                                     const std::vector<std::string>& args) {
   KvmonProcess process;
   int out[2], err[2];
   if (pipe2(out, O_CLOEXEC) != 0) return process;
@@ -40,7 +41,8 @@ KvmonProcess KvmonProcess::WithPipes(const std::string& program, const std::vect
   posix_spawn_file_actions_adddup2(&actions, out[1], STDOUT_FILENO);
   posix_spawn_file_actions_adddup2(&actions, err[1], STDERR_FILENO);
   auto argv = Argv(program, args);
-  if (posix_spawn(&process.pid_, program.c_str(), &actions, nullptr, argv.data(), environ) != 0) process.pid_ = -1;
+  if (posix_spawn(&process.pid_, program.c_str(), &actions, nullptr, argv.data(), environ) != 0)
+    process.pid_ = -1;
   posix_spawn_file_actions_destroy(&actions);
   close(out[1]);
   close(err[1]);
@@ -49,8 +51,8 @@ KvmonProcess KvmonProcess::WithPipes(const std::string& program, const std::vect
   return process;
 }
 
-KvmonProcess KvmonProcess::OnTerminal(const std::string& program, const std::vector<std::string>& args, int columns,
-                                      int rows) {
+KvmonProcess KvmonProcess::OnTerminal(const std::string& program,
+                                      const std::vector<std::string>& args, int columns, int rows) {
   KvmonProcess process;
   winsize size{};
   size.ws_col = static_cast<unsigned short>(columns);
@@ -68,8 +70,13 @@ KvmonProcess KvmonProcess::OnTerminal(const std::string& program, const std::vec
 }
 
 KvmonProcess::KvmonProcess(KvmonProcess&& other) noexcept
-    : pid_(other.pid_), outFd_(other.outFd_), errFd_(other.errFd_), exitCode_(other.exitCode_),
-      exited_(other.exited_), out_(std::move(other.out_)), err_(std::move(other.err_)) {
+    : pid_(other.pid_),
+      outFd_(other.outFd_),
+      errFd_(other.errFd_),
+      exitCode_(other.exitCode_),
+      exited_(other.exited_),
+      out_(std::move(other.out_)),
+      err_(std::move(other.err_)) {
   other.pid_ = -1;
   other.outFd_ = other.errFd_ = -1;
 }
@@ -104,7 +111,8 @@ bool KvmonProcess::Pump(int ms) {
   return outFd_ >= 0 || errFd_ >= 0;
 }
 
-bool KvmonProcess::ReadUntil(const std::function<bool(const std::string&)>& done, std::chrono::milliseconds timeout) {
+bool KvmonProcess::ReadUntil(const std::function<bool(const std::string&)>& done,
+                             std::chrono::milliseconds timeout) {
   const auto deadline = std::chrono::steady_clock::now() + timeout;
   while (!done(out_)) {
     if (std::chrono::steady_clock::now() >= deadline || !Pump(100)) return done(out_);

@@ -16,8 +16,8 @@ class KvmonProcess {
   // Starts `program` with `args`, standard output and error on pipes.
   static KvmonProcess WithPipes(const std::string& program, const std::vector<std::string>& args);
   // Starts `program` on a pseudo-terminal of `columns` x `rows` (standard output and error both).
-  static KvmonProcess OnTerminal(const std::string& program, const std::vector<std::string>& args, int columns,
-                                 int rows);
+  static KvmonProcess OnTerminal(const std::string& program, const std::vector<std::string>& args,
+                                 int columns, int rows);
 
   KvmonProcess(KvmonProcess&& other) noexcept;
   KvmonProcess& operator=(KvmonProcess&&) = delete;
@@ -25,7 +25,8 @@ class KvmonProcess {
 
   bool started() const { return pid_ > 0; }
   // Reads output until `done(out)` holds or `timeout` passed; returns done's last value.
-  bool ReadUntil(const std::function<bool(const std::string&)>& done, std::chrono::milliseconds timeout);
+  bool ReadUntil(const std::function<bool(const std::string&)>& done,
+                 std::chrono::milliseconds timeout);
   // Sends `signal` to the child.
   void Signal(int signal);
   // Writes `bytes` to the terminal (as typed keys).

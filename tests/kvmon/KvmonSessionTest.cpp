@@ -62,7 +62,7 @@ std::map<std::string, json> LatestRecords(const std::string& out) {
   for (const auto& object : JsonObjects(out)) {
     if (object["kind"] != "record") continue;
     const std::string second = object.contains("channel") ? object["channel"].get<std::string>()
-                                                           : object["type"].get<std::string>();
+                                                          : object["type"].get<std::string>();
     latest[std::to_string(object["id"].get<uint32_t>()) + "/" + second] = object;
   }
   return latest;
@@ -94,7 +94,8 @@ TEST_F(KvmonSession, JsonLinesShowTheDefaultTrafficOfEachBus) {
       {{"CAN1"}, {"256/data", "416/data", "801/remote", "419361024/data"}},
       {{"--run-mode", "normal", "--baud", "19200", "LIN1"}, {"16/data", "17/data", "19/data"}},
       {{"--no-response", "LIN2"}, {"16/data", "17/data", "18/no-resp", "19/data"}},
-      {{"--alias", "SimDB", "--cluster", "FlexRay", "FlexRay1"}, {"1/A", "1/B", "2/A", "3/A", "40/B"}},
+      {{"--alias", "SimDB", "--cluster", "FlexRay", "FlexRay1"},
+       {"1/A", "1/B", "2/A", "3/A", "40/B"}},
   };
   for (const auto& c : cases) {
     const bool can1 = c.args.back() == "CAN1";
@@ -102,7 +103,9 @@ TEST_F(KvmonSession, JsonLinesShowTheDefaultTrafficOfEachBus) {
     args.insert(args.end(), c.args.begin(), c.args.end());
     auto kvmon = Start(args);
     EXPECT_TRUE(kvmon.ReadUntil(
-        [&](const std::string& out) { return SeenTwice(LatestRecords(out), c.keys) && (!can1 || HasStatistics(out)); },
+        [&](const std::string& out) {
+          return SeenTwice(LatestRecords(out), c.keys) && (!can1 || HasStatistics(out));
+        },
         kToolDeadline))
         << c.args.back() << ": " << kvmon.out() << kvmon.err();
     const auto latest = LatestRecords(kvmon.out());
@@ -151,7 +154,8 @@ TEST_F(KvmonSession, TerminalShowsTheLiveTableAndCtrlCEndsTheSession) {
   const std::string highlighted = "\x1b[1;31m";  // the counter byte of 0x100 changes every report
   ASSERT_TRUE(kvmon.ReadUntil(
       [&](const std::string& out) {
-        return out.find("18FEF100  data") != std::string::npos && out.find("error active") != std::string::npos &&
+        return out.find("18FEF100  data") != std::string::npos &&
+               out.find("error active") != std::string::npos &&
                out.find(highlighted) != std::string::npos;
       },
       kToolDeadline))
@@ -181,18 +185,24 @@ TEST_F(KvmonSession, HardwareTableListsTheTenInterfacesForPeopleAndAsJson) {
   ASSERT_EQ(machine.WaitForExit(kToolDeadline), 0) << machine.err();
   const auto objects = JsonObjects(machine.out());
   ASSERT_EQ(objects.size(), 10u);
-  EXPECT_EQ(objects[5], json::parse(R"({"interface":"CAN6","port":6,"protocol":0,"bus":"CAN","can_fd":true})"));
-  EXPECT_EQ(objects[8], json::parse(R"({"interface":"FlexRay1","port":1,"protocol":1,"bus":"FlexRay","can_fd":false})"));
+  EXPECT_EQ(objects[5],
+            json::parse(R"({"interface":"CAN6","port":6,"protocol":0,"bus":"CAN","can_fd":true})"));
+  EXPECT_EQ(
+      objects[8],
+      json::parse(
+          R"({"interface":"FlexRay1","port":1,"protocol":1,"bus":"FlexRay","can_fd":false})"));
 }
 
 TEST_F(KvmonSession, TransmitFrameDefinedWithTxIsSeenOnTheOtherInterfaceOfTheBus) {
   auto watcher = Start({"--json", "CAN4"});
-  auto sender = Start({"--run-mode", "normal", "--baud", "500000", "--tx", "123#11223344", "--tx-every", "20", "CAN3"});
+  auto sender = Start({"--run-mode", "normal", "--baud", "500000", "--tx", "123#11223344",
+                       "--tx-every", "20", "CAN3"});
   EXPECT_TRUE(watcher.ReadUntil(
       [](const std::string& out) {
         auto latest = LatestRecords(out);
         auto found = latest.find("291/data");
-        return found != latest.end() && found->second["data"] == "11223344" && found->second["count"] >= 2;
+        return found != latest.end() && found->second["data"] == "11223344" &&
+               found->second["count"] >= 2;
       },
       kToolDeadline))
       << watcher.out() << watcher.err() << sender.err();
@@ -237,7 +247,8 @@ uint16_t PortWithoutListener() {
 
 TEST_F(KvmonSession, MissingControllerIsReportedAfterTheWait) {
   auto kvmon = KvmonProcess::WithPipes(
-      KVMON_PATH, {"-c", "127.0.0.1:" + std::to_string(PortWithoutListener()), "-w", "0.5", "CAN1"});
+      KVMON_PATH,
+      {"-c", "127.0.0.1:" + std::to_string(PortWithoutListener()), "-w", "0.5", "CAN1"});
   EXPECT_EQ(kvmon.WaitForExit(kToolDeadline), 1);
   EXPECT_NE(kvmon.err().find("cannot connect to the controller"), std::string::npos) << kvmon.err();
   EXPECT_NE(kvmon.err().find("is it running?"), std::string::npos) << kvmon.err();

@@ -20,16 +20,22 @@ namespace {
 TEST(KvmonPlainWords, ControllerErrorsAreToldInPlainWords) {
   const std::pair<const char*, const char*> cases[] = {
       {"<ERROR: WRONG PORT NAME>\n", "no interface named 'ETH1'"},
-      {"<ERROR: -1074384832>\n", "could not open the session on ETH1: no such interface (status 0xBFF63040)"},
+      {"<ERROR: -1074384832>\n",
+       "could not open the session on ETH1: no such interface (status 0xBFF63040)"},
       {"<ERROR: -1074384374>\n", "J1939 address could not be claimed"},
       {"<ERROR: CMD_SESSION_START: no Alias and Cluster defined>\n", "give --alias and --cluster"},
       {"<ERROR: CAN session is already started>\n", "already has a session"},
-      {"<ERROR: Heartbeat message missing| TCP Client disconnect> \n", "no heartbeat from this host for 10 seconds"},
-      {"<ERROR: SET_PROP_TX_TIME_STATISTIC: Value range error>\n", "refused the value of --stats-period"},
-      {"<ERROR: SET_PROP_SESSION_RUNMODE: LIN Session yet created>\n", "--run-mode cannot be changed while a session"},
+      {"<ERROR: Heartbeat message missing| TCP Client disconnect> \n",
+       "no heartbeat from this host for 10 seconds"},
+      {"<ERROR: SET_PROP_TX_TIME_STATISTIC: Value range error>\n",
+       "refused the value of --stats-period"},
+      {"<ERROR: SET_PROP_SESSION_RUNMODE: LIN Session yet created>\n",
+       "--run-mode cannot be changed while a session"},
       {"<ERROR: SET_PROP_LOGFILE_VORA_GROUP_NAME: empty paramter>\n", "--log-group needs a value"},
-      {"<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n", "cannot be changed while the session logs"},
-      {"<ERROR:LOG FILE: -20> \n", "logging failed on the controller: the log file could not be opened (status -20)"},
+      {"<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n",
+       "cannot be changed while the session logs"},
+      {"<ERROR:LOG FILE: -20> \n",
+       "logging failed on the controller: the log file could not be opened (status -20)"},
       {"<ERROR:LOG FILE: -24> \n", "measurement-data library"},
       {"<ERROR: unknown SETPROP command>\n", "does not know this setting"},
       {"<ERROR: something new>\n", "the controller reports: something new"},
@@ -110,7 +116,8 @@ TEST(KvmonTerminalView, LongPayloadsAreCutToTheWindowWithTheCountOfHiddenBytes) 
   view.ShowRecords(Bus::kCan, {Record(0x200, ramp, 2)}, 0);
   for (const int columns : {40, 60, 80, 96, 132, 240}) {
     const auto lines = view.Lines(TerminalSize{columns, 24});
-    for (const auto& line : lines) EXPECT_LT(Visible(line).size(), static_cast<size_t>(columns)) << Visible(line);
+    for (const auto& line : lines)
+      EXPECT_LT(Visible(line).size(), static_cast<size_t>(columns)) << Visible(line);
     const std::string row = Visible(lines[2]);
     EXPECT_EQ(row.rfind("200 ", 0), 0u) << row;
     if (columns >= 60 && columns < 240) {  // narrower windows cut the row before the payload
@@ -137,7 +144,8 @@ std::string StateText(const BusReport& report, const std::string& name) {
 
 TEST(KvmonBusReport, StatisticsBlocksAreDecodedByBusWithTheirStateWords) {
   // CAN: error passive, last error acknowledge, TEC 128, REC 3, load 12.34 %.
-  const auto can = DecodeBusReport(Words({10, 1, 20, 2, 30, 3, 40, 4, 1234, 2000, 0, 1, 3, 3, 128, 0, 0}));
+  const auto can =
+      DecodeBusReport(Words({10, 1, 20, 2, 30, 3, 40, 4, 1234, 2000, 0, 1, 3, 3, 128, 0, 0}));
   ASSERT_TRUE(can);
   EXPECT_EQ(can->bus, Bus::kCan);
   EXPECT_EQ(can->frames[1].name, "extended");
@@ -155,7 +163,8 @@ TEST(KvmonBusReport, StatisticsBlocksAreDecodedByBusWithTheirStateWords) {
   EXPECT_EQ(StateText(*lin, "last_error"), "no response");
   EXPECT_EQ(StateText(*lin, "last_error_id"), "12");
 
-  const auto flexRay = DecodeBusReport(Words({9, 1, 3, 1, 0, 0, 2, 0, 1, 0, 0, 100, 9, 3, 0, 0, 17, 3}));
+  const auto flexRay =
+      DecodeBusReport(Words({9, 1, 3, 1, 0, 0, 2, 0, 1, 0, 0, 100, 9, 3, 0, 0, 17, 3}));
   ASSERT_TRUE(flexRay);
   EXPECT_EQ(StateText(*flexRay, "state"), "normal active");
   EXPECT_EQ(StateText(*flexRay, "channels"), "A+B");
@@ -166,13 +175,16 @@ TEST(KvmonBusReport, StatisticsBlocksAreDecodedByBusWithTheirStateWords) {
 
 TEST(KvmonLines, RecordLinesCarryIdentifierTypePayloadCountAndPeriod) {
   auto extended = Record(0x20000000 | 0x18FEF100, {0x00, 0x11}, 7);
-  extended.lastTimestamp = 116444736000000000ULL + 10'000'000ULL * 5 + 1234567;  // 1970 + 5.1234567 s
-  extended.previousTimestamp = extended.lastTimestamp - 1'000'000;               // 100 ms before
+  extended.lastTimestamp =
+      116444736000000000ULL + 10'000'000ULL * 5 + 1234567;          // 1970 + 5.1234567 s
+  extended.previousTimestamp = extended.lastTimestamp - 1'000'000;  // 100 ms before
   EXPECT_EQ(PlainLines::RecordLine("CAN1", Bus::kCan, extended),
             "5.123456 CAN1 18FEF100 data [2] 00 11 count=7 period=100.000ms");
   EXPECT_EQ(JsonLines::RecordObject("CAN1", Bus::kCan, extended),
-            "{\"kind\":\"record\",\"interface\":\"CAN1\",\"bus\":\"CAN\",\"id\":419361024,\"extended\":true,"
-            "\"type\":\"data\",\"type_code\":0,\"length\":2,\"data\":\"0011\",\"count\":7,\"period_ms\":100.0000,"
+            "{\"kind\":\"record\",\"interface\":\"CAN1\",\"bus\":\"CAN\",\"id\":419361024,"
+            "\"extended\":true,"
+            "\"type\":\"data\",\"type_code\":0,\"length\":2,\"data\":\"0011\",\"count\":7,\"period_"
+            "ms\":100.0000,"
             "\"timestamp\":116444736051234567,\"echo\":false}");
 
   auto slot = Record(40, {0x40}, 1);

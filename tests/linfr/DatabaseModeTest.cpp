@@ -24,9 +24,13 @@ TEST(DatabaseModeTest, ClusterBaudRateReplacesTheHostsValue) {
   };
   const Case cases[] = {
       {"LIN", 19200,
-       [](HostConnection& c) { return CLIN(&c).openLinSession("LIN1@qv_corle_tarvix", kHostBaudRate); }},
+       [](HostConnection& c) {
+         return CLIN(&c).openLinSession("LIN1@qv_corle_tarvix", kHostBaudRate);
+       }},
       {"FlexRay", 10000000,
-       [](HostConnection& c) { return CFlexRay(&c).openFlexRaySession("FlexRay1@qv_corle_tarvix", 0); }},
+       [](HostConnection& c) {
+         return CFlexRay(&c).openFlexRaySession("FlexRay1@qv_corle_tarvix", 0);
+       }},
   };
   for (const Case& c : cases) {
     SCOPED_TRACE(c.cluster);

@@ -97,10 +97,9 @@ TEST_F(LinFlexRayTest, DatabaseModeShowsEverySlotOnEachOfItsChannels) {
 // number follows the last frame.
 TEST_F(LinFlexRayTest, NullFramesJoinTheirSlotAndStatisticsOnlyWhenShown) {
   kvhost::HostClient shown = StartedHost(With(kDatabase, "SET_PROP_SESSION_SHOW_NULL_FRAMES=1"));
-  kvhost::HostClient hidden = StartedHost({"SET_PROP_SESSION_PORTNAME=FlexRay2",
-                                           "SET_PROP_SESSION_RUNMODE=NORMAL",
-                                           "SET_PROP_SESSION_ALIAS=SimDB",
-                                           "SET_PROP_SESSION_CLUSTER=FlexRay"});
+  kvhost::HostClient hidden =
+      StartedHost({"SET_PROP_SESSION_PORTNAME=FlexRay2", "SET_PROP_SESSION_RUNMODE=NORMAL",
+                   "SET_PROP_SESSION_ALIAS=SimDB", "SET_PROP_SESSION_CLUSTER=FlexRay"});
 
   auto mixed = RecordsWhere(shown, kvhost::kFlexRayRecords, [](const BusRecords& m) {
     const Record* slot3 = m.find(3);
@@ -150,7 +149,8 @@ TEST_F(LinFlexRayTest, NullFramesJoinTheirSlotAndStatisticsOnlyWhenShown) {
 // The key slot is set, before the start, only when given (the database mode's start calls above
 // show that it is not set by default); 0 is given too, and the value may be hexadecimal.
 TEST_F(LinFlexRayTest, KeySlotIsSetBeforeTheStartOnlyWhenGiven) {
-  const std::tuple<std::string, std::string, uint32_t> cases[] = {{"FlexRay1", "0", 0}, {"FlexRay2", "0x10", 16}};
+  const std::tuple<std::string, std::string, uint32_t> cases[] = {{"FlexRay1", "0", 0},
+                                                                  {"FlexRay2", "0x10", 16}};
   tarvix::StartRecording();
   for (const auto& [port, text, value] : cases) {
     SCOPED_TRACE(port);
@@ -268,13 +268,14 @@ TEST_P(BusTextsTest, SessionCommandsAnswerWithTheTextsOfTheBus) {
 
 INSTANTIATE_TEST_SUITE_P(
     Buses, BusTextsTest,
-    ::testing::Values(
-        BusTexts{"LIN", "SET_PROP_SESSION_PORTNAME=LIN1", "LIN1", "<LIN Error: 0>  <TCP Error: 0> \n",
-                 "<ERROR: LIN session is already started>\n",
-                 "<ERROR: SET_PROP_SESSION_TERMINATION: LIN Session yet created>\n"},
-        BusTexts{"FlexRay", kPort, "FlexRay1", "<FlexRay Error: 0>  <TCP Error: 0> \n",
-                 "<ERROR: FlexRay session is already started>\n",
-                 "<ERROR: SET_PROP_SESSION_TERMINATION: FR Session yet created>\n"}),
+    ::testing::Values(BusTexts{"LIN", "SET_PROP_SESSION_PORTNAME=LIN1", "LIN1",
+                               "<LIN Error: 0>  <TCP Error: 0> \n",
+                               "<ERROR: LIN session is already started>\n",
+                               "<ERROR: SET_PROP_SESSION_TERMINATION: LIN Session yet created>\n"},
+                      BusTexts{"FlexRay", kPort, "FlexRay1",
+                               "<FlexRay Error: 0>  <TCP Error: 0> \n",
+                               "<ERROR: FlexRay session is already started>\n",
+                               "<ERROR: SET_PROP_SESSION_TERMINATION: FR Session yet created>\n"}),
     [](const auto& info) { return std::string(info.param.name); });
 
 }  // namespace

@@ -1,4 +1,5 @@
-// Hosts that monitor LIN and FlexRay sessions over TCP, and the helpers that read what they receive.
+// Hosts that monitor LIN and FlexRay sessions over TCP, and the helpers that read what they
+// receive.
 #include "tests/linfr/LinFlexRayFixture.h"
 
 namespace kvtest {

@@ -40,11 +40,13 @@ class LinFlexRayTest : public ServiceFixture {
                                          const std::function<bool(const BusRecords&)>& accept);
   // The next statistics message of a LIN or FlexRay session for which `accept` holds.
   std::optional<kvhost::LinStatisticsView> LinStatisticsWhere(
-      kvhost::HostClient& host, const std::function<bool(const kvhost::LinStatisticsView&)>& accept) {
+      kvhost::HostClient& host,
+      const std::function<bool(const kvhost::LinStatisticsView&)>& accept) {
     return StatisticsWhere(host, kvhost::DecodeLinStatistics, accept);
   }
   std::optional<kvhost::FlexRayStatisticsView> FlexRayStatisticsWhere(
-      kvhost::HostClient& host, const std::function<bool(const kvhost::FlexRayStatisticsView&)>& accept) {
+      kvhost::HostClient& host,
+      const std::function<bool(const kvhost::FlexRayStatisticsView&)>& accept) {
     return StatisticsWhere(host, kvhost::DecodeFlexRayStatistics, accept);
   }
   template <typename Decode, typename View>

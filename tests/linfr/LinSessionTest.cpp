@@ -45,7 +45,8 @@ const std::vector<std::pair<std::string, uint32_t>> kReceiveProperties = {
     {"kxSetProperty", driver::kPropLinChecksumFlag},
 };
 
-std::vector<std::pair<std::string, uint32_t>> Then(std::vector<std::pair<std::string, uint32_t>> a) {
+std::vector<std::pair<std::string, uint32_t>> Then(
+    std::vector<std::pair<std::string, uint32_t>> a) {
   a.insert(a.end(), kReceiveProperties.begin(), kReceiveProperties.end());
   return a;
 }
@@ -105,8 +106,8 @@ INSTANTIATE_TEST_SUITE_P(Modes, LinModeTest, ::testing::ValuesIn(kModes),
                          [](const auto& info) { return std::string(info.param.name); });
 
 TEST_F(LinFlexRayTest, NoResponseFramesChecksumsAndStatisticsAsTheDriverSendsThem) {
-  kvhost::HostClient host =
-      StartedHost({kPort, "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1", "SET_PROP_SESSION_LOG_CHECKSUM=1"});
+  kvhost::HostClient host = StartedHost(
+      {kPort, "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1", "SET_PROP_SESSION_LOG_CHECKSUM=1"});
   auto message = RecordsWhere(host, kvhost::kLinRecords, [](const BusRecords& m) {
     return Has(m, {0x10, 0x11, 0x12, 0x13});
   });
@@ -148,7 +149,9 @@ TEST_F(LinFlexRayTest, IdentifierOfBothTypesKeepsOneEntryOfItsLastFrame) {
     "buses": [{"name": "lin", "protocol": "LIN", "slotMs": 10, "schedule": [
       {"id": "0x20", "length": 2, "payload": "AB CD"}, {"id": "0x20", "response": false}]}],
     "devices": [{"name": "SIM-LIN", "interfaces": [{"name": "LIN1", "bus": "lin", "port": 1}]}]
-  })", ".", &error)) << error;
+  })",
+                                        ".", &error))
+      << error;
   kvhost::HostClient host = StartedHost({kPort, "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"});
 
   std::set<uint8_t> typesSeen;
@@ -175,18 +178,16 @@ TEST_F(LinFlexRayTest, IdentifierOfBothTypesKeepsOneEntryOfItsLastFrame) {
 // which enter the table and the counters only when the host asked for them.
 TEST_F(LinFlexRayTest, BuiltInModeAtTheWrongBaudRateSeesOnlyBusErrors) {
   kvhost::HostClient quiet = StartedHost({kPort, kNormal, "SET_PROP_SESSION_BAUDRATE=9600"});
-  kvhost::HostClient errors = StartedHost({"SET_PROP_SESSION_PORTNAME=LIN2", kNormal,
-                                           "SET_PROP_SESSION_BAUDRATE=9600",
-                                           "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1"});
-  auto message = RecordsWhere(errors, kvhost::kLinRecords, [](const BusRecords& m) {
-    return !m.records.empty();
-  });
+  kvhost::HostClient errors =
+      StartedHost({"SET_PROP_SESSION_PORTNAME=LIN2", kNormal, "SET_PROP_SESSION_BAUDRATE=9600",
+                   "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1"});
+  auto message = RecordsWhere(errors, kvhost::kLinRecords,
+                              [](const BusRecords& m) { return !m.records.empty(); });
   ASSERT_TRUE(message.has_value());
   ASSERT_EQ(message->records.size(), 1u);
   EXPECT_EQ(message->records[0].type, kLinBusError);
-  auto counted = LinStatisticsWhere(errors, [](const kvhost::LinStatisticsView& s) {
-    return s.errorFrames > 0;
-  });
+  auto counted = LinStatisticsWhere(
+      errors, [](const kvhost::LinStatisticsView& s) { return s.errorFrames > 0; });
   ASSERT_TRUE(counted.has_value());
   EXPECT_EQ(counted->dataFrames, 0u);
 

@@ -1,11 +1,10 @@
 // Binary log records: copies taken from read batches, the file header, and reading back.
-#include "logging/BinaryLogFormat.h"
-
 #include <gtest/gtest.h>
 
 #include <cstring>
 #include <vector>
 
+#include "logging/BinaryLogFormat.h"
 #include "logging/BinaryRecordReader.h"
 #include "tests/logging/FrameBuilder.h"
 
@@ -54,10 +53,11 @@ std::vector<uint8_t> Records(std::initializer_list<FrameSpec> frames, BinaryReco
 }
 
 TEST(BinaryRecordReader, ReadsBackEveryRecordOfEachLayout) {
-  const auto fd = Records({{.identifier = 0x200, .type = 0x18, .payload = std::vector<uint8_t>(64, 7)},
-                           {.identifier = 0x321, .type = 0x01},
-                           {.identifier = 0x201, .type = 0x10, .payload = std::vector<uint8_t>(12, 9)}},
-                          BinaryRecordLayout::kCanVariable);
+  const auto fd =
+      Records({{.identifier = 0x200, .type = 0x18, .payload = std::vector<uint8_t>(64, 7)},
+               {.identifier = 0x321, .type = 0x01},
+               {.identifier = 0x201, .type = 0x10, .payload = std::vector<uint8_t>(12, 9)}},
+              BinaryRecordLayout::kCanVariable);
   ASSERT_EQ(fd.size(), 80u + 16 + 32);
   BinaryRecordReader reader(fd.data(), fd.size(), BinaryRecordLayout::kCanVariable);
   RawFrameView v;
@@ -74,7 +74,8 @@ TEST(BinaryRecordReader, ReadsBackEveryRecordOfEachLayout) {
 }
 
 TEST(BinaryRecordReader, CutLastRecordStaysUnread) {
-  auto lin = Records({{.type = 0x40, .payload = {1}}, {.type = 0x40, .payload = {2}}}, BinaryRecordLayout::kFixed24);
+  auto lin = Records({{.type = 0x40, .payload = {1}}, {.type = 0x40, .payload = {2}}},
+                     BinaryRecordLayout::kFixed24);
   lin.resize(lin.size() - 5);
   BinaryRecordReader reader(lin.data(), lin.size(), BinaryRecordLayout::kFixed24);
   RawFrameView v;
@@ -84,7 +85,8 @@ TEST(BinaryRecordReader, CutLastRecordStaysUnread) {
 }
 
 TEST(BinaryRecordReader, FixedRecordBoundsAnOverlongPayloadToItsEightBytes) {
-  const auto rec = Records({{.type = 0x10, .payload = std::vector<uint8_t>(20, 1)}}, BinaryRecordLayout::kFixed24);
+  const auto rec = Records({{.type = 0x10, .payload = std::vector<uint8_t>(20, 1)}},
+                           BinaryRecordLayout::kFixed24);
   BinaryRecordReader reader(rec.data(), rec.size(), BinaryRecordLayout::kFixed24);
   RawFrameView v;
   ASSERT_TRUE(reader.next(v));
@@ -92,13 +94,15 @@ TEST(BinaryRecordReader, FixedRecordBoundsAnOverlongPayloadToItsEightBytes) {
 }
 
 TEST(BinaryRecordReader, DetectsTheCanLayoutFromRecordsWithEmptyPayloads) {
-  const auto frames = {FrameSpec{.timestamp = 1, .identifier = 0x321, .type = 0x01},
-                       FrameSpec{.timestamp = 2, .identifier = 0x100, .payload = {1, 2, 3, 4, 5, 6, 7, 8}},
-                       FrameSpec{.timestamp = 3, .identifier = 0, .type = 0x02}};
+  const auto frames = {
+      FrameSpec{.timestamp = 1, .identifier = 0x321, .type = 0x01},
+      FrameSpec{.timestamp = 2, .identifier = 0x100, .payload = {1, 2, 3, 4, 5, 6, 7, 8}},
+      FrameSpec{.timestamp = 3, .identifier = 0, .type = 0x02}};
   const auto fixed = Records(frames, BinaryRecordLayout::kFixed24);
   const auto variable = Records(frames, BinaryRecordLayout::kCanVariable);
   EXPECT_EQ(DetectCanRecordLayout(fixed.data(), fixed.size()), BinaryRecordLayout::kFixed24);
-  EXPECT_EQ(DetectCanRecordLayout(variable.data(), variable.size()), BinaryRecordLayout::kCanVariable);
+  EXPECT_EQ(DetectCanRecordLayout(variable.data(), variable.size()),
+            BinaryRecordLayout::kCanVariable);
 }
 
 }  // namespace

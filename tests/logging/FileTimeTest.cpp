@@ -1,12 +1,12 @@
 // Time stamp to calendar conversion: fixed dates and a sweep against the C library's UTC calendar.
-#include "logging/FileTime.h"
-
 #include <gtest/gtest.h>
 
 #include <cstdint>
 #include <ctime>
 #include <random>
 #include <vector>
+
+#include "logging/FileTime.h"
 
 namespace nKV_DLL300 {
 namespace {
@@ -20,14 +20,15 @@ struct DateCase {
 };
 void PrintTo(const DateCase& c, std::ostream* os) { *os << c.name; }
 
-
 const DateCase kDates[] = {
     {"Epoch1601IsMonday", 0, {1601, 1, 1, 1, 0, 0, 0, 0}},
     {"LastTickOfFirstDay", kFileTimeTicksPerDay - 1, {1601, 1, 1, 1, 23, 59, 59, 999}},
     {"UnixEpochThursday", kFileTimeUnixEpoch, {1970, 1, 4, 1, 0, 0, 0, 0}},
-    {"CenturyLeapDay2000", kFileTimeUnixEpoch + 951'782'400ull * kFileTimeTicksPerSecond,
+    {"CenturyLeapDay2000",
+     kFileTimeUnixEpoch + 951'782'400ull * kFileTimeTicksPerSecond,
      {2000, 2, 2, 29, 0, 0, 0, 0}},
-    {"Year1900HasNoLeapDay", kFileTimeUnixEpoch - 2'203'891'200ull * kFileTimeTicksPerSecond,
+    {"Year1900HasNoLeapDay",
+     kFileTimeUnixEpoch - 2'203'891'200ull * kFileTimeTicksPerSecond,
      {1900, 3, 4, 1, 0, 0, 0, 0}},
     {"MillisecondsTruncated", 133'604'103'030'429'999ull, {2024, 5, 5, 17, 9, 5, 3, 42}},
     {"LargestConvertible", 0x7FFF'FFFF'FFFF'FFFFull, {30828, 9, 4, 14, 2, 48, 5, 477}},
@@ -65,15 +66,17 @@ TEST(FileTime, AgreesWithCLibraryUtcCalendarFrom1601To9999) {
   for (int i = 0; i < 20'000; ++i) {
     const int64_t unixSeconds = seconds(random);
     const uint64_t ms = random() % 1000;
-    const uint64_t fileTime = static_cast<uint64_t>(unixSeconds - firstSecond) * kFileTimeTicksPerSecond +
-                              ms * kTicksPerMs;
+    const uint64_t fileTime =
+        static_cast<uint64_t>(unixSeconds - firstSecond) * kFileTimeTicksPerSecond +
+        ms * kTicksPerMs;
     const time_t asTimeT = static_cast<time_t>(unixSeconds);
     std::tm tm{};
     ASSERT_NE(gmtime_r(&asTimeT, &tm), nullptr);
     CalendarTime t{};
     ASSERT_TRUE(FileTimeToCalendarTime(fileTime, t));
-    ASSERT_EQ(Fields(t), (std::vector<int64_t>{tm.tm_year + 1900, tm.tm_mon + 1, tm.tm_wday, tm.tm_mday,
-                                                tm.tm_hour, tm.tm_min, tm.tm_sec, static_cast<int64_t>(ms)}))
+    ASSERT_EQ(Fields(t),
+              (std::vector<int64_t>{tm.tm_year + 1900, tm.tm_mon + 1, tm.tm_wday, tm.tm_mday,
+                                    tm.tm_hour, tm.tm_min, tm.tm_sec, static_cast<int64_t>(ms)}))
         << unixSeconds;
   }
 }

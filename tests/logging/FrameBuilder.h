@@ -25,8 +25,10 @@ struct FrameSpec {
 
 // Appends one frame with its payload padded to the driver's payload area (pad bytes `pad`).
 inline void AppendFrame(std::vector<uint8_t>& batch, const FrameSpec& f, uint8_t pad = 0) {
-  nKV_DLL300::RawFrameHeader h{f.timestamp, f.identifier, f.type, f.flags, f.info,
-                               static_cast<uint8_t>(f.lengthByte >= 0 ? f.lengthByte : f.payload.size())};
+  nKV_DLL300::RawFrameHeader h{
+      f.timestamp, f.identifier,
+      f.type,      f.flags,
+      f.info,      static_cast<uint8_t>(f.lengthByte >= 0 ? f.lengthByte : f.payload.size())};
   const uint32_t area = nKV_DLL300::RawPayloadArea(nKV_DLL300::RawPayloadLength(h));
   const size_t at = batch.size();
   batch.resize(at + nKV_DLL300::kRawFrameHeaderSize + area, pad);

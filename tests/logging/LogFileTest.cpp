@@ -1,6 +1,4 @@
 // Log file life cycle: naming, truncation, the open failures and their reports, closing.
-#include "logging/LogFile.h"
-
 #include <sys/resource.h>
 
 #include <csignal>
@@ -8,6 +6,7 @@
 #include <functional>
 #include <tuple>
 
+#include "logging/LogFile.h"
 #include "logging/LogFileName.h"
 #include "logging/LogWriters.h"
 #include "tests/logging/FrameBuilder.h"
@@ -38,7 +37,8 @@ TEST(LogFileNameTest, OnlyPlainNamesAreFileNames) {
   for (const char* name : {"run", "", "run.1", "...", " a b ", "C:x", "..a"}) {
     EXPECT_TRUE(IsPlainFileName(name)) << name;
   }
-  for (const std::string& name : std::vector<std::string>{"a/b", "a\\b", ".", "..", "..\\..\\x", "/etc/passwd", std::string("a\0b", 3)}) {
+  for (const std::string& name : std::vector<std::string>{"a/b", "a\\b", ".", "..", "..\\..\\x",
+                                                          "/etc/passwd", std::string("a\0b", 3)}) {
     EXPECT_FALSE(IsPlainFileName(name)) << name;
   }
 }
@@ -47,9 +47,11 @@ using LogFileTest = LogSessionTest;
 
 // An empty name is a file of the bare extension; a run without frames leaves the header alone.
 TEST_F(LogFileTest, EmptyRunLeavesTheHeaderOfItsType) {
-  const std::string binaryHeader(reinterpret_cast<const char*>(kBinaryLogFileHeaderBytes.data()), 12);
-  for (const auto& [type, file, expected] : {std::tuple{kLogTypeText, ".txt", std::string(kHeader) + "\n"},
-                                             std::tuple{kLogTypeBinary, ".zfl", binaryHeader}}) {
+  const std::string binaryHeader(reinterpret_cast<const char*>(kBinaryLogFileHeaderBytes.data()),
+                                 12);
+  for (const auto& [type, file, expected] :
+       {std::tuple{kLogTypeText, ".txt", std::string(kHeader) + "\n"},
+        std::tuple{kLogTypeBinary, ".zfl", binaryHeader}}) {
     settings().logFileType.store(type);
     OpenLogFile(log(), kHeader);
     CloseLogFile(log());
@@ -90,14 +92,16 @@ TEST_F(LogFileTest, UnsafeNamesCreateNothingAndReportTwice) {
   CloseLogFile(log());
   fs::remove(ServiceDirectory() / "ok.txt");
   const std::vector<std::string> before = FilesBelow(drive_.path());
-  for (const std::string& name : std::vector<std::string>{"..\\..\\..\\escaped", "../../../escaped", "sub/escaped", ".", "..",
-                           "\\escaped", std::string("cut\0..\\x", 8)}) {
+  for (const std::string& name :
+       std::vector<std::string>{"..\\..\\..\\escaped", "../../../escaped", "sub/escaped", ".", "..",
+                                "\\escaped", std::string("cut\0..\\x", 8)}) {
     for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
       settings().logFileName.Set(name);
       settings().logFileType.store(type);
       OpenLogFile(log(), kHeader);
       CloseLogFile(log());
-      EXPECT_EQ(SentErrorTexts(), std::vector<std::string>(2, LogErrorText(kLogOpenFailed))) << name;
+      EXPECT_EQ(SentErrorTexts(), std::vector<std::string>(2, LogErrorText(kLogOpenFailed)))
+          << name;
       EXPECT_EQ(session().lastStatus.load(), kLogOpenFailed);
     }
   }
@@ -115,7 +119,9 @@ TEST_F(LogFileTest, OpenFailuresReportAndSkipTheRun) {
     std::function<void()> arrange;
     size_t reports;
   };
-  const auto block = [&](const char* file) { return [this, file] { fs::create_directories(ServiceDirectory() / file); }; };
+  const auto block = [&](const char* file) {
+    return [this, file] { fs::create_directories(ServiceDirectory() / file); };
+  };
   const Case cases[] = {
       {"unknown type: no name", 3, "any", [] {}, 1},
       // A directory where the file should be cannot be opened for writing, whoever runs the test.
@@ -142,7 +148,8 @@ TEST_F(LogFileTest, OpenFailuresReportAndSkipTheRun) {
     const std::vector<uint8_t> batch = OneCanFrame(0);
     WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
     CloseLogFile(log());
-    EXPECT_EQ(SentErrorTexts(), std::vector<std::string>(c.reports, LogErrorText(kLogOpenFailed))) << c.what;
+    EXPECT_EQ(SentErrorTexts(), std::vector<std::string>(c.reports, LogErrorText(kLogOpenFailed)))
+        << c.what;
     if (c.reports > 0) {
       EXPECT_EQ(session().lastStatus.load(), kLogOpenFailed) << c.what;
     }
@@ -165,7 +172,8 @@ TEST_F(LogFileTest, TypeChangedDuringTheRunKeepsTheFileItsFormat) {
   CloseLogFile(log());
   const std::optional<std::string> contents = ReadLog("steady.txt");
   ASSERT_TRUE(contents);
-  EXPECT_EQ(*contents, std::string(kHeader) + "\n09:05:03,042\t100\t07  01  02  03  04  05  06  07  \t8\tS\n");
+  EXPECT_EQ(*contents,
+            std::string(kHeader) + "\n09:05:03,042\t100\t07  01  02  03  04  05  06  07  \t8\tS\n");
 }
 
 // A file size limit stands for a full disk: writes beyond it fail (EFBIG), for root too.

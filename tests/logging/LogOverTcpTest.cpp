@@ -53,7 +53,9 @@ class LogOverTcpTest : public LogRunTest {
     ASSERT_EQ(kxdbSetProperty(frame, driver::kPropFrameIdentifier, 4, &identifier), 0);
     ASSERT_EQ(kxdbSetProperty(frame, driver::kPropFramePayloadLength, 4, &length), 0);
     ASSERT_EQ(kxdbSetProperty(frame, driver::kPropFrameTimingType, 4, &timing), 0);
-    ASSERT_EQ(kxCreateSession(database.c_str(), "Cluster", "TxFrame", sender, driver::kModeOutputQueued, &out), 0);
+    ASSERT_EQ(kxCreateSession(database.c_str(), "Cluster", "TxFrame", sender,
+                              driver::kModeOutputQueued, &out),
+              0);
     ASSERT_EQ(kxSetProperty(out, driver::kPropBaudRate, 8, &kRate), 0);
     std::vector<uint8_t> record(24, 0);
     std::memcpy(record.data() + 8, &identifier, 4);
@@ -66,9 +68,10 @@ class LogOverTcpTest : public LogRunTest {
 };
 
 TEST_F(LogOverTcpTest, CanTextLogHoldsExactLinesOfTheBodyTraffic) {
-  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=body", "SET_PROP_LOGFILE=1"},
-                  kvhost::kCanRecords)
-                  .empty());
+  EXPECT_TRUE(
+      Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=body", "SET_PROP_LOGFILE=1"},
+          kvhost::kCanRecords)
+          .empty());
   const std::vector<std::string> lines = Lines(LogFile("body.txt"));
   ASSERT_GT(lines.size(), 100u);
   EXPECT_EQ(lines[0], std::string(kCanTextLogHeader) + "\n");
@@ -79,7 +82,8 @@ TEST_F(LogOverTcpTest, CanTextLogHoldsExactLinesOfTheBodyTraffic) {
     if (std::regex_match(rest, counterFrame)) {
       ++kinds["100"];
     } else if (rest == "1a0\taa  bb  cc  \t3\tS\n" || rest == "321\t\t0\tS/R\n" ||
-               rest == "18fef100\t00  11  22  33  44  55  66  77  \t8\tE\n" || rest == "0\t\t0\tS\n") {
+               rest == "18fef100\t00  11  22  33  44  55  66  77  \t8\tE\n" ||
+               rest == "0\t\t0\tS\n") {
       ++kinds[rest.substr(0, rest.find('\t'))];
     } else {
       ADD_FAILURE() << "unexpected line " << lines[i];
@@ -91,9 +95,10 @@ TEST_F(LogOverTcpTest, CanTextLogHoldsExactLinesOfTheBodyTraffic) {
 }
 
 TEST_F(LogOverTcpTest, FdTextAndBinaryLogsShowSwitchingAndVariableRecords) {
-  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=CAN5", "SET_PROP_LOGFILE_NAME=fd", "SET_PROP_LOGFILE=1"},
-                  kvhost::kCanRecords)
-                  .empty());
+  EXPECT_TRUE(
+      Run({"SET_PROP_SESSION_PORTNAME=CAN5", "SET_PROP_LOGFILE_NAME=fd", "SET_PROP_LOGFILE=1"},
+          kvhost::kCanRecords)
+          .empty());
   std::map<std::string, int> seen;
   for (const std::string& line : Lines(LogFile("fd.txt"))) {
     if (line == std::string(kCanTextLogHeader) + "\n") continue;
@@ -102,20 +107,24 @@ TEST_F(LogOverTcpTest, FdTextAndBinaryLogsShowSwitchingAndVariableRecords) {
     ++seen[id];
     if (id == "200") {
       std::string payload;
-      for (int i = 0; i < 64; ++i) payload += (i < 16 ? "0" : "") + (std::stringstream() << std::hex << i).str() + "  ";
+      for (int i = 0; i < 64; ++i)
+        payload += (i < 16 ? "0" : "") + (std::stringstream() << std::hex << i).str() + "  ";
       EXPECT_EQ(rest, "200\t" + payload + "\t64\tBRS\n");
     } else if (id == "201") {
       EXPECT_EQ(rest, "201\ta0  a1  a2  a3  a4  a5  a6  a7  a8  a9  aa  ab  \t12\tFD\n");
     } else if (id == "1abcde00") {
-      EXPECT_EQ(rest, "1abcde00\tf0  f1  f2  f3  f4  f5  f6  f7  f8  f9  fa  fb  fc  fd  fe  ff  \t16\tE/BRS\n");
+      EXPECT_EQ(rest,
+                "1abcde00\tf0  f1  f2  f3  f4  f5  f6  f7  f8  f9  fa  fb  fc  fd  fe  ff  "
+                "\t16\tE/BRS\n");
     } else {
-      EXPECT_TRUE(std::regex_match(rest, std::regex(R"(^80\t[0-9a-f]{2}  (00  ){7}\t8\tS\n$)"))) << line;
+      EXPECT_TRUE(std::regex_match(rest, std::regex(R"(^80\t[0-9a-f]{2}  (00  ){7}\t8\tS\n$)")))
+          << line;
     }
   }
   for (const char* id : {"200", "201", "1abcde00", "80"}) EXPECT_GT(seen[id], 0) << id;
 
-  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=CAN5", "SET_PROP_LOGFILE_NAME=fd", "SET_PROP_LOGFILE=1",
-                   "SET_PROP_LOGFILE_TYPE=1"},
+  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=CAN5", "SET_PROP_LOGFILE_NAME=fd",
+                   "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=1"},
                   kvhost::kCanRecords)
                   .empty());
   const std::string file = LogFile("fd.zfl");
@@ -124,7 +133,8 @@ TEST_F(LogOverTcpTest, FdTextAndBinaryLogsShowSwitchingAndVariableRecords) {
       {0x200, 80}, {0x201, 32}, {kExtendedFlag | 0x1ABCDE00, 32}, {0x080, 24}};
   std::map<uint32_t, int> counted;
   size_t remaining = 1, total = 12;
-  for (const RawFrameView& frame : ReadRecords(file, BinaryRecordLayout::kCanVariable, &remaining)) {
+  for (const RawFrameView& frame :
+       ReadRecords(file, BinaryRecordLayout::kCanVariable, &remaining)) {
     ASSERT_TRUE(sizes.count(frame.header.identifier)) << std::hex << frame.header.identifier;
     total += sizes.at(frame.header.identifier);
     ++counted[frame.header.identifier];
@@ -135,14 +145,16 @@ TEST_F(LogOverTcpTest, FdTextAndBinaryLogsShowSwitchingAndVariableRecords) {
 }
 
 TEST_F(LogOverTcpTest, LinLogsHaveTheChecksumColumnNoResponseFramesAndFixedRecords) {
-  const std::vector<std::string> port = {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
-                                         "SET_PROP_SESSION_LOG_CHECKSUM=1", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1",
-                                         "SET_PROP_LOGFILE=1"};
+  const std::vector<std::string> port = {
+      "SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
+      "SET_PROP_SESSION_LOG_CHECKSUM=1", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1",
+      "SET_PROP_LOGFILE=1"};
   EXPECT_TRUE(Run(port, kvhost::kLinRecords).empty());
   const std::vector<std::string> lines = Lines(LogFile(".txt"));
   ASSERT_GT(lines.size(), 20u);
   EXPECT_EQ(lines[0], std::string(kLinTextLogHeaderWithChecksum) + "\n");
-  const std::regex line(R"(^(10\t12  34  (00  ){6}\t2\t[0-9a-f]{2}\tS|11\t[0-9a-f]{2}  01  02  03  04  05  06  07  \t8\t[0-9a-f]{2}\tS|12\t(00  ){8}\t0\t[0-9a-f]{2}\tNR|13\tde  ad  be  ef  (00  ){4}\t4\t[0-9a-f]{2}\tS)\n$)");
+  const std::regex line(
+      R"(^(10\t12  34  (00  ){6}\t2\t[0-9a-f]{2}\tS|11\t[0-9a-f]{2}  01  02  03  04  05  06  07  \t8\t[0-9a-f]{2}\tS|12\t(00  ){8}\t0\t[0-9a-f]{2}\tNR|13\tde  ad  be  ef  (00  ){4}\t4\t[0-9a-f]{2}\tS)\n$)");
   std::map<char, int> ids;
   for (size_t i = 1; i < lines.size(); ++i) {
     const std::string rest = AfterTime(lines[i]);
@@ -157,19 +169,22 @@ TEST_F(LogOverTcpTest, LinLogsHaveTheChecksumColumnNoResponseFramesAndFixedRecor
   const std::string file = LogFile("lin.zfl");
   ASSERT_GT(file.size(), 12u + 24u);
   EXPECT_EQ((file.size() - 12) % 24, 0u);
-  EXPECT_TRUE(RecordsAreConsistent(reinterpret_cast<const uint8_t*>(file.data()) + 12, file.size() - 12,
-                                   BinaryRecordLayout::kFixed24, RecordBus::kLin));
+  EXPECT_TRUE(RecordsAreConsistent(reinterpret_cast<const uint8_t*>(file.data()) + 12,
+                                   file.size() - 12, BinaryRecordLayout::kFixed24,
+                                   RecordBus::kLin));
 }
 
 TEST_F(LogOverTcpTest, FlexRayTextLogShowsChannelsStartupAndSync) {
-  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=FlexRay1", "SET_PROP_LOGFILE_NAME=fr", "SET_PROP_LOGFILE=1"},
-                  kvhost::kFlexRayRecords)
-                  .empty());
+  EXPECT_TRUE(
+      Run({"SET_PROP_SESSION_PORTNAME=FlexRay1", "SET_PROP_LOGFILE_NAME=fr", "SET_PROP_LOGFILE=1"},
+          kvhost::kFlexRayRecords)
+          .empty());
   const std::vector<std::string> lines = Lines(LogFile("fr.txt"));
   ASSERT_GT(lines.size(), 20u);
   EXPECT_EQ(lines[0], std::string(kFlexRayTextLogHeader) + "\n");
   std::map<std::string, int> kinds;
-  const std::regex cells(R"(^([0-9a-f]+)\t((?:[0-9a-f]{2}  )*)\t(\d+)\t(\d+)\t([AB-])\t([X-])\t([X-])\t([X-])\n$)");
+  const std::regex cells(
+      R"(^([0-9a-f]+)\t((?:[0-9a-f]{2}  )*)\t(\d+)\t(\d+)\t([AB-])\t([X-])\t([X-])\t([X-])\n$)");
   for (size_t i = 1; i < lines.size(); ++i) {
     std::smatch m;
     const std::string rest = AfterTime(lines[i]);
@@ -187,16 +202,17 @@ TEST_F(LogOverTcpTest, FlexRayTextLogShowsChannelsStartupAndSync) {
 TEST_F(LogOverTcpTest, BinaryLogHoldsEveryFrameOfTheBusCaptureInOrder) {
   const std::string capture = (drive_.path() / "body.log").string();
   std::string error;
-  ASSERT_TRUE(tarvix::LoadConfiguration(R"({"buses":[{"name":"body","capture":")" + capture + R"(","traffic":[
+  ASSERT_TRUE(tarvix::LoadConfiguration(
+      R"({"buses":[{"name":"body","capture":")" + capture + R"(","traffic":[
       {"id":"0x100","length":8,"periodMs":10,"payload":"ctr 01 02 03 04 05 06 07"},
       {"id":"0x1A0","length":3,"periodMs":50,"payload":"AA BB CC"},
       {"id":"0x321","kind":"remote","periodMs":500},
       {"id":"0x18FEF100","extended":true,"length":8,"periodMs":100,"payload":"00 11 22 33 44 55 66 77"}]}],
       "devices":[{"name":"SIM-CAN","interfaces":[{"name":"CAN1","bus":"body"}]}]})",
-                                        drive_.path().string(), &error))
+      drive_.path().string(), &error))
       << error;
-  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=cap", "SET_PROP_LOGFILE_TYPE=1",
-                   "SET_PROP_LOGFILE=1"},
+  EXPECT_TRUE(Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=cap",
+                   "SET_PROP_LOGFILE_TYPE=1", "SET_PROP_LOGFILE=1"},
                   kvhost::kCanRecords)
                   .empty());
   tarvix::ResetToDefaults();  // closes the capture
@@ -208,10 +224,12 @@ TEST_F(LogOverTcpTest, BinaryLogHoldsEveryFrameOfTheBusCaptureInOrder) {
     const RawFrameHeader& h = frame.header;
     const uint64_t micros = (h.timestamp - kFileTimeUnixEpoch) / 10;
     char text[96];
-    int n = std::snprintf(text, sizeof text, "(%llu.%06llu) body ", static_cast<unsigned long long>(micros / 1000000),
+    int n = std::snprintf(text, sizeof text, "(%llu.%06llu) body ",
+                          static_cast<unsigned long long>(micros / 1000000),
                           static_cast<unsigned long long>(micros % 1000000));
-    n += (h.identifier & kExtendedFlag) ? std::snprintf(text + n, sizeof text - n, "%08X#", h.identifier & 0x1FFFFFFF)
-                                        : std::snprintf(text + n, sizeof text - n, "%03X#", h.identifier & 0x7FF);
+    n += (h.identifier & kExtendedFlag)
+             ? std::snprintf(text + n, sizeof text - n, "%08X#", h.identifier & 0x1FFFFFFF)
+             : std::snprintf(text + n, sizeof text - n, "%03X#", h.identifier & 0x7FF);
     if (h.type == kTypeRemote) n += std::snprintf(text + n, sizeof text - n, "R");
     for (uint32_t i = 0; h.type != kTypeRemote && i < h.length; ++i) {
       n += std::snprintf(text + n, sizeof text - n, "%02X", frame.payload[i]);
@@ -232,12 +250,14 @@ TEST_F(LogOverTcpTest, EchoFramesAreLoggedOnlyWithTheSetting) {
   // CAN3's own frames come back to its session as echoes; CAN4's frames are ordinary traffic.
   for (uint8_t logTransmitted : {0, 1}) {
     std::vector<std::string> errors;
-    kvhost::HostClient host = Configured({"SET_PROP_SESSION_PORTNAME=CAN3", "SET_PROP_LOGFILE_NAME=echo",
-                                          "SET_PROP_LOGFILE_TYPE=1", "SET_PROP_LOGFILE=1",
-                                          "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=" + std::to_string(logTransmitted)},
-                                         errors);
+    kvhost::HostClient host =
+        Configured({"SET_PROP_SESSION_PORTNAME=CAN3", "SET_PROP_LOGFILE_NAME=echo",
+                    "SET_PROP_LOGFILE_TYPE=1", "SET_PROP_LOGFILE=1",
+                    "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=" + std::to_string(logTransmitted)},
+                   errors);
     EXPECT_TRUE(errors.empty());
-    for (const char* sender : {"CAN3", "CAN4"}) SendOneFrame(sender, sender[3] == '3' ? 0x33 : 0x44);
+    for (const char* sender : {"CAN3", "CAN4"})
+      SendOneFrame(sender, sender[3] == '3' ? 0x33 : 0x44);
     // Both frames are in the identifier table once they were read: the log has had its batch.
     ASSERT_TRUE(RecordsWhere(host, [](const RecordMessage& m) { return m.find(0x44) != nullptr; }));
     Terminate(host);
@@ -256,12 +276,15 @@ TEST_F(LogOverTcpTest, EchoFramesAreLoggedOnlyWithTheSetting) {
 // service directory is refused when set, and the session logs to the default name.
 TEST_F(LogOverTcpTest, BadFilesAndNamesAreReported) {
   std::filesystem::create_directories(LogPath("blocked.txt"));
-  EXPECT_EQ(Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=blocked", "SET_PROP_LOGFILE=1"},
-                kvhost::kCanRecords),
-            std::vector<std::string>{"<ERROR:LOG FILE: -20> \n"});
-  EXPECT_EQ(Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=..\\..\\outside", "SET_PROP_LOGFILE=1"},
-                kvhost::kCanRecords, 1),
-            std::vector<std::string>{"<ERROR: no valid file name, file name KelvaneLog will be used>\n"});
+  EXPECT_EQ(
+      Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=blocked", "SET_PROP_LOGFILE=1"},
+          kvhost::kCanRecords),
+      std::vector<std::string>{"<ERROR:LOG FILE: -20> \n"});
+  EXPECT_EQ(
+      Run({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=..\\..\\outside",
+           "SET_PROP_LOGFILE=1"},
+          kvhost::kCanRecords, 1),
+      std::vector<std::string>{"<ERROR: no valid file name, file name KelvaneLog will be used>\n"});
   EXPECT_FALSE(std::filesystem::exists(drive_.Native("QV-RT\\outside.txt")));
   EXPECT_FALSE(std::filesystem::exists(drive_.Native("outside.txt")));
   EXPECT_EQ(Lines(LogFile("KelvaneLog.txt")).at(0), std::string(kCanTextLogHeader) + "\n");

@@ -17,7 +17,8 @@ inline constexpr char kLogDirectory[] = "QV-RT\\tarvix\\kelvane\\";
 class LogRunTest : public CanSessionTest {
  protected:
   // Connects a host, sends `properties` (each answered; error texts kept) and starts a session.
-  kvhost::HostClient Configured(const std::vector<std::string>& properties, std::vector<std::string>& errors) {
+  kvhost::HostClient Configured(const std::vector<std::string>& properties,
+                                std::vector<std::string>& errors) {
     kvhost::HostClient host = ConnectHost();
     for (const std::string& property : properties) {
       std::optional<kvhost::HostMessage> reply = Command(host, property);
@@ -37,8 +38,8 @@ class LogRunTest : public CanSessionTest {
   }
 
   // Waits for `periods` non-empty identifier-record messages of `recordType`, keeping error texts.
-  void WaitForRecords(kvhost::HostClient& host, uint8_t recordType, std::vector<std::string>& errors,
-                      int periods = 2) {
+  void WaitForRecords(kvhost::HostClient& host, uint8_t recordType,
+                      std::vector<std::string>& errors, int periods = 2) {
     for (int seen = 0; seen < periods;) {
       std::optional<kvhost::HostMessage> m = NextMessage(host, [&](const kvhost::HostMessage& m) {
         if (m.header.type == kvhost::kErrorText) errors.push_back(m.text());
@@ -58,7 +59,8 @@ class LogRunTest : public CanSessionTest {
   }
 
   // One logging session run until `periods` record messages arrived; the error texts it received.
-  std::vector<std::string> Run(const std::vector<std::string>& properties, uint8_t recordType, int periods = 2) {
+  std::vector<std::string> Run(const std::vector<std::string>& properties, uint8_t recordType,
+                               int periods = 2) {
     std::vector<std::string> errors;
     kvhost::HostClient host = Configured(properties, errors);
     WaitForRecords(host, recordType, errors, periods);
@@ -66,7 +68,9 @@ class LogRunTest : public CanSessionTest {
     return errors;
   }
 
-  std::filesystem::path LogPath(const std::string& name) const { return drive_.Native(kLogDirectory + name); }
+  std::filesystem::path LogPath(const std::string& name) const {
+    return drive_.Native(kLogDirectory + name);
+  }
   std::string LogFile(const std::string& name) {
     std::optional<std::string> contents = drive_.ReadFile(kLogDirectory + name);
     EXPECT_TRUE(contents) << name;
@@ -78,8 +82,8 @@ class LogRunTest : public CanSessionTest {
 
 // The whole records of `bytes` (views into it) and the count of bytes after them.
 inline std::vector<nKV_DLL300::RawFrameView> ReadRecords(const uint8_t* bytes, size_t size,
-                                                          nKV_DLL300::BinaryRecordLayout layout,
-                                                          size_t* remaining = nullptr) {
+                                                         nKV_DLL300::BinaryRecordLayout layout,
+                                                         size_t* remaining = nullptr) {
   nKV_DLL300::BinaryRecordReader reader(bytes, size, layout);
   std::vector<nKV_DLL300::RawFrameView> records;
   for (nKV_DLL300::RawFrameView view; reader.next(view);) records.push_back(view);
@@ -88,10 +92,11 @@ inline std::vector<nKV_DLL300::RawFrameView> ReadRecords(const uint8_t* bytes, s
 }
 // The records of a binary log file, after its 12-byte header.
 inline std::vector<nKV_DLL300::RawFrameView> ReadRecords(const std::string& file,
-                                                          nKV_DLL300::BinaryRecordLayout layout,
-                                                          size_t* remaining = nullptr) {
+                                                         nKV_DLL300::BinaryRecordLayout layout,
+                                                         size_t* remaining = nullptr) {
   if (file.size() < 12) return {};
-  return ReadRecords(reinterpret_cast<const uint8_t*>(file.data()) + 12, file.size() - 12, layout, remaining);
+  return ReadRecords(reinterpret_cast<const uint8_t*>(file.data()) + 12, file.size() - 12, layout,
+                     remaining);
 }
 
 }  // namespace kvtest

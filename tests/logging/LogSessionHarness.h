@@ -3,11 +3,10 @@
 #pragma once
 
 #include <arpa/inet.h>
+#include <gtest/gtest.h>
 #include <netinet/in.h>
 #include <sys/socket.h>
 #include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include <filesystem>
 #include <memory>
@@ -56,7 +55,8 @@ class LogSessionTest : public ::testing::Test {
     const int accepted = ::accept(listener, nullptr, nullptr);
     ::close(listener);
     ASSERT_GE(accepted, 0);
-    connection_ = std::make_unique<nKV_DLL300::HostConnection>(accepted, nKV_DLL300::ConnectionSetup{});
+    connection_ =
+        std::make_unique<nKV_DLL300::HostConnection>(accepted, nKV_DLL300::ConnectionSetup{});
     UseBus(nKV_DLL300::kBusTypeCan);
   }
 
@@ -101,7 +101,9 @@ class LogSessionTest : public ::testing::Test {
     return texts;
   }
 
-  std::filesystem::path ServiceDirectory() const { return drive_.Native(kServiceDirectoryBelowDrive); }
+  std::filesystem::path ServiceDirectory() const {
+    return drive_.Native(kServiceDirectoryBelowDrive);
+  }
   std::optional<std::string> ReadLog(const std::string& fileName) const {
     return drive_.ReadFile(std::string(kServiceDirectoryBelowDrive) + "\\" + fileName);
   }

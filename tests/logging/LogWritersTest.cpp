@@ -1,8 +1,7 @@
 // The per-bus writers: exact text lines, binary records, frame selection, batch bounds.
-#include "logging/LogWriters.h"
-
 #include "logging/LogFile.h"
 #include "logging/LogFileName.h"
+#include "logging/LogWriters.h"
 #include "logging/TextLogFormat.h"
 #include "tests/logging/FrameBuilder.h"
 #include "tests/logging/LogSessionHarness.h"
@@ -82,10 +81,9 @@ TEST_F(LogWritersTest, FlexRayLinesShowChannelAndIndicators) {
       {.identifier = 1, .type = 0x20, .flags = 0x23, .info = 0, .payload = {1}},
       {.identifier = 0x10028, .type = 0x20, .flags = 0x04, .info = 7},
   });
-  EXPECT_EQ(LogOf(kFlexRay, kLogTypeText, batch, 2),
-            std::string(kFlexRayTextLogHeader) + "\n" +
-                "09:05:03,042\t1\t01  \t1\t0\tB\tX\tX\t-\n"
-                "09:05:03,042\t28\t\t0\t7\t-\t-\t-\tX\n");
+  EXPECT_EQ(LogOf(kFlexRay, kLogTypeText, batch, 2), std::string(kFlexRayTextLogHeader) + "\n" +
+                                                         "09:05:03,042\t1\t01  \t1\t0\tB\tX\tX\t-\n"
+                                                         "09:05:03,042\t28\t\t0\t7\t-\t-\t-\tX\n");
 }
 
 // Record sizes per bus and session kind, with the bytes taken from the frame as it was read.
@@ -101,12 +99,24 @@ TEST_F(LogWritersTest, BinaryRecordsHaveTheSizeOfTheirBusAndAreTheFramesBytes) {
   const RecordCase cases[] = {
       {"classic CAN, 3 bytes", kCan, 0, {.identifier = 0x1A0, .payload = {1, 2, 3}}, 24},
       {"classic CAN, remote", kCan, 0, {.identifier = 0x321, .type = 0x01}, 24},
-      {"FD session, 64 bytes", kCan, 2, {.identifier = 0x200, .type = 0x18, .payload = Counting(64)}, 80},
-      {"FD session, 12 bytes", kCan, 2, {.identifier = 0x201, .type = 0x10, .payload = std::vector<uint8_t>(12, 0xA0)}, 32},
+      {"FD session, 64 bytes",
+       kCan,
+       2,
+       {.identifier = 0x200, .type = 0x18, .payload = Counting(64)},
+       80},
+      {"FD session, 12 bytes",
+       kCan,
+       2,
+       {.identifier = 0x201, .type = 0x10, .payload = std::vector<uint8_t>(12, 0xA0)},
+       32},
       {"FD session, empty", kCan, 2, {.identifier = 0x321, .type = 0x01}, 16},
       {"LIN, 2 bytes", kLin, 0, {.identifier = 0x10, .type = 0x40, .payload = {0x12, 0x34}}, 24},
       {"LIN, no response", kLin, 0, {.identifier = 0x12, .type = 0x42}, 24},
-      {"FlexRay, 254 bytes", kFlexRay, 0, {.identifier = 40, .type = 0x20, .payload = std::vector<uint8_t>(254, 0x3C)}, 272},
+      {"FlexRay, 254 bytes",
+       kFlexRay,
+       0,
+       {.identifier = 40, .type = 0x20, .payload = std::vector<uint8_t>(254, 0x3C)},
+       272},
       {"FlexRay, null frame", kFlexRay, 0, {.identifier = 3, .type = 0x21}, 16},
   };
   for (const RecordCase& c : cases) {
@@ -117,9 +127,10 @@ TEST_F(LogWritersTest, BinaryRecordsHaveTheSizeOfTheirBusAndAreTheFramesBytes) {
     ASSERT_EQ(file.size(), 12 + 3 * c.recordSize) << c.name;
     const size_t frameSize = batch.size() / 3;
     for (int i = 0; i < 3; ++i) {
-      EXPECT_EQ(file.compare(12 + i * c.recordSize, c.recordSize,
-                             reinterpret_cast<const char*>(batch.data() + i * frameSize), c.recordSize),
-                0)
+      EXPECT_EQ(
+          file.compare(12 + i * c.recordSize, c.recordSize,
+                       reinterpret_cast<const char*>(batch.data() + i * frameSize), c.recordSize),
+          0)
           << c.name << " record " << i;
     }
   }
@@ -137,7 +148,8 @@ TEST_F(LogWritersTest, RejectedFramesLeaveNoRecordAndTheFramesAfterThemAreFound)
 }
 
 TEST_F(LogWritersTest, BatchBoundsWinOverTheFrameCount) {
-  std::vector<uint8_t> batch = Batch({{.identifier = 0x100, .payload = {1}}, {.identifier = 0x101, .payload = {2}}});
+  std::vector<uint8_t> batch =
+      Batch({{.identifier = 0x100, .payload = {1}}, {.identifier = 0x101, .payload = {2}}});
   // A frame count beyond the batch, and a last frame cut short: only whole frames are written.
   batch.resize(batch.size() - 4);
   const std::string text = LogOf(kCan, kLogTypeText, batch, 1000);
@@ -148,8 +160,11 @@ TEST_F(LogWritersTest, BatchBoundsWinOverTheFrameCount) {
 TEST_F(LogWritersTest, LongJ1939MessagesAreWrittenWhole) {
   settings().applicationProtocol.store(1);
   const std::vector<uint8_t> payload = Counting(1785);
-  const std::vector<uint8_t> batch = Batch(
-      {{.identifier = kExtended | 0x18EF00FE, .type = 0xC0, .info = 1785 / 256, .payload = payload, .lengthByte = 1785 % 256}});
+  const std::vector<uint8_t> batch = Batch({{.identifier = kExtended | 0x18EF00FE,
+                                             .type = 0xC0,
+                                             .info = 1785 / 256,
+                                             .payload = payload,
+                                             .lengthByte = 1785 % 256}});
   const std::string text = LogOf(kCan, kLogTypeText, batch, 1);
   EXPECT_NE(text.find("\t1785\tE\n"), std::string::npos);
   EXPECT_EQ(text.size(), kCanTextLogHeader.size() + 1 + 13 + 9 + 4 * 1785 + 6 + 2);

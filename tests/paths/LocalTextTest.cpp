@@ -1,10 +1,9 @@
 // Code page <-> UTF-8 conversions, their codes and the thrown conversion error.
-#include "paths/LocalText.h"
-
 #include <gtest/gtest.h>
 
 #include "errors/Exception.h"
 #include "errors/RaiseSites.h"
+#include "paths/LocalText.h"
 
 namespace {
 
@@ -22,11 +21,16 @@ TEST(LocalTextTest, NullAndEmptySucceedWithEmptyOutput) {
 
 TEST(LocalTextTest, HighCharactersRoundTrip) {
   std::string utf8;
-  ASSERT_EQ(mbsToUtf8("M\xfc" "ller \x80", utf8), 0);
+  ASSERT_EQ(mbsToUtf8("M\xfc"
+                      "ller \x80",
+                      utf8),
+            0);
   EXPECT_EQ(utf8, "M\xc3\xbcller \xe2\x82\xac");
   std::string local;
   ASSERT_EQ(utf8ToMbs(utf8.c_str(), local), 0);
-  EXPECT_EQ(local, "M\xfc" "ller \x80");
+  EXPECT_EQ(local,
+            "M\xfc"
+            "ller \x80");
 }
 
 TEST(LocalTextTest, InvalidCodePageByteFails) {
@@ -52,8 +56,9 @@ TEST(LocalTextTest, ConversionErrorIsThrownWithItsSite) {
     FAIL();
   } catch (const qverr::Exception& e) {
     EXPECT_EQ(e.code(), -52027);
-    EXPECT_STREQ(e.what(),
-                 R"({"error_constant":"err","file":"qvsstutf8/mbsToUtf8","line":99,"component":"kelvanert"})");
+    EXPECT_STREQ(
+        e.what(),
+        R"({"error_constant":"err","file":"qvsstutf8/mbsToUtf8","line":99,"component":"kelvanert"})");
   }
 }
 

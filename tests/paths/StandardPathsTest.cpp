@@ -1,10 +1,9 @@
 // Standard directories by id: their texts, creation on a temporary drive, and failures.
-#include "paths/StandardPaths.h"
-
 #include <gtest/gtest.h>
 
 #include "errors/RaiseSites.h"
 #include "errors/cExceptionBase.h"
+#include "paths/StandardPaths.h"
 #include "tests/platform/TempDrive.h"
 
 namespace {

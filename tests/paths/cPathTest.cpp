@@ -1,6 +1,4 @@
 // Path joining and trimming, validation, local conversions and bounded copies.
-#include "paths/cPath.h"
-
 #include <gtest/gtest.h>
 
 #include <ostream>
@@ -8,6 +6,7 @@
 
 #include "errors/RaiseSites.h"
 #include "errors/cExceptionBase.h"
+#include "paths/cPath.h"
 
 namespace {
 
@@ -59,9 +58,13 @@ TEST(cPathTest, InvalidComponentThrowsLine426AndLeavesPath) {
 
 TEST(cPathTest, AppendLocalStoresUtf8AndGetLocalGivesBytesBack) {
   cPath path("C:\\logs");
-  path.appendLocal("M\xfc" "ller.txt");
+  path.appendLocal(
+      "M\xfc"
+      "ller.txt");
   EXPECT_EQ(path.getUtf8(), "C:\\logs\\M\xc3\xbcller.txt");
-  EXPECT_EQ(path.getLocal(), "C:\\logs\\M\xfc" "ller.txt");
+  EXPECT_EQ(path.getLocal(),
+            "C:\\logs\\M\xfc"
+            "ller.txt");
 }
 
 TEST(cPathTest, AppendLocalTrimsLeadingBlanksKeepsInnerTrailing) {

@@ -1,13 +1,16 @@
 // Windows-1252 both ways: the high controls table, invalid bytes and the default character.
-#include "platform/CodePage.h"
-
 #include <gtest/gtest.h>
+
+#include "platform/CodePage.h"
 
 namespace {
 
 TEST(CodePageTest, HighBytesDecodeThroughTable) {
   std::u16string wide;
-  ASSERT_TRUE(platform::CodePageToUtf16("\x80\x9F\xE9\xFF" "a", wide));
+  ASSERT_TRUE(
+      platform::CodePageToUtf16("\x80\x9F\xE9\xFF"
+                                "a",
+                                wide));
   EXPECT_EQ(wide, (std::u16string{0x20AC, 0x0178, 0x00E9, 0x00FF, u'a'}));
 }
 

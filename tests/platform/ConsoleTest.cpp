@@ -1,7 +1,7 @@
 // Console messages on standard error and the interrupt-level check.
-#include "platform/Console.h"
-
 #include <gtest/gtest.h>
+
+#include "platform/Console.h"
 
 namespace {
 

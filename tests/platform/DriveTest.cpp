@@ -1,12 +1,11 @@
 // Runtime paths onto the drive directory: letters, separators, and no way out of the drive.
-#include "platform/Drive.h"
-
 #include <gtest/gtest.h>
 
 #include <cerrno>
 #include <cstdio>
 #include <ostream>
 
+#include "platform/Drive.h"
 #include "tests/platform/TempDrive.h"
 
 namespace {
@@ -36,19 +35,12 @@ TEST_P(MapRuntimePathTest, MapsInsideDriveOrRefuses) {
 INSTANTIATE_TEST_SUITE_P(
     Paths, MapRuntimePathTest,
     ::testing::Values(Mapping{"C:\\QV-RT\\tarvix\\kelvane", "/QV-RT/tarvix/kelvane"},
-                      Mapping{"c:\\temp\\x", "/temp/x"},
-                      Mapping{"C:/QV-RT/a", "/QV-RT/a"},
-                      Mapping{"C:\\", ""},
-                      Mapping{"C:", ""},
-                      Mapping{"C:\\QV-RT\\", "/QV-RT"},
-                      Mapping{"C:\\a\\\\b", "/a/b"},
-                      Mapping{"relative\\file", "/relative/file"},
-                      Mapping{"C:\\a\\..\\b", "/b"},
-                      Mapping{"C:\\a\\.\\b", "/a/b"},
-                      Mapping{"C:\\..", nullptr},
-                      Mapping{"C:\\a\\..\\..\\etc\\passwd", nullptr},
-                      Mapping{"..\\outside", nullptr},
-                      Mapping{"D:\\QV-RT", nullptr},
+                      Mapping{"c:\\temp\\x", "/temp/x"}, Mapping{"C:/QV-RT/a", "/QV-RT/a"},
+                      Mapping{"C:\\", ""}, Mapping{"C:", ""}, Mapping{"C:\\QV-RT\\", "/QV-RT"},
+                      Mapping{"C:\\a\\\\b", "/a/b"}, Mapping{"relative\\file", "/relative/file"},
+                      Mapping{"C:\\a\\..\\b", "/b"}, Mapping{"C:\\a\\.\\b", "/a/b"},
+                      Mapping{"C:\\..", nullptr}, Mapping{"C:\\a\\..\\..\\etc\\passwd", nullptr},
+                      Mapping{"..\\outside", nullptr}, Mapping{"D:\\QV-RT", nullptr},
                       Mapping{"z:\\", nullptr}));
 
 TEST(MapRuntimePathTest, EmbeddedNulIsRefused) {

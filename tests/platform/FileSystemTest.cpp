@@ -1,8 +1,7 @@
 // mkdir and attributes on runtime paths with the original errno numbers.
-#include "platform/FileSystem.h"
-
 #include <gtest/gtest.h>
 
+#include "platform/FileSystem.h"
 #include "tests/platform/TempDrive.h"
 
 namespace {

@@ -1,9 +1,8 @@
 // Loading a library from the drive or by bare name, resolving a symbol, unloading.
-#include "platform/Library.h"
-
 #include <gtest/gtest.h>
 
 #include "platform/Environment.h"
+#include "platform/Library.h"
 #include "tests/platform/TempDrive.h"
 
 namespace {

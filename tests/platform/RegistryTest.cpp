@@ -1,8 +1,7 @@
 // The registry file: sections as keys, values with sizes, and everything missing.
-#include "platform/Registry.h"
-
 #include <gtest/gtest.h>
 
+#include "platform/Registry.h"
 #include "tests/platform/TempDrive.h"
 
 namespace {
@@ -63,7 +62,8 @@ TEST(RegistryTest, NoFileOrNoSectionIsMissingKey) {
   EXPECT_EQ(RegOpenKeyExA(HKEY_LOCAL_MACHINE, kInstallerKey, 0, 0, &key), ERROR_FILE_NOT_FOUND);
   EXPECT_EQ(key, nullptr);
   drive.writeFile("Windows/registry.ini", kRegistryText);
-  EXPECT_EQ(RegOpenKeyExA(HKEY_LOCAL_MACHINE, "SOFTWARE\\Nothing", 0, 0, &key), ERROR_FILE_NOT_FOUND);
+  EXPECT_EQ(RegOpenKeyExA(HKEY_LOCAL_MACHINE, "SOFTWARE\\Nothing", 0, 0, &key),
+            ERROR_FILE_NOT_FOUND);
 }
 
 }  // namespace

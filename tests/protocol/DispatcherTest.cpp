@@ -1,17 +1,15 @@
 // The dispatcher on a connection over a local socket pair: which messages reach a handler, what
 // the replies' headers carry, and the fuzz corpus as a regression run.
-#include "protocol/Dispatcher.h"
-
+#include <gtest/gtest.h>
 #include <sys/socket.h>
 #include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include <filesystem>
 #include <fstream>
 #include <sstream>
 
 #include "host/HostMessage.h"
+#include "protocol/Dispatcher.h"
 #include "service/HostConnection.h"
 #include "tests/support/FakeSession.h"
 

@@ -1,9 +1,9 @@
 // The value readers of property messages, one row per input.
-#include "protocol/ValueReaders.h"
-
 #include <gtest/gtest.h>
 
 #include <string>
+
+#include "protocol/ValueReaders.h"
 
 namespace nKV_DLL300 {
 namespace {

@@ -1,11 +1,11 @@
 // The status precedence rule and what a taken code records.
-#include "qvapal/StatusBlock.h"
-
 #include <gtest/gtest.h>
 
+#include <cstdio>
 #include <ostream>
 #include <string>
-#include <cstdio>
+
+#include "qvapal/StatusBlock.h"
 
 namespace {
 
@@ -38,17 +38,16 @@ TEST_P(SetStatusPrecedenceTest, TakesCodeOnlyByPrecedence) {
   EXPECT_EQ(status.code, p.after);
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Rule, SetStatusPrecedenceTest,
-    ::testing::Values(Precedence{0, kError, true, kError},
-                      Precedence{0, kWarning, true, kWarning},
-                      Precedence{0, 0, false, 0},
-                      Precedence{kWarning, kError, true, kError},
-                      Precedence{kWarning, kOtherWarning, false, kWarning},
-                      Precedence{kWarning, 0, false, kWarning},
-                      Precedence{kError, kOtherError, false, kError},
-                      Precedence{kError, kWarning, false, kError},
-                      Precedence{kError, 0, false, kError}));
+INSTANTIATE_TEST_SUITE_P(Rule, SetStatusPrecedenceTest,
+                         ::testing::Values(Precedence{0, kError, true, kError},
+                                           Precedence{0, kWarning, true, kWarning},
+                                           Precedence{0, 0, false, 0},
+                                           Precedence{kWarning, kError, true, kError},
+                                           Precedence{kWarning, kOtherWarning, false, kWarning},
+                                           Precedence{kWarning, 0, false, kWarning},
+                                           Precedence{kError, kOtherError, false, kError},
+                                           Precedence{kError, kWarning, false, kError},
+                                           Precedence{kError, 0, false, kError}));
 
 TEST(SetStatusTest, FullRecordGetsComponentFileAndLine) {
   StatusBlock status;

@@ -1,12 +1,11 @@
 // Trace output: the 255-character cut, length-limited text, arguments and interrupt level.
-#include "qvapal/TraceOutput.h"
-
 #include <gtest/gtest.h>
 
 #include <string>
 #include <vector>
 
 #include "platform/Console.h"
+#include "qvapal/TraceOutput.h"
 #include "qvapal/tConsoleTraceDestination.h"
 #include "qvapal/tTrace.h"
 

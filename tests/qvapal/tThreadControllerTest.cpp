@@ -1,6 +1,4 @@
 // The thread controller's states: start, second start, join, restart, failures, destruction.
-#include "qvapal/tThreadController.h"
-
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -10,6 +8,7 @@
 #include <string>
 
 #include "qvapal/ErrorCodes.h"
+#include "qvapal/tThreadController.h"
 
 namespace {
 
@@ -35,8 +34,12 @@ class GatedBody final : public iThread {
     released = true;
     changed.notify_all();
   }
-  bool waitStarted() { return waitFor([this] { return started; }); }
-  bool waitFinished() { return waitFor([this] { return finished; }); }
+  bool waitStarted() {
+    return waitFor([this] { return started; });
+  }
+  bool waitFinished() {
+    return waitFor([this] { return finished; });
+  }
   bool hasFinished() {
     std::lock_guard<std::mutex> lock(mutex);
     return finished;

@@ -1,6 +1,4 @@
 // Directory chains on a temporary drive: created, present, blocked by a file, without parents.
-#include "qvsysq/DirectoryCreation.h"
-
 #include <gtest/gtest.h>
 
 #include <string>
@@ -8,6 +6,7 @@
 #include "errors/Exception.h"
 #include "platform/FileSystem.h"
 #include "qvapal/ErrorCodes.h"
+#include "qvsysq/DirectoryCreation.h"
 #include "qvsysq/cSysqWrapper.h"
 #include "tests/platform/TempDrive.h"
 

@@ -1,7 +1,7 @@
 // The fixed answers of the system queries.
-#include "qvsysq/cSysqWrapper.h"
-
 #include <gtest/gtest.h>
+
+#include "qvsysq/cSysqWrapper.h"
 
 namespace {
 

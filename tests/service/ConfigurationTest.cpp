@@ -1,7 +1,7 @@
 // Choosing the port from the configuration file's contents.
-#include "service/Configuration.h"
-
 #include <gtest/gtest.h>
+
+#include "service/Configuration.h"
 
 namespace nKV_DLL300 {
 namespace {

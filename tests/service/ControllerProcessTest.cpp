@@ -1,14 +1,13 @@
 // The real controller program: it loads the module, serves a host after its start delay, and
 // unloads the module in order on SIGTERM.
 #include <arpa/inet.h>
+#include <gtest/gtest.h>
 #include <netinet/in.h>
 #include <signal.h>
 #include <spawn.h>
 #include <sys/socket.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include "host/HostMessage.h"
 #include "tests/support/ServiceFixture.h"

@@ -1,8 +1,7 @@
 // The heartbeat rule and sends on a connection without a socket, without any network.
-#include "service/HostLink.h"
-
 #include <gtest/gtest.h>
 
+#include "service/HostLink.h"
 #include "service/SendReply.h"
 #include "tests/support/FakeSession.h"
 

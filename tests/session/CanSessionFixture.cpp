@@ -73,9 +73,8 @@ std::optional<RecordMessage> CanSessionTest::NextRecords(kvhost::HostClient& hos
 }
 
 std::optional<kvhost::CanStatisticsView> CanSessionTest::NextStatistics(kvhost::HostClient& host) {
-  auto message = NextMessage(host, [](const kvhost::HostMessage& m) {
-    return m.header.type == kvhost::kStatistics;
-  });
+  auto message = NextMessage(
+      host, [](const kvhost::HostMessage& m) { return m.header.type == kvhost::kStatistics; });
   if (!message) return std::nullopt;
   auto statistics = kvhost::DecodeCanStatistics(message->payload);
   EXPECT_TRUE(statistics.has_value()) << "statistics of " << message->payload.size() << " bytes";

@@ -53,14 +53,15 @@ class CanSessionTest : public ServiceFixture {
   // The next CAN record message (decoded and checked against its header's count).
   std::optional<RecordMessage> NextRecords(kvhost::HostClient& host);
   // The next record message for which `accept` holds.
-  std::optional<RecordMessage> RecordsWhere(kvhost::HostClient& host,
-                                            const std::function<bool(const RecordMessage&)>& accept);
+  std::optional<RecordMessage> RecordsWhere(
+      kvhost::HostClient& host, const std::function<bool(const RecordMessage&)>& accept);
   // The next CAN statistics message.
   std::optional<kvhost::CanStatisticsView> NextStatistics(kvhost::HostClient& host);
 
   // Connects a host, gives it a CAN port and starts a session; checks the acknowledgement.
-  kvhost::HostClient StartedHost(size_t slot, const std::string& port,
-                                 const std::function<void(nKV_DLL300::SessionSettings&)>& configure = {});
+  kvhost::HostClient StartedHost(
+      size_t slot, const std::string& port,
+      const std::function<void(nKV_DLL300::SessionSettings&)>& configure = {});
 };
 
 }  // namespace kvtest

@@ -19,8 +19,12 @@ void PutWord(void* value, uint32_t size, uint32_t word) {
 FakeDriverSystem FakeDriverSystem::DefaultHardware() {
   FakeDriverSystem driver;
   driver.devices = {
-      {{"CAN1", 1, 0, 0}, {"CAN2", 2, 0, 0}, {"CAN3", 3, 0, 1}, {"CAN4", 4, 0, 1},
-       {"CAN5", 5, 0, 1}, {"CAN6", 6, 0, 1}},
+      {{"CAN1", 1, 0, 0},
+       {"CAN2", 2, 0, 0},
+       {"CAN3", 3, 0, 1},
+       {"CAN4", 4, 0, 1},
+       {"CAN5", 5, 0, 1},
+       {"CAN6", 6, 0, 1}},
       {{"LIN1", 1, 2, 0}, {"LIN2", 2, 2, 0}},
       {{"FlexRay1", 1, 1, 0}, {"FlexRay2", 2, 1, 0}},
   };
@@ -64,7 +68,8 @@ int32_t FakeDriverSystem::GetProperty(uint32_t reference, uint32_t propertyId, u
   if (reference % 0x100 == 0 && propertyId == 0x06120002) {
     std::memset(value, 0, size);
     auto* refs = static_cast<uint32_t*>(value);
-    for (size_t i = 0; i < devices[device].size() && i < size / 4; ++i) refs[i] = reference + uint32_t(i + 1);
+    for (size_t i = 0; i < devices[device].size() && i < size / 4; ++i)
+      refs[i] = reference + uint32_t(i + 1);
     return 0;
   }
   size_t index = reference % 0x100 - 1;
@@ -73,7 +78,8 @@ int32_t FakeDriverSystem::GetProperty(uint32_t reference, uint32_t propertyId, u
   switch (propertyId) {
     case 0x03130002:
       std::memset(value, 0, size);
-      std::memcpy(value, interface.name.data(), interface.name.size() < size ? interface.name.size() : size);
+      std::memcpy(value, interface.name.data(),
+                  interface.name.size() < size ? interface.name.size() : size);
       return 0;
     case 0x00130003:
       std::memset(value, 0xEE, size);  // room beyond the port word is filled with noise

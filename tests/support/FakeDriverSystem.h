@@ -33,8 +33,7 @@ class FakeDriverSystem : public nKV_DLL300::DriverSystem {
 
   int32_t SystemOpen(uint32_t& system) override;
   int32_t SystemClose(uint32_t system) override;
-  int32_t GetProperty(uint32_t reference, uint32_t propertyId, uint32_t size,
-                      void* value) override;
+  int32_t GetProperty(uint32_t reference, uint32_t propertyId, uint32_t size, void* value) override;
 
   int32_t openCount = 0;
   int32_t closeCount = 0;

@@ -145,9 +145,12 @@ std::optional<kvhost::HostMessage> ServiceFixture::NextMessage(
 std::optional<kvhost::HostMessage> ServiceFixture::Command(kvhost::HostClient& host,
                                                            const std::string& command) {
   EXPECT_TRUE(host.Send(command)) << host.error();
-  return NextMessage(host, [](const kvhost::HostMessage& m) {
-    return m.header.type == kvhost::kText || m.header.type == kvhost::kErrorText;
-  }, kReplyDeadline);
+  return NextMessage(
+      host,
+      [](const kvhost::HostMessage& m) {
+        return m.header.type == kvhost::kText || m.header.type == kvhost::kErrorText;
+      },
+      kReplyDeadline);
 }
 
 }  // namespace kvtest

@@ -22,10 +22,13 @@ TEST(CandumpLineTest, ParsesEveryFrameKindAndRejectsMalformedLines) {
   const LineCase cases[] = {
       {"(1.000001) can0 123#DEADBEEF", true, 0x123, driver::kFrameCanData, 4},
       {"(1.000001) can0 123#", true, 0x123, driver::kFrameCanData, 0},
-      {"(1.000001) can0 12345678#00", true, 0x12345678 | driver::kExtendedIdFlag, driver::kFrameCanData, 1},
+      {"(1.000001) can0 12345678#00", true, 0x12345678 | driver::kExtendedIdFlag,
+       driver::kFrameCanData, 1},
       {"(1.000001) can0 123#R", true, 0x123, driver::kFrameCanRemote, 0},
       {"(1.000001) can0 123#R3", true, 0x123, driver::kFrameCanRemote, 3},
-      {"(1.000001) can0 123##1" "00112233445566778899AABB", true, 0x123, driver::kFrameCanFdBrsData, 12},
+      {"(1.000001) can0 123##1"
+       "00112233445566778899AABB",
+       true, 0x123, driver::kFrameCanFdBrsData, 12},
       {"(1.000001) can0 123##0AA", true, 0x123, driver::kFrameCanFdData, 1},
       {"(1.000001) can0 20000004#0000000000000000", true, 0, driver::kFrameCanBusError, 0},
       {"(1.000001) can0 123#11 T", true, 0x123, driver::kFrameCanData, 1},
@@ -81,7 +84,8 @@ TEST(FrameTimingTest, ClassicFramesStayWithinTheStuffBitBounds) {
   for (int round = 0; round < 2000; ++round) {
     SimFrame f;
     const bool extended = round % 2;
-    f.identifier = extended ? (random() & driver::kExtendedIdMask) | driver::kExtendedIdFlag : random() & 0x7FF;
+    f.identifier = extended ? (random() & driver::kExtendedIdMask) | driver::kExtendedIdFlag
+                            : random() & 0x7FF;
     f.length = static_cast<uint8_t>(random() % 9);
     for (auto& b : f.payload) b = static_cast<uint8_t>(random() % 3 == 0 ? 0 : random());
     const uint32_t bits = (extended ? 67 : 47) + 8u * f.length;
@@ -102,7 +106,8 @@ TEST(FrameTimingTest, FdFramesSwitchRateOnlyWithBitRateSwitching) {
   EXPECT_GE(brs.nominalBits, 22u + 12);
   f.type = driver::kFrameCanFdData;
   EXPECT_EQ(CanBitLength(f).dataBits, 0u);
-  EXPECT_LT(CanFrameNs(f, 500000, 2000000) - CanFrameNs(f, 500000, 500000), 1) << "no switch: one rate";
+  EXPECT_LT(CanFrameNs(f, 500000, 2000000) - CanFrameNs(f, 500000, 500000), 1)
+      << "no switch: one rate";
   f.type = driver::kFrameCanFdBrsData;
   EXPECT_LT(CanFrameNs(f, 500000, 2000000), CanFrameNs(f, 500000, 500000));
   EXPECT_EQ(CanFdLength(9), 12u);

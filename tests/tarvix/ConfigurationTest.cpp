@@ -16,15 +16,17 @@ class ConfigurationTest : public TarvixTest {
   void SetUp() override {
     TarvixTest::SetUp();
     dir_ = std::filesystem::temp_directory_path() /
-           ("tarvix-config-" + std::to_string(::testing::UnitTest::GetInstance()->random_seed()) + "-" +
-            ::testing::UnitTest::GetInstance()->current_test_info()->name());
+           ("tarvix-config-" + std::to_string(::testing::UnitTest::GetInstance()->random_seed()) +
+            "-" + ::testing::UnitTest::GetInstance()->current_test_info()->name());
     std::filesystem::create_directories(dir_);
   }
   void TearDown() override {
     TarvixTest::TearDown();
     std::filesystem::remove_all(dir_);
   }
-  void Write(const std::string& name, const std::string& text) { std::ofstream(dir_ / name) << text; }
+  void Write(const std::string& name, const std::string& text) {
+    std::ofstream(dir_ / name) << text;
+  }
   std::filesystem::path dir_;
 };
 
@@ -35,7 +37,8 @@ TEST_F(ConfigurationTest, BrokenDescriptionsGiveAClearErrorAndNoHardware) {
       {R"({"buses":[{"name":"b","bitRate":"fast"}]})", "buses[0].bitRate"},
       {R"({"buses":[{"name":"b","traffic":[{"id":"0x900"}]}]})", "buses[0].traffic[0].id"},
       {R"({"buses":[{"name":"b","traffic":[{"payload":"zz"}]}]})", "bad payload token"},
-      {R"({"buses":[{"name":"b"}],"devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"x"}]}]})", "unknown bus"},
+      {R"({"buses":[{"name":"b"}],"devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"x"}]}]})",
+       "unknown bus"},
       {R"({"buses":[{"name":"b","replay":[{"file":"missing.log"}]}]})", "cannot read candump log"},
       {R"({"faults":[{"operation":"kxStart"}]})", "\"status\" is missing"},
   };
@@ -60,7 +63,8 @@ TEST_F(ConfigurationTest, ReplayCarriesEveryFrameKindOfALog) {
         "(1700000000.006000) can1 7FF#FF\n");
   Load(R"({"buses":[{"name":"r","dataBitRate":2000000,
       "replay":[{"file":"in.log","logInterface":"can0","loop":true}]}],
-      "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"r","canFd":true}]}]})", dir_.string());
+      "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"r","canFd":true}]}]})",
+       dir_.string());
   const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
   ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
   // The log loops; the session may join mid-round, so one whole round is looked for.
@@ -88,7 +92,8 @@ TEST_F(ConfigurationTest, CaptureFileHoldsEveryFrameTheBusCarried) {
   Load(R"({"buses":[{"name":"cap","capture":"cap.log","traffic":[
       {"id":"0x010","length":2,"periodMs":1,"payload":"ctr AB"},
       {"id":"0x1F","extended":true,"kind":"remote","periodMs":5}]}],
-      "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"cap"}]}]})", dir_.string());
+      "devices":[{"name":"D","interfaces":[{"name":"CAN1","bus":"cap"}]}]})",
+       dir_.string());
   const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
   const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 20; });
   ASSERT_EQ(kxClear(s), 0);

@@ -29,7 +29,8 @@ TEST_F(ControlTest, AlwaysFaultStaysUntilCleared) {
   const kxRef s = Open(driver::kDatabaseSubordinate, "LIN1");
   uint8_t buffer[48];
   uint32_t bytes = 5;
-  for (int i = 0; i < 3; ++i) EXPECT_EQ(kxReadFrame(s, buffer, sizeof buffer, 0.0, &bytes), kInjected);
+  for (int i = 0; i < 3; ++i)
+    EXPECT_EQ(kxReadFrame(s, buffer, sizeof buffer, 0.0, &bytes), kInjected);
   ClearInjections();
   EXPECT_NE(kxReadFrame(s, buffer, sizeof buffer, 0.0, &bytes), kInjected);
 }

@@ -45,7 +45,9 @@ const OpenCase kOpenCases[] = {
 TEST_F(DatabaseKindsTest, SessionsOpenOnTheirDatabasesAndReportItsSettings) {
   for (const OpenCase& c : kOpenCases) {
     kxRef s = 0;
-    ASSERT_EQ(kxCreateSession(c.database, c.cluster, "", c.interfaceName, driver::kModeReceiveStream, &s), c.status)
+    ASSERT_EQ(
+        kxCreateSession(c.database, c.cluster, "", c.interfaceName, driver::kModeReceiveStream, &s),
+        c.status)
         << c.database << "/" << c.cluster << " on " << c.interfaceName;
     if (c.status != 0) continue;
     uint64_t rate = 0;
@@ -64,7 +66,8 @@ TEST_F(DatabaseKindsTest, UnknownModeAndMissingNamesAreRefused) {
   EXPECT_EQ(kxCreateSession(":can:", "", "", "CAN1", 7, &s), driver::kInvalidMode);
   EXPECT_EQ(kxCreateSession(nullptr, "", "", "CAN1", 6, &s), driver::kInvalidName);
   EXPECT_EQ(kxCreateSession(":can:", "", "", "CAN1", 6, nullptr), driver::kBufferMissing);
-  EXPECT_EQ(kxCreateSession(":can:", "", "", "CAN1", driver::kModeOutputQueued, &s), driver::kFrameNotFound)
+  EXPECT_EQ(kxCreateSession(":can:", "", "", "CAN1", driver::kModeOutputQueued, &s),
+            driver::kFrameNotFound)
       << "an output session needs frames";
 }
 
@@ -80,23 +83,31 @@ TEST_F(DatabaseKindsTest, InMemoryDatabaseHoldsClustersAndFrames) {
   const uint32_t id = 0x123;
   EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameIdentifier, 4, &id), 0);
   const uint64_t wide = 0x123;
-  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameIdentifier, 8, &wide), driver::kWrongPropertySize);
-  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropClusterBaudRate, 8, &wide), driver::kUnknownProperty);
+  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameIdentifier, 8, &wide),
+            driver::kWrongPropertySize);
+  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropClusterBaudRate, 8, &wide),
+            driver::kUnknownProperty);
   const double negative = -1.0;
-  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameCyclicRate, 8, &negative), driver::kInvalidPropertyValue);
+  EXPECT_EQ(kxdbSetProperty(frame, driver::kPropFrameCyclicRate, 8, &negative),
+            driver::kInvalidPropertyValue);
   const uint32_t fd = driver::kCanIoModeFdBrs;
   ASSERT_EQ(kxdbSetProperty(cluster, driver::kPropClusterCanIoMode, 4, &fd), 0);
   kxRef s = 0;
-  EXPECT_EQ(kxCreateSession(":memory123", "Cluster", "TxFrame", "CAN1", driver::kModeOutputQueued, &s),
-            driver::kInterfaceNotCapable);
-  EXPECT_EQ(kxCreateSession(":memory123", "Cluster", "Missing", "CAN3", driver::kModeOutputQueued, &s),
-            driver::kFrameNotFound);
-  EXPECT_EQ(kxCreateSession(":memory123", "Cluster", "TxFrame", "CAN3", driver::kModeOutputQueued, &s), 0);
+  EXPECT_EQ(
+      kxCreateSession(":memory123", "Cluster", "TxFrame", "CAN1", driver::kModeOutputQueued, &s),
+      driver::kInterfaceNotCapable);
+  EXPECT_EQ(
+      kxCreateSession(":memory123", "Cluster", "Missing", "CAN3", driver::kModeOutputQueued, &s),
+      driver::kFrameNotFound);
+  EXPECT_EQ(
+      kxCreateSession(":memory123", "Cluster", "TxFrame", "CAN3", driver::kModeOutputQueued, &s),
+      0);
   EXPECT_EQ(kxClear(s), 0);
   EXPECT_EQ(kxdbCloseDatabase(db, 0), 0);
   EXPECT_EQ(kxdbCloseDatabase(db, 0), driver::kInvalidReference);
-  EXPECT_EQ(kxCreateSession(":memory123", "Cluster", "TxFrame", "CAN3", driver::kModeOutputQueued, &s),
-            driver::kDatabaseNotFound);
+  EXPECT_EQ(
+      kxCreateSession(":memory123", "Cluster", "TxFrame", "CAN3", driver::kModeOutputQueued, &s),
+      driver::kDatabaseNotFound);
 }
 
 TEST_F(DatabaseKindsTest, SameNameOpenedTwiceStaysUntilTheLastClose) {
@@ -114,7 +125,6 @@ TEST_F(DatabaseKindsTest, SameNameOpenedTwiceStaysUntilTheLastClose) {
   EXPECT_EQ(kxdbCloseDatabase(b, 0), 0);
 }
 
-
 using HardwareListingTest = TarvixTest;
 
 TEST_F(HardwareListingTest, DefaultHardwareListsTenInterfacesInDeviceOrderWithDefaultVersions) {
@@ -128,12 +138,14 @@ TEST_F(HardwareListingTest, DefaultHardwareListsTenInterfacesInDeviceOrderWithDe
   for (size_t i = 0; i < got.size(); ++i) {
     EXPECT_EQ(got[i].name, expected[i].name);
     EXPECT_EQ(std::tie(got[i].port, got[i].protocol, got[i].canFd),
-              std::tie(expected[i].port, expected[i].protocol, expected[i].canFd)) << got[i].name;
+              std::tie(expected[i].port, expected[i].protocol, expected[i].canFd))
+        << got[i].name;
   }
-  const std::pair<uint32_t, uint32_t> versions[] = {
-      {driver::kPropSystemVersionMajor, 21}, {driver::kPropSystemVersionMinor, 5},
-      {driver::kPropSystemVersionUpdate, 0}, {driver::kPropSystemVersionPhase, 3},
-      {driver::kPropSystemVersionPacked, 0x15503000}};
+  const std::pair<uint32_t, uint32_t> versions[] = {{driver::kPropSystemVersionMajor, 21},
+                                                    {driver::kPropSystemVersionMinor, 5},
+                                                    {driver::kPropSystemVersionUpdate, 0},
+                                                    {driver::kPropSystemVersionPhase, 3},
+                                                    {driver::kPropSystemVersionPacked, 0x15503000}};
   for (const auto& [id, value] : versions) EXPECT_EQ(SystemValue(id), value) << std::hex << id;
 }
 
@@ -141,19 +153,27 @@ TEST_F(HardwareListingTest, ListReadsCheckRoomReferencesAndTerminators) {
   kxRef system = 0;
   ASSERT_EQ(kxSystemOpen(&system), 0);
   uint32_t two[2] = {};
-  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof two, two), driver::kBufferTooSmall);
+  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof two, two),
+            driver::kBufferTooSmall);
   uint32_t devices[64] = {};
-  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, 255, devices), driver::kWrongPropertySize);
-  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, nullptr), driver::kBufferMissing);
+  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, 255, devices),
+            driver::kWrongPropertySize);
+  EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, nullptr),
+            driver::kBufferMissing);
   ASSERT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, devices), 0);
-  EXPECT_EQ(kxGetProperty(devices[0], driver::kPropSystemVersionMajor, 4, two), driver::kUnknownProperty);
+  EXPECT_EQ(kxGetProperty(devices[0], driver::kPropSystemVersionMajor, 4, two),
+            driver::kUnknownProperty);
   uint32_t word = 0;
-  EXPECT_EQ(kxSetProperty(system, driver::kPropSystemVersionMajor, 4, &word), driver::kPropertyReadOnly);
-  EXPECT_EQ(kxGetProperty(0x7777, driver::kPropSystemVersionMajor, 4, &word), driver::kInvalidReference);
+  EXPECT_EQ(kxSetProperty(system, driver::kPropSystemVersionMajor, 4, &word),
+            driver::kPropertyReadOnly);
+  EXPECT_EQ(kxGetProperty(0x7777, driver::kPropSystemVersionMajor, 4, &word),
+            driver::kInvalidReference);
   uint32_t interfaces[16] = {};
-  ASSERT_EQ(kxGetProperty(devices[2], driver::kPropDeviceInterfaces, sizeof interfaces, interfaces), 0);
+  ASSERT_EQ(kxGetProperty(devices[2], driver::kPropDeviceInterfaces, sizeof interfaces, interfaces),
+            0);
   char name[16];
-  EXPECT_EQ(kxGetProperty(interfaces[0], driver::kPropInterfaceName, 8, name), driver::kBufferTooSmall)
+  EXPECT_EQ(kxGetProperty(interfaces[0], driver::kPropInterfaceName, 8, name),
+            driver::kBufferTooSmall)
       << "FlexRay1 needs 9 bytes";
   EXPECT_EQ(kxGetProperty(interfaces[0], driver::kPropInterfaceName, 9, name), 0);
   EXPECT_STREQ(name, "FlexRay1");

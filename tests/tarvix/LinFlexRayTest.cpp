@@ -82,7 +82,9 @@ TEST_F(LinFlexRayTest, FlexRaySessionIntegratesAndSeesBothChannels) {
   ASSERT_EQ(Set<uint32_t>(s, driver::kPropKeySlot, 0), 0);
   ASSERT_EQ(kxStart(s, driver::kScopeNormal), 0);
   ASSERT_EQ(kxWait(s, driver::kWaitInterfaceCommunicating, 0, 20.0, nullptr), 0);
-  const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 3, driver::kFrameFlexRayNull) >= 1 && f.size() >= 12; });
+  const auto frames = ReadUntil(s, [](const auto& f) {
+    return CountId(f, 3, driver::kFrameFlexRayNull) >= 1 && f.size() >= 12;
+  });
   bool slot1A = false;
   bool slot1B = false;
   for (const Frame& f : frames) {
@@ -115,7 +117,8 @@ TEST_F(LinFlexRayTest, FlexRaySessionIntegratesAndSeesBothChannels) {
 
 TEST_F(LinFlexRayTest, FlexRayNullFramesStayOutUnlessAsked) {
   const kxRef s = Open(driver::kDatabaseSubordinate, "FlexRay2");
-  const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 3, driver::kFrameFlexRayData) >= 2; });
+  const auto frames =
+      ReadUntil(s, [](const auto& f) { return CountId(f, 3, driver::kFrameFlexRayData) >= 2; });
   EXPECT_EQ(CountId(frames, 3, driver::kFrameFlexRayNull), 0u);
 }
 

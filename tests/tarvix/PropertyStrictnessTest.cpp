@@ -61,11 +61,14 @@ const PropertyCase kCases[] = {
 TEST_F(PropertyStrictnessTest, EachIdHasItsSizeAndItsKindOfSession) {
   for (const PropertyCase& c : kCases) {
     kxRef s = 0;
-    ASSERT_EQ(kxCreateSession(c.database, c.cluster, "", c.interfaceName, driver::kModeReceiveStream, &s), 0);
+    ASSERT_EQ(
+        kxCreateSession(c.database, c.cluster, "", c.interfaceName, driver::kModeReceiveStream, &s),
+        0);
     uint8_t bytes[8] = {};
     std::memcpy(bytes, &c.value, 8);
     EXPECT_EQ(kxSetProperty(s, c.id, c.size, bytes), c.expected)
-        << c.database << " 0x" << std::hex << c.id << " size " << std::dec << c.size << " value " << c.value;
+        << c.database << " 0x" << std::hex << c.id << " size " << std::dec << c.size << " value "
+        << c.value;
     EXPECT_EQ(kxClear(s), 0);
   }
 }

@@ -21,7 +21,8 @@ using ReceiveSessionTest = TarvixTest;
 
 uint64_t NowAsFileTime() {
   const auto ns = std::chrono::duration_cast<std::chrono::nanoseconds>(
-                      std::chrono::system_clock::now().time_since_epoch()).count();
+                      std::chrono::system_clock::now().time_since_epoch())
+                      .count();
   return kUnixEpochAsFileTime + static_cast<uint64_t>(ns / 100);
 }
 
@@ -58,7 +59,8 @@ TEST_F(ReceiveSessionTest, TimeStampsAreWallClockTimesInOrder) {
     EXPECT_GE(frames[i].timestamp + tolerance, before);
     EXPECT_LE(frames[i].timestamp, after + tolerance);
     if (i > 0) {
-      EXPECT_GT(frames[i].timestamp, frames[i - 1].timestamp) << "one bus carries one frame at a time";
+      EXPECT_GT(frames[i].timestamp, frames[i - 1].timestamp)
+          << "one bus carries one frame at a time";
     }
   }
 }
@@ -77,7 +79,8 @@ TEST_F(ReceiveSessionTest, ReadWithZeroTimeoutOnQuietBusReturnsAtOnce) {
 TEST_F(ReceiveSessionTest, SmallBufferGetsWholeFramesOnly) {
   const kxRef s = Open(driver::kDatabaseSubordinate, "CAN5");
   std::vector<uint8_t> buffer(100000);
-  const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 0x200, driver::kFrameCanFdBrsData) > 0; });
+  const auto frames =
+      ReadUntil(s, [](const auto& f) { return CountId(f, 0x200, driver::kFrameCanFdBrsData) > 0; });
   uint32_t bytes = 0;
   // 64-byte FD frames take 80 bytes; 40 bytes of room take none of them.
   kxStatus st = driver::kReadTimeout;
@@ -154,11 +157,14 @@ TEST_F(ReceiveSessionTest, SessionsThatCannotDecodeTheBusSeeBusErrorFrames) {
   ASSERT_EQ(Set<uint64_t>(s, driver::kPropBaudRate, 250000), 0);
   ASSERT_EQ(kxStart(s, driver::kScopeNormal), 0);
   const kxRef classic = Open(driver::kDatabaseCan, "CAN5");
-  for (const kxRef r : {s, classic}) ASSERT_EQ(kxSetProperty(r, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
+  for (const kxRef r : {s, classic})
+    ASSERT_EQ(kxSetProperty(r, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
   const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 20; });
   ASSERT_GE(frames.size(), 20u);
   for (const Frame& f : frames) {
-    EXPECT_EQ(std::tie(f.type, f.identifier, f.length), std::make_tuple(driver::kFrameCanBusError, 0u, 0u)) << "wrong bit rate";
+    EXPECT_EQ(std::tie(f.type, f.identifier, f.length),
+              std::make_tuple(driver::kFrameCanBusError, 0u, 0u))
+        << "wrong bit rate";
   }
   uint32_t state = 0;
   uint32_t fault = 1;
@@ -189,10 +195,10 @@ TEST_F(ReceiveSessionTest, OverflowDropsTheOldestFramesAndWarnsOnce) {
   const auto frames = Decode(buffer.data(), bytes);
   ASSERT_EQ(frames.size(), 8u);
   for (size_t i = 1; i < frames.size(); ++i) {
-    EXPECT_EQ(uint8_t(frames[i - 1].payload[0] + 1), frames[i].payload[0]) << "the newest frames remain";
+    EXPECT_EQ(uint8_t(frames[i - 1].payload[0] + 1), frames[i].payload[0])
+        << "the newest frames remain";
   }
 }
-
 
 TEST_F(ReceiveSessionTest, PollThreadsAndAServiceThreadShareTheDriver) {
   struct Poller {
@@ -200,8 +206,10 @@ TEST_F(ReceiveSessionTest, PollThreadsAndAServiceThreadShareTheDriver) {
     uint32_t stateId;
     uint32_t stateSize;
   };
-  const Poller pollers[] = {{"CAN1", driver::kStateCan, 4}, {"CAN2", driver::kStateCan, 4},
-                            {"LIN1", driver::kStateLin, 8}, {"FlexRay1", driver::kStateFlexRay, 4}};
+  const Poller pollers[] = {{"CAN1", driver::kStateCan, 4},
+                            {"CAN2", driver::kStateCan, 4},
+                            {"LIN1", driver::kStateLin, 8},
+                            {"FlexRay1", driver::kStateFlexRay, 4}};
   std::atomic<int> finished{0};
   std::vector<std::thread> threads;
   for (const Poller& p : pollers) {

@@ -56,14 +56,17 @@ inline std::vector<Frame> Decode(const uint8_t* data, uint32_t size) {
 }
 
 // Reads with time-out 0 until `done(frames so far)` holds or the deadline passes.
-inline std::vector<Frame> ReadUntil(kxRef session, const std::function<bool(const std::vector<Frame>&)>& done) {
+inline std::vector<Frame> ReadUntil(kxRef session,
+                                    const std::function<bool(const std::vector<Frame>&)>& done) {
   std::vector<Frame> all;
   std::vector<uint8_t> buffer(100000);
   const auto deadline = std::chrono::steady_clock::now() + kDeadline;
   while (!done(all) && std::chrono::steady_clock::now() < deadline) {
     uint32_t bytes = 0;
-    const kxStatus st = kxReadFrame(session, buffer.data(), static_cast<uint32_t>(buffer.size()), 0.0, &bytes);
-    EXPECT_TRUE(st == 0 || st == driver::kReadTimeout || st == driver::kWarnReceiveQueueOverflow) << std::hex << st;
+    const kxStatus st =
+        kxReadFrame(session, buffer.data(), static_cast<uint32_t>(buffer.size()), 0.0, &bytes);
+    EXPECT_TRUE(st == 0 || st == driver::kReadTimeout || st == driver::kWarnReceiveQueueOverflow)
+        << std::hex << st;
     const auto batch = Decode(buffer.data(), bytes);
     all.insert(all.end(), batch.begin(), batch.end());
     if (bytes == 0) std::this_thread::sleep_for(std::chrono::milliseconds(1));
@@ -79,7 +82,9 @@ inline size_t CountId(const std::vector<Frame>& frames, uint32_t id, uint8_t typ
 
 // The first frame with this identifier and type; an empty frame (and a failure) when there is none.
 inline Frame First(const std::vector<Frame>& frames, uint32_t id, uint8_t type) {
-  const auto it = std::find_if(frames.begin(), frames.end(), [&](const Frame& f) { return f.identifier == id && f.type == type; });
+  const auto it = std::find_if(frames.begin(), frames.end(), [&](const Frame& f) {
+    return f.identifier == id && f.type == type;
+  });
   EXPECT_NE(it, frames.end()) << std::hex << id;
   return it == frames.end() ? Frame{} : *it;
 }
@@ -107,7 +112,8 @@ inline std::vector<Listed> ListInterfaces() {
   EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, devices), 0);
   for (uint32_t d = 0; d < 64 && devices[d] != 0; ++d) {
     uint32_t interfaces[16] = {};
-    EXPECT_EQ(kxGetProperty(devices[d], driver::kPropDeviceInterfaces, sizeof interfaces, interfaces), 0);
+    EXPECT_EQ(
+        kxGetProperty(devices[d], driver::kPropDeviceInterfaces, sizeof interfaces, interfaces), 0);
     for (uint32_t i = 0; i < 16 && interfaces[i] != 0; ++i) {
       char name[16] = {};
       uint8_t port[16] = {};
@@ -138,7 +144,8 @@ inline uint32_t SystemValue(uint32_t id) {
 
 inline kxRef Open(const char* database, const char* interfaceName, const char* cluster = "") {
   kxRef ref = 0;
-  EXPECT_EQ(kxCreateSession(database, cluster, "", interfaceName, driver::kModeReceiveStream, &ref), 0)
+  EXPECT_EQ(kxCreateSession(database, cluster, "", interfaceName, driver::kModeReceiveStream, &ref),
+            0)
       << database << " on " << interfaceName;
   return ref;
 }

@@ -12,7 +12,8 @@ namespace {
 class TransmitTest : public TarvixTest {
  protected:
   // The database a CAN session builds for its transmit frame, and an output session on CAN3.
-  kxRef OpenOutput(uint32_t mode, uint32_t timingType, double cyclicRate, uint32_t identifier = 0x155) {
+  kxRef OpenOutput(uint32_t mode, uint32_t timingType, double cyclicRate,
+                   uint32_t identifier = 0x155) {
     EXPECT_EQ(kxdbOpenDatabase(":memory42", &db_), 0);
     kxRef cluster = 0;
     kxRef frame = 0;
@@ -52,7 +53,8 @@ TEST_F(TransmitTest, QueuedSendsGoOutOnceEachInOrder) {
   // After the wait all three are on the bus; a marker sent afterwards bounds the read.
   const auto marker = Record(0xEE);
   ASSERT_EQ(kxWriteFrame(out, marker.data(), 24, 10.0), 0);
-  const auto frames = ReadUntil(rx, [](const auto& f) { return !f.empty() && f.back().payload[0] == 0xEE; });
+  const auto frames =
+      ReadUntil(rx, [](const auto& f) { return !f.empty() && f.back().payload[0] == 0xEE; });
   ASSERT_EQ(frames.size(), 4u);
   for (uint8_t i = 0; i < 3; ++i) {
     EXPECT_EQ(frames[i].identifier, 0x155u);
@@ -101,7 +103,8 @@ TEST_F(TransmitTest, WritesAreCheckedAgainstTheSession) {
   EXPECT_EQ(kxWriteFrame(out, r.data(), 23, 10.0), driver::kInvalidFrame);
   auto tooLong = Record(1, 9);
   tooLong.resize(32, 0);
-  EXPECT_EQ(kxWriteFrame(out, tooLong.data(), 32, 10.0), driver::kInvalidFrame) << "classic frames hold 8 bytes";
+  EXPECT_EQ(kxWriteFrame(out, tooLong.data(), 32, 10.0), driver::kInvalidFrame)
+      << "classic frames hold 8 bytes";
   uint8_t buffer[64];
   uint32_t bytes = 0;
   EXPECT_EQ(kxReadFrame(out, buffer, sizeof buffer, 0.0, &bytes), driver::kWrongSessionMode);

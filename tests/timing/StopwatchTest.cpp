@@ -1,9 +1,8 @@
 // The stopwatch: zero states, elapsed time and the wrap of the picosecond product.
-#include "timing/Stopwatch.h"
-
 #include <gtest/gtest.h>
 
 #include "tests/timing/FakeClock.h"
+#include "timing/Stopwatch.h"
 #include "timing/Time.h"
 
 namespace {

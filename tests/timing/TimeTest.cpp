@@ -1,6 +1,4 @@
 // Unit conversion edges, the clock read in units, and the sleep.
-#include "timing/Time.h"
-
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -8,6 +6,7 @@
 #include <ostream>
 
 #include "tests/timing/FakeClock.h"
+#include "timing/Time.h"
 
 namespace {
 
@@ -35,10 +34,8 @@ INSTANTIATE_TEST_SUITE_P(
     Edges, ConvertTimeTest,
     ::testing::Values(
         Conversion{kMilliseconds, 0, kMilliseconds, 0},
-        Conversion{kPicoseconds, kMax, kPicoseconds, kMax},
-        Conversion{kHours, kMax, kHours, kMax},
-        Conversion{kSeconds, 1, kMilliseconds, 1000},
-        Conversion{kHours, 1, kMilliseconds, 3600000},
+        Conversion{kPicoseconds, kMax, kPicoseconds, kMax}, Conversion{kHours, kMax, kHours, kMax},
+        Conversion{kSeconds, 1, kMilliseconds, 1000}, Conversion{kHours, 1, kMilliseconds, 3600000},
         Conversion{kMilliseconds, 59999, kMinutes, 0},
         Conversion{kMilliseconds, 60000, kMinutes, 1},
         Conversion{kPicoseconds, 1999, kMilliseconds, 0},
@@ -48,8 +45,7 @@ INSTANTIATE_TEST_SUITE_P(
         Conversion{kHours, 1, kPicoseconds, 3600000000000000ULL},
         // 10 000 hours in picoseconds overflows 2^64 and wraps
         Conversion{kHours, 10000, kPicoseconds, 10000ULL * 3600000000000000ULL},
-        Conversion{kMinutes, 90, kHours, 1},
-        Conversion{kNanoseconds, 1000000000, kSeconds, 1}));
+        Conversion{kMinutes, 90, kHours, 1}, Conversion{kNanoseconds, 1000000000, kSeconds, 1}));
 
 TEST(ConvertTimeTest, OutOfRangeUnitCodesActAsNearestUnit) {
   EXPECT_EQ(ConvertTime(static_cast<TimeUnit>(-5), 1000, kNanoseconds), 1u);

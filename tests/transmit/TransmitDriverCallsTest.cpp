@@ -36,7 +36,8 @@ std::string Describe(const tarvix::CallRecord& call) {
   if (call.operation == "kxdbSetProperty" && call.id == driver::kPropFrameCyclicRate) {
     double seconds = 0;
     std::memcpy(&seconds, &value, sizeof seconds);
-    std::snprintf(line, sizeof line, "%s %#x/%u=%g", call.operation.c_str(), call.id, call.size, seconds);
+    std::snprintf(line, sizeof line, "%s %#x/%u=%g", call.operation.c_str(), call.id, call.size,
+                  seconds);
   } else if (call.operation == "kxdbSetProperty" || call.operation == "kxSetProperty") {
     std::snprintf(line, sizeof line, "%s %#x/%u=%llu", call.operation.c_str(), call.id, call.size,
                   static_cast<unsigned long long>(value));
@@ -143,16 +144,18 @@ TEST_P(TransmitStartCallsTest, StartMakesTheDatabaseSessionAndWriteInOrder) {
   EXPECT_EQ(write->value[15], 5);                         // length
 }
 
-std::vector<std::string> Join(std::vector<std::string> first, const std::vector<std::string>& rest) {
+std::vector<std::string> Join(std::vector<std::string> first,
+                              const std::vector<std::string>& rest) {
   first.insert(first.end(), rest.begin(), rest.end());
   return first;
 }
 
 // The cluster a start makes: an FD cluster (I/O mode above 0) also gets the data rate.
 std::vector<std::string> Cluster(uint32_t canIoMode) {
-  std::vector<std::string> calls = {"kxdbOpenDatabase 0 :memory<n>", "kxdbCreateObject 0x10000 Cluster",
-                                    "kxdbSetProperty 0x10073/4=0", "kxdbSetProperty 0x9010001/8=500000",
-                                    "kxdbSetProperty 0x10010/4=" + std::to_string(canIoMode)};
+  std::vector<std::string> calls = {
+      "kxdbOpenDatabase 0 :memory<n>", "kxdbCreateObject 0x10000 Cluster",
+      "kxdbSetProperty 0x10073/4=0", "kxdbSetProperty 0x9010001/8=500000",
+      "kxdbSetProperty 0x10010/4=" + std::to_string(canIoMode)};
   if (canIoMode != 0) calls.push_back("kxdbSetProperty 0x9010011/8=2000000");
   return calls;
 }
@@ -166,7 +169,8 @@ std::vector<std::string> FrameAndSession(bool extended, uint32_t timingType, int
   calls = Join(calls, {"kxdbSetProperty 0x20003/4=291", "kxdbSetProperty 0x20007/4=5",
                        "kxdbSetProperty 0x20011/4=" + std::to_string(timingType),
                        "kxdbSetProperty 0x1020012/8=0.05"});
-  if (frameMode != kNoFrameMode) calls.push_back("kxdbSetProperty 0x20066/4=" + std::to_string(frameMode));
+  if (frameMode != kNoFrameMode)
+    calls.push_back("kxdbSetProperty 0x20066/4=" + std::to_string(frameMode));
   const bool eventFrame = timingType == 1;
   calls = Join(calls, {std::string(eventFrame ? "kxCreateSession 0xa" : "kxCreateSession 0xb") +
                            " :memory<n> Cluster TxFrame CAN3",

@@ -1,6 +1,7 @@
 // A host defines, starts, updates and stops a frame on CAN3; a second host watches CAN4 on the
-// same quiet test bus and sees exactly that frame. Transmit messages by session kind: acknowledged on
-// CAN, acknowledged and nothing else on LIN and FlexRay, dropped unanswered without a CAN session.
+// same quiet test bus and sees exactly that frame. Transmit messages by session kind: acknowledged
+// on CAN, acknowledged and nothing else on LIN and FlexRay, dropped unanswered without a CAN
+// session.
 #include <gtest/gtest.h>
 
 #include <string>
@@ -25,7 +26,7 @@ constexpr double kUnitsPerSecond = 1e7;  // record time stamps count 100 ns
 constexpr int kQuietMessages = 6;
 
 const std::vector<std::string> kTxProperties = {
-    "SET_TX_PROP_PAYLOAD_LENGTH=8", "SET_TX_PROP_EXTENDED_ID=1", "SET_TX_PROP_FRAME_TYPE=0",
+    "SET_TX_PROP_PAYLOAD_LENGTH=8", "SET_TX_PROP_EXTENDED_ID=1",   "SET_TX_PROP_FRAME_TYPE=0",
     "SET_TX_PROP_TIMING_TYPE=1",    "SET_TX_PROP_CYCLIC_RATE=0,5", "SET_TX_PROP_PAYLOAD=1,2",
     "SET_TX_PROP_IDENTIFIER=16"};
 
@@ -53,7 +54,8 @@ class TransmitTest : public CanSessionTest {
 
   // Watches CAN4 as the bus runs, with a record message every 100 ms.
   kvhost::HostClient Monitor(size_t slot = 1) {
-    return StartedHost(slot, "CAN4", [](SessionSettings& s) { s.txTimeData.store(kRecordPeriodMs); });
+    return StartedHost(slot, "CAN4",
+                       [](SessionSettings& s) { s.txTimeData.store(kRecordPeriodMs); });
   }
 
   // Sends each property message and checks its acknowledgement, "<ACK: NAME>\n".
@@ -156,7 +158,8 @@ TEST_F(TransmitTest, EventFrameGoesOutOncePerStartWithItsIdentifierLengthAndPayl
 
   Expect(sender, "CMD_TX_START");
   ASSERT_TRUE(SeenCount(monitor, 2).has_value());
-  for (int i = 0; i < kQuietMessages; ++i) EXPECT_EQ(NextCount(monitor), 2u) << "an event frame repeated";
+  for (int i = 0; i < kQuietMessages; ++i)
+    EXPECT_EQ(NextCount(monitor), 2u) << "an event frame repeated";
 
   // A stop empties the payload: the next start sends the length in zeros.
   Expect(sender, "CMD_TX_STOP");
@@ -207,14 +210,26 @@ TEST_F(TransmitTest, RemoteExtendedAndFdFramesReachTheOtherInterface) {
     uint32_t seenLength;
   };
   const std::vector<Case> cases = {
-      {"remote", 0, {"SET_TX_PROP_IDENTIFIER=801", "SET_TX_PROP_FRAME_TYPE=1"}, 801, kTypeRemote, 0},
-      {"extended", 0, {"SET_TX_PROP_IDENTIFIER=28036592", "SET_TX_PROP_EXTENDED_ID=1",
-                       "SET_TX_PROP_PAYLOAD_LENGTH=8", "SET_TX_PROP_PAYLOAD=1,2,3,4,5,6,7,8"},
-       28036592 | kExtendedFlag, kTypeData, 8},
-      {"FD with bit-rate switching", 2, {"SET_TX_PROP_IDENTIFIER=512", "SET_TX_PROP_FRAME_TYPE=24",
-                                         "SET_TX_PROP_PAYLOAD_LENGTH=12",
-                                         "SET_TX_PROP_PAYLOAD=1,2,3,4,5,6,7,8,9,10,11,12"},
-       512, kTypeFdBrs, 12},
+      {"remote",
+       0,
+       {"SET_TX_PROP_IDENTIFIER=801", "SET_TX_PROP_FRAME_TYPE=1"},
+       801,
+       kTypeRemote,
+       0},
+      {"extended",
+       0,
+       {"SET_TX_PROP_IDENTIFIER=28036592", "SET_TX_PROP_EXTENDED_ID=1",
+        "SET_TX_PROP_PAYLOAD_LENGTH=8", "SET_TX_PROP_PAYLOAD=1,2,3,4,5,6,7,8"},
+       28036592 | kExtendedFlag,
+       kTypeData,
+       8},
+      {"FD with bit-rate switching",
+       2,
+       {"SET_TX_PROP_IDENTIFIER=512", "SET_TX_PROP_FRAME_TYPE=24", "SET_TX_PROP_PAYLOAD_LENGTH=12",
+        "SET_TX_PROP_PAYLOAD=1,2,3,4,5,6,7,8,9,10,11,12"},
+       512,
+       kTypeFdBrs,
+       12},
   };
   for (const Case& c : cases) {
     SCOPED_TRACE(c.name);
@@ -278,9 +293,9 @@ TEST_F(TransmitTest, EndingTheSessionStopsACyclicFrame) {
       sender.Close();
       ASSERT_TRUE(WaitUntil([&] { return service().statistics().connectionsEnded.load() >= 1; }));
     } else {
-      auto farewell = NextMessage(sender, [](const kvhost::HostMessage& m) {
-        return m.header.type == kvhost::kErrorText;
-      }, 3 * kConditionDeadline);
+      auto farewell = NextMessage(
+          sender, [](const kvhost::HostMessage& m) { return m.header.type == kvhost::kErrorText; },
+          3 * kConditionDeadline);
       ASSERT_TRUE(farewell.has_value());
       EXPECT_EQ(farewell->text(), "<ERROR: Heartbeat message missing| TCP Client disconnect> \n");
       ASSERT_TRUE(WaitUntil([&] { return service().statistics().connectionsEnded.load() >= 2; }));
@@ -307,7 +322,8 @@ TEST_F(TransmitTest, LinAndFlexRaySessionsOnlyAcknowledgeTransmitCommands) {
     tarvix::ResetToDefaults();
     StartService();
     kvhost::HostClient host = HostOnPort(port);
-    if (std::string(port) == "LIN1") ASSERT_TRUE(Command(host, "SET_PROP_SESSION_BAUDRATE=19200").has_value());
+    if (std::string(port) == "LIN1")
+      ASSERT_TRUE(Command(host, "SET_PROP_SESSION_BAUDRATE=19200").has_value());
     Expect(host, "CMD_SESSION_START");
     tarvix::StartRecording();
     Expect(host, "CMD_TX_START");

@@ -1,6 +1,4 @@
 // The frame record a transmit write carries, and the payload list a host sends.
-#include "transmit/TxFrameRecord.h"
-
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -12,6 +10,7 @@
 #include "protocol/SessionSettings.h"
 #include "transmit/CTransmitFrame.h"
 #include "transmit/TransmitDatabaseName.h"
+#include "transmit/TxFrameRecord.h"
 
 namespace kvtest {
 namespace {
@@ -68,17 +67,20 @@ TEST_P(TxFrameRecordTest, CarriesIdentifierTypeLengthAndZeroPaddedPayload) {
 INSTANTIATE_TEST_SUITE_P(
     Records, TxFrameRecordTest,
     ::testing::Values(
-        RecordCase{"ShortPayloadPaddedToLength", 0x123, false, false, 5, {1, 2, 3}, 24, {1, 2, 3, 0, 0}},
+        RecordCase{
+            "ShortPayloadPaddedToLength", 0x123, false, false, 5, {1, 2, 3}, 24, {1, 2, 3, 0, 0}},
         RecordCase{"EmptyFrame", 0x7FF, false, false, 0, {}, 24, {}},
         RecordCase{"PayloadLongerThanLengthIsCut", 0x10, false, false, 2, {9, 8, 7}, 24, {9, 8}},
-        RecordCase{"NineBytesTakeSixteen", 0x10, false, false, 9, Bytes(9, 0x55), 32, Bytes(9, 0x55)},
+        RecordCase{"NineBytesTakeSixteen", 0x10, false, false, 9, Bytes(9, 0x55), 32,
+                   Bytes(9, 0x55)},
         RecordCase{"RemoteFrame", 0x321, false, true, 4, {}, 24, {0, 0, 0, 0}},
         RecordCase{"ExtendedIdentifierGetsBit29", 0x1ABCDE00, true, false, 1, {7}, 24, {7}},
         RecordCase{"FullFdPayload", 0x200, false, false, 64, Bytes(64, 0xA5), 80, Bytes(64, 0xA5)},
         // Only the low byte of the length counts (0x105 -> 5), and a record never holds more
         // than 64 payload bytes (200 -> 64).
         RecordCase{"LengthTakesItsLowByte", 0x1, false, false, 0x105, {1}, 24, {1, 0, 0, 0, 0}},
-        RecordCase{"LengthAboveSixtyFourIsHeld", 0x1, false, false, 200, Bytes(70, 3), 80, Bytes(64, 3)}),
+        RecordCase{"LengthAboveSixtyFourIsHeld", 0x1, false, false, 200, Bytes(70, 3), 80,
+                   Bytes(64, 3)}),
     [](const auto& info) { return std::string(info.param.name); });
 
 struct PayloadCase {
@@ -103,16 +105,16 @@ TEST_P(SetTxPayloadTest, ListTextBecomesBytes) {
   EXPECT_EQ(status, 0);
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Lists, SetTxPayloadTest,
-    ::testing::Values(PayloadCase{"1,2,255", {1, 2, 255}}, PayloadCase{"", {}},
-                      PayloadCase{"1,,2", {1, 0, 2}}, PayloadCase{"1,2,", {1, 2}},
-                      PayloadCase{",", {0}}, PayloadCase{"300", {0x2C}},
-                      PayloadCase{"256,257", {0, 1}},
-                      // No character is checked: each adds its code minus '0'.
-                      PayloadCase{"a", {'a' - '0'}}, PayloadCase{" 1", {97}},
-                      // A long run of digits wraps instead of overflowing.
-                      PayloadCase{"99999999999999999999", {255}}));
+INSTANTIATE_TEST_SUITE_P(Lists, SetTxPayloadTest,
+                         ::testing::Values(PayloadCase{"1,2,255", {1, 2, 255}}, PayloadCase{"", {}},
+                                           PayloadCase{"1,,2", {1, 0, 2}},
+                                           PayloadCase{"1,2,", {1, 2}}, PayloadCase{",", {0}},
+                                           PayloadCase{"300", {0x2C}},
+                                           PayloadCase{"256,257", {0, 1}},
+                                           // No character is checked: each adds its code minus '0'.
+                                           PayloadCase{"a", {'a' - '0'}}, PayloadCase{" 1", {97}},
+                                           // A long run of digits wraps instead of overflowing.
+                                           PayloadCase{"99999999999999999999", {255}}));
 
 TEST(TransmitDatabaseNameTest, SameSecondDrawsSameNumberButOpenNamesStayDistinct) {
   using nKV_DLL300::TransmitDatabaseName;

@@ -2,8 +2,8 @@
 #pragma once
 
 #include <dlfcn.h>
-#include <hdf5.h>
 #include <gtest/gtest.h>
+#include <hdf5.h>
 
 #include <cstdint>
 #include <cstdlib>
@@ -17,12 +17,15 @@
 namespace voratest {
 
 #define VORA_ENTRY_POINTS(X) \
-  X(SetOS) X(SetAPIFlags) X(FileOpenExA) X(ObjCreateA) X(PropSetA) X(ObjRawSet) X(FileBufFlush) X(FileClose)
+  X(SetOS)                   \
+  X(SetAPIFlags) X(FileOpenExA) X(ObjCreateA) X(PropSetA) X(ObjRawSet) X(FileBufFlush) X(FileClose)
 
 // The entry points resolved by name from a dlopen of vora.dll; unloads it when destroyed.
 struct VoraDll {
   void* handle = dlopen(VORA_DLL_PATH, RTLD_NOW | RTLD_LOCAL);
-#define VORA_MEMBER(name) Vor##name##Fn name = handle ? reinterpret_cast<Vor##name##Fn>(dlsym(handle, "Vor" #name)) : nullptr;
+#define VORA_MEMBER(name) \
+  Vor##name##Fn name =    \
+      handle ? reinterpret_cast<Vor##name##Fn>(dlsym(handle, "Vor" #name)) : nullptr;
   VORA_ENTRY_POINTS(VORA_MEMBER)
 #undef VORA_MEMBER
 
@@ -38,7 +41,8 @@ struct VoraDll {
   }
 
   // The controller's channel: the object and its three properties; the channel's handle.
-  int32_t OpenChannel(int32_t file, const std::string& objectPath, int32_t protocol, bool withProtocol = true) {
+  int32_t OpenChannel(int32_t file, const std::string& objectPath, int32_t protocol,
+                      bool withProtocol = true) {
     int32_t channel = -1;
     EXPECT_EQ(ObjCreateA(objectPath.c_str(), file, &channel), 0) << objectPath;
     const int32_t byteOrder = 0, version = 512;
@@ -63,18 +67,24 @@ struct TempDir {
 };
 
 // Reads a dataset of bytes; nullopt when it is missing or not one-dimensional.
-inline std::optional<std::vector<uint8_t>> ReadBytes(const std::string& file, const std::string& dataset) {
+inline std::optional<std::vector<uint8_t>> ReadBytes(const std::string& file,
+                                                     const std::string& dataset) {
   H5Eset_auto2(H5E_DEFAULT, nullptr, nullptr);
   const hid_t f = H5Fopen(file.c_str(), H5F_ACC_RDONLY, H5P_DEFAULT);
   if (f < 0) return std::nullopt;
   std::optional<std::vector<uint8_t>> bytes;
-  const hid_t d = H5Lexists(f, dataset.c_str(), H5P_DEFAULT) > 0 ? H5Dopen2(f, dataset.c_str(), H5P_DEFAULT) : -1;
+  const hid_t d = H5Lexists(f, dataset.c_str(), H5P_DEFAULT) > 0
+                      ? H5Dopen2(f, dataset.c_str(), H5P_DEFAULT)
+                      : -1;
   if (d >= 0) {
     const hid_t space = H5Dget_space(d);
     hsize_t size = 0;
-    if (H5Sget_simple_extent_ndims(space) == 1 && H5Sget_simple_extent_dims(space, &size, nullptr) == 1) {
+    if (H5Sget_simple_extent_ndims(space) == 1 &&
+        H5Sget_simple_extent_dims(space, &size, nullptr) == 1) {
       bytes.emplace(size);
-      if (size > 0 && H5Dread(d, H5T_NATIVE_UINT8, H5S_ALL, H5S_ALL, H5P_DEFAULT, bytes->data()) < 0) bytes.reset();
+      if (size > 0 &&
+          H5Dread(d, H5T_NATIVE_UINT8, H5S_ALL, H5S_ALL, H5P_DEFAULT, bytes->data()) < 0)
+        bytes.reset();
     }
     H5Sclose(space);
     H5Dclose(d);

@@ -22,8 +22,9 @@ class VoraDump : public testing::Test {
   }
 
   // A channel as the controller writes it: three properties, one record per frame.
-  void AddChannel(const std::string& objectPath, int32_t protocol, const std::vector<FrameSpec>& frames,
-                  BinaryRecordLayout layout, bool withProtocol = true) {
+  void AddChannel(const std::string& objectPath, int32_t protocol,
+                  const std::vector<FrameSpec>& frames, BinaryRecordLayout layout,
+                  bool withProtocol = true) {
     const int32_t channel = dll.OpenChannel(file, objectPath, protocol, withProtocol);
     for (const FrameSpec& f : frames) {
       const auto batch = kvtest::Batch({f});
@@ -36,7 +37,8 @@ class VoraDump : public testing::Test {
   kvtest::ToolRun Dump(const std::string& arguments) {
     dll.FileBufFlush(3, file);
     dll.FileClose(file);
-    return kvtest::RunTool(std::string(VORADUMP_PATH) + " " + arguments + " '" + path + "'", dir.path);
+    return kvtest::RunTool(std::string(VORADUMP_PATH) + " " + arguments + " '" + path + "'",
+                           dir.path);
   }
 
   voratest::VoraDll dll;
@@ -45,10 +47,13 @@ class VoraDump : public testing::Test {
   int32_t file = -1;
 };
 
-const std::vector<FrameSpec> kCanFrames = {{.identifier = 0x321, .type = 0x01},
-                                           {.identifier = 0x201, .type = 0x10, .payload = {1, 2, 3, 4, 5, 6, 7, 8, 9}}};
-const std::vector<FrameSpec> kLinFrames = {{.identifier = 0x13, .type = 0x40, .info = 0x3c, .payload = {0xde, 0xad}}};
-const std::vector<FrameSpec> kFlexRayFrames = {{.identifier = 40, .type = 0x20, .flags = 0x20, .info = 9, .payload = {7}}};
+const std::vector<FrameSpec> kCanFrames = {
+    {.identifier = 0x321, .type = 0x01},
+    {.identifier = 0x201, .type = 0x10, .payload = {1, 2, 3, 4, 5, 6, 7, 8, 9}}};
+const std::vector<FrameSpec> kLinFrames = {
+    {.identifier = 0x13, .type = 0x40, .info = 0x3c, .payload = {0xde, 0xad}}};
+const std::vector<FrameSpec> kFlexRayFrames = {
+    {.identifier = 40, .type = 0x20, .flags = 0x20, .info = 9, .payload = {7}}};
 
 TEST_F(VoraDump, ListsGroupsChannelsAndTheirProperties) {
   AddChannel("/'Bus'/'CAN1'", 0, kCanFrames, BinaryRecordLayout::kCanVariable);
@@ -91,7 +96,8 @@ TEST_F(VoraDump, DecodesEveryChannelUnderItsOwnBanner) {
   EXPECT_EQ(run.exitCode, 0) << run.err;
   EXPECT_EQ(run.out,
             "== group \"G\" channel \"FR\" ==\n"
-            "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle Number\tChannel\tStartup\tSync\tPreamble\n"
+            "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle "
+            "Number\tChannel\tStartup\tSync\tPreamble\n"
             "09:05:03,042\t28\t07  \t1\t9\tB\t-\t-\t-\n"
             "== group \"G\" channel \"LIN1\" ==\n"
             "Timestamp\tID\tPayload\tPayload Length\tChecksum\tType\t\n"
@@ -105,7 +111,8 @@ TEST_F(VoraDump, ChannelsWithoutAKnownBusOrFilesOfOtherKindsFail) {
   EXPECT_NE(run.err.find("no known QV_network_protocol"), std::string::npos) << run.err;
 
   kvtest::WriteBytes(dir.path / "text.vora", {'h', 'i'});
-  const auto other = kvtest::RunTool(std::string(VORADUMP_PATH) + " '" + (dir / "text.vora") + "'", dir.path);
+  const auto other =
+      kvtest::RunTool(std::string(VORADUMP_PATH) + " '" + (dir / "text.vora") + "'", dir.path);
   EXPECT_EQ(other.exitCode, 1);
   EXPECT_NE(other.err.find("not a measurement-data (HDF5) file"), std::string::npos) << other.err;
 }

@@ -19,13 +19,15 @@ using voratest::ReadIntAttribute;
 using voratest::TempDir;
 using voratest::VoraDll;
 
-constexpr int32_t kReplaceMode = 2, kReadWrite = 2, kRevision = 4713, kInt32 = 3, kBytes = 5, kFlushAll = 3;
+constexpr int32_t kReplaceMode = 2, kReadWrite = 2, kRevision = 4713, kInt32 = 3, kBytes = 5,
+                  kFlushAll = 3;
 constexpr uint32_t kLinRecord = 24;
 
 // A record whose bytes say which writer and which frame it is.
 std::array<uint8_t, kLinRecord> Record(uint32_t writer, uint32_t index) {
   std::array<uint8_t, kLinRecord> r{};
-  for (uint32_t i = 0; i < kLinRecord; ++i) r[i] = static_cast<uint8_t>(writer * 31 + index * 7 + i);
+  for (uint32_t i = 0; i < kLinRecord; ++i)
+    r[i] = static_cast<uint8_t>(writer * 31 + index * 7 + i);
   return r;
 }
 

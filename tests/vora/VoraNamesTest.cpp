@@ -1,7 +1,7 @@
 // Object paths and the stored form of group and channel names.
-#include "vora/VoraNames.h"
-
 #include <gtest/gtest.h>
+
+#include "vora/VoraNames.h"
 
 namespace vora {
 namespace {
@@ -48,7 +48,7 @@ TEST(StoredNames, EncodingIsHdf5SafeAndReversible) {
   const struct {
     const char* name;
     const char* stored;
-  } cases[] = {{"CAN1", "CAN1"}, {"", "%"},       {"a/b", "a%2Fb"}, {"50%", "50%25"},
+  } cases[] = {{"CAN1", "CAN1"}, {"", "%"},        {"a/b", "a%2Fb"}, {"50%", "50%25"},
                {".", "%2E"},     {"..x", "%2E.x"}, {"it's", "it's"}, {"%2F", "%252F"}};
   for (const auto& c : cases) {
     EXPECT_EQ(EncodeStoredName(c.name), c.stored) << c.name;

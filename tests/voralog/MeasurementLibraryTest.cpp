@@ -1,18 +1,16 @@
 // Locating vora.dll from the environment and the registry file, loading it once, and unloading it.
-#include "logging/MeasurementLibrary.h"
-
 #include <dlfcn.h>
+#include <gtest/gtest.h>
 #include <stdlib.h>
 
-#include <gtest/gtest.h>
-
 #include <filesystem>
-#include <ostream>
 #include <functional>
+#include <ostream>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include "logging/MeasurementLibrary.h"
 #include "tests/voralog/VoraSupport.h"
 
 namespace {
@@ -41,7 +39,8 @@ class MeasurementLibraryTest : public ::testing::Test {
  protected:
   void SetUp() override { unsetenv("OS"); }
 
-  void Install(const std::string& belowDrive = kvtest::kVoraBelowDrive, const char* library = VORA_DLL_PATH) {
+  void Install(const std::string& belowDrive = kvtest::kVoraBelowDrive,
+               const char* library = VORA_DLL_PATH) {
     kvtest::InstallLibrary(drive_, belowDrive, library);
   }
   void WriteRegistry(const std::string& text) { drive_.WriteFile(kRegistryBelowDrive, text); }
@@ -62,7 +61,8 @@ struct LocateCase {
 
 void PrintTo(const LocateCase& c, std::ostream* os) { *os << c.what; }
 
-class LocateTest : public MeasurementLibraryTest, public ::testing::WithParamInterface<LocateCase> {};
+class LocateTest : public MeasurementLibraryTest,
+                   public ::testing::WithParamInterface<LocateCase> {};
 
 // The library is named from the environment and the registry file, and loads only from there.
 TEST_P(LocateTest, NamesTheLibraryFileAndLoadsOnlyFromThere) {
@@ -77,35 +77,45 @@ TEST_P(LocateTest, NamesTheLibraryFileAndLoadsOnlyFromThere) {
   EXPECT_EQ(library_.loaded(), c.loads);
 }
 
-const std::string kLongRegistry = std::string(INSTALLER) + "QVSHAREDDIR=C:\\" + std::string(300, 'x') + "\n";
+const std::string kLongRegistry =
+    std::string(INSTALLER) + "QVSHAREDDIR=C:\\" + std::string(300, 'x') + "\n";
 constexpr char kTools[] = INSTALLER "QVSHAREDDIR=C:\\Tools\\Shared\n";
 constexpr char kToolsPath[] = "C:\\Tools\\Shared\\vora\\vora.dll";
 constexpr char kOtherDrive[] = INSTALLER "QVSHAREDDIR=D:\\Shared\n";
 constexpr char kEmptyValue[] = INSTALLER "QVSHAREDDIR=\n";
 const char* const kDefault = kvtest::kVoraBelowDrive;
 
-// The real-time kernel's bare name is found through the loader search path of the test's environment.
+// The real-time kernel's bare name is found through the loader search path of the test's
+// environment.
 INSTANTIATE_TEST_SUITE_P(
     EnvironmentAndRegistry, LocateTest,
     ::testing::Values(
         LocateCase{"DefaultDirectory", nullptr, nullptr, kDefault, kDefaultPath, 0, true},
-        LocateCase{"NoRegistryFileNothingInstalled", nullptr, nullptr, nullptr, kDefaultPath, 0, false},
-        LocateCase{"RegistryDirectory", nullptr, kTools, "Tools\\Shared\\vora\\vora.dll", kToolsPath, 0, true},
-        LocateCase{"DefaultDirectoryIgnoredWhenTheRegistryNamesAnother", nullptr, kTools, kDefault, kToolsPath, 0,
+        LocateCase{"NoRegistryFileNothingInstalled", nullptr, nullptr, nullptr, kDefaultPath, 0,
                    false},
-        LocateCase{"RegistryDirectoryOnAnotherDrive", nullptr, kOtherDrive, "Shared\\vora\\vora.dll",
-                   "D:\\Shared\\vora\\vora.dll", 0, false},
-        LocateCase{"KeyAndValueInOtherCase", nullptr,
-                   "[hkey_local_machine\\software\\quovera\\common\\installer]\nqvshareddir=C:\\Tools\n", nullptr,
-                   "C:\\Tools\\vora\\vora.dll", 0, false},
-        LocateCase{"EmptyValueLooksInTheDriveRoot", nullptr, kEmptyValue, "vora\\vora.dll", "\\vora\\vora.dll", 0, true},
-        LocateCase{"KeyWithoutValue", nullptr, INSTALLER "OTHER=C:\\x\n", kDefault, kDefaultPath, 0, true},
-        LocateCase{"OtherKeyOnly", nullptr, "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Other]\nQVSHAREDDIR=C:\\x\n", nullptr,
+        LocateCase{"RegistryDirectory", nullptr, kTools, "Tools\\Shared\\vora\\vora.dll",
+                   kToolsPath, 0, true},
+        LocateCase{"DefaultDirectoryIgnoredWhenTheRegistryNamesAnother", nullptr, kTools, kDefault,
+                   kToolsPath, 0, false},
+        LocateCase{"RegistryDirectoryOnAnotherDrive", nullptr, kOtherDrive,
+                   "Shared\\vora\\vora.dll", "D:\\Shared\\vora\\vora.dll", 0, false},
+        LocateCase{
+            "KeyAndValueInOtherCase", nullptr,
+            "[hkey_local_machine\\software\\quovera\\common\\installer]\nqvshareddir=C:\\Tools\n",
+            nullptr, "C:\\Tools\\vora\\vora.dll", 0, false},
+        LocateCase{"EmptyValueLooksInTheDriveRoot", nullptr, kEmptyValue, "vora\\vora.dll",
+                   "\\vora\\vora.dll", 0, true},
+        LocateCase{"KeyWithoutValue", nullptr, INSTALLER "OTHER=C:\\x\n", kDefault, kDefaultPath, 0,
+                   true},
+        LocateCase{"OtherKeyOnly", nullptr,
+                   "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Other]\nQVSHAREDDIR=C:\\x\n", nullptr,
                    kDefaultPath, 0, false},
-        LocateCase{"ValueTooLongForThePathBuffer", nullptr, kLongRegistry.c_str(), nullptr, kDefaultPath, 0, false},
+        LocateCase{"ValueTooLongForThePathBuffer", nullptr, kLongRegistry.c_str(), nullptr,
+                   kDefaultPath, 0, false},
         LocateCase{"DesktopOs", "Windows_NT", nullptr, nullptr, kDefaultPath, 0, false},
         LocateCase{"RealTimeKernelInMixedCase", "PhArLaP", nullptr, nullptr, "vora.dll", 1, true},
-        LocateCase{"RealTimeKernelWithVersion", "PHARLAP ETS 2024", kOtherDrive, nullptr, "vora.dll", 1, true},
+        LocateCase{"RealTimeKernelWithVersion", "PHARLAP ETS 2024", kOtherDrive, nullptr,
+                   "vora.dll", 1, true},
         LocateCase{"ShorterThanTheKernelName", "PHARLA", nullptr, nullptr, kDefaultPath, 0, false},
         LocateCase{"EmptyOs", "", nullptr, nullptr, kDefaultPath, 0, false}),
     [](const ::testing::TestParamInfo<LocateCase>& info) { return std::string(info.param.what); });

@@ -1,6 +1,4 @@
 // Type 2 logs of a session written through the real vora.dll, read back with the file reader.
-#include "logging/VoraLog.h"
-
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -13,6 +11,7 @@
 #include "logging/LogFileName.h"
 #include "logging/LogWriters.h"
 #include "logging/MeasurementLibrary.h"
+#include "logging/VoraLog.h"
 #include "tests/logging/FrameBuilder.h"
 #include "tests/logging/LogSessionHarness.h"
 #include "tests/voralog/VoraSupport.h"
@@ -52,13 +51,21 @@ class VoraLogTest : public LogSessionTest {
     const auto bytes = static_cast<uint32_t>(batch.size());
     const auto frames = static_cast<uint32_t>(batch.size());  // the walk ends the batch first
     switch (session().busType) {
-      case kBusTypeLin: WriteLinLog(log(), batch.data(), bytes, frames); break;
-      case kBusTypeFlexRay: WriteFlexRayLog(log(), batch.data(), bytes, frames); break;
-      default: WriteCanLog(log(), batch.data(), bytes, frames); break;
+      case kBusTypeLin:
+        WriteLinLog(log(), batch.data(), bytes, frames);
+        break;
+      case kBusTypeFlexRay:
+        WriteFlexRayLog(log(), batch.data(), bytes, frames);
+        break;
+      default:
+        WriteCanLog(log(), batch.data(), bytes, frames);
+        break;
     }
   }
 
-  std::optional<ChannelContents> Channel(const std::string& name) { return OnlyChannel(ServiceDirectory() / name); }
+  std::optional<ChannelContents> Channel(const std::string& name) {
+    return OnlyChannel(ServiceDirectory() / name);
+  }
 };
 
 struct LayoutCase {
@@ -107,35 +114,52 @@ TEST_P(VoraLayoutTest, ChannelHoldsTheBinaryLogRecordsAndTheThreeProperties) {
 INSTANTIATE_TEST_SUITE_P(
     Buses, VoraLayoutTest,
     ::testing::Values(
-        LayoutCase{"ClassicCan", kBusTypeCan, 0,
+        LayoutCase{"ClassicCan",
+                   kBusTypeCan,
+                   0,
                    {{.identifier = 0x100, .type = kCanData, .payload = Counting(8, 1)},
                     {.identifier = 0x1A0, .type = kCanData, .payload = Counting(3, 0xAA)},
                     {.identifier = 0x321, .type = 0x01}},
-                   {24, 24, 24}, 0},
-        LayoutCase{"CanFd", kBusTypeCan, 1,
+                   {24, 24, 24},
+                   0},
+        LayoutCase{"CanFd",
+                   kBusTypeCan,
+                   1,
                    {{.identifier = 0x200, .type = kCanFdData, .payload = Counting(64)},
                     {.identifier = 0x201, .type = kCanFdData, .payload = Counting(12, 0xA0)},
                     {.identifier = 0x080, .type = kCanData, .payload = Counting(8)}},
-                   {80, 32, 24}, 0},
-        LayoutCase{"Lin", kBusTypeLin, 0,
+                   {80, 32, 24},
+                   0},
+        LayoutCase{"Lin",
+                   kBusTypeLin,
+                   0,
                    {{.identifier = 0x11, .type = kLinData, .payload = Counting(8)},
                     {.identifier = 0x10, .type = kLinData, .payload = {0x12, 0x34}},
                     {.identifier = 0x12, .type = 0x42}},
-                   {24, 24, 24}, 2},
-        LayoutCase{"FlexRay", kBusTypeFlexRay, 0,
-                   {{.identifier = 40, .type = kFlexRayData, .flags = 0x20, .payload = Counting(32)},
-                    {.identifier = 1, .type = kFlexRayData, .flags = 0x13, .payload = Counting(16)},
-                    {.identifier = 3, .type = 0x21, .payload = Counting(8)}},
-                   {48, 32, 24}, 1}),
+                   {24, 24, 24},
+                   2},
+        LayoutCase{
+            "FlexRay",
+            kBusTypeFlexRay,
+            0,
+            {{.identifier = 40, .type = kFlexRayData, .flags = 0x20, .payload = Counting(32)},
+             {.identifier = 1, .type = kFlexRayData, .flags = 0x13, .payload = Counting(16)},
+             {.identifier = 3, .type = 0x21, .payload = Counting(8)}},
+            {48, 32, 24},
+            1}),
     [](const ::testing::TestParamInfo<LayoutCase>& info) { return std::string(info.param.what); });
 
 // The names are taken as the host gave them (with none the channel is /''/''); echo frames are
 // logged only while transmitted frames are wanted; each run replaces the file of the one before.
 TEST_F(VoraLogTest, NamesEchoFramesAndRepeatedRuns) {
   const std::vector<uint8_t> batch =
-      Batch({{.identifier = 0x100, .payload = Counting(8)}, {.identifier = 0x7FF, .flags = 0x80, .payload = Counting(8)}});
-  for (const auto& [group, channel, logTransmitted] : std::vector<std::tuple<std::string, std::string, uint8_t>>{
-           {"", "", 0}, {"Body bus", "CAN1 @ 500k", 1}, {"a/b", "50%", 0}, {"it's", ".hidden", 1}}) {
+      Batch({{.identifier = 0x100, .payload = Counting(8)},
+             {.identifier = 0x7FF, .flags = 0x80, .payload = Counting(8)}});
+  for (const auto& [group, channel, logTransmitted] :
+       std::vector<std::tuple<std::string, std::string, uint8_t>>{{"", "", 0},
+                                                                  {"Body bus", "CAN1 @ 500k", 1},
+                                                                  {"a/b", "50%", 0},
+                                                                  {"it's", ".hidden", 1}}) {
     settings().voraGroupName.Set(group);
     settings().voraChannelName.Set(channel);
     settings().logTransmittedFrames.store(logTransmitted);

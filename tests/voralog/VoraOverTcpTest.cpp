@@ -1,7 +1,6 @@
 // Type 2 logs of live CAN, LIN and FlexRay sessions, read back with vora-dump's reader and h5dump.
-#include <stdio.h>
-
 #include <gtest/gtest.h>
+#include <stdio.h>
 
 #include <algorithm>
 #include <filesystem>
@@ -74,7 +73,8 @@ TEST_P(VoraBusTest, LogHoldsTheBusRecordsReadableByEveryReader) {
   const BusCase& c = GetParam();
   InstallLibrary(drive_);
   std::vector<std::string> properties = c.properties;
-  for (const char* p : {"SET_PROP_LOGFILE_NAME=run", "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE_VORA_GROUP_NAME=Bus",
+  for (const char* p : {"SET_PROP_LOGFILE_NAME=run", "SET_PROP_LOGFILE_TYPE=2",
+                        "SET_PROP_LOGFILE_VORA_GROUP_NAME=Bus",
                         "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=Frames", "SET_PROP_LOGFILE=1"}) {
     properties.push_back(p);
   }
@@ -90,13 +90,15 @@ TEST_P(VoraBusTest, LogHoldsTheBusRecordsReadableByEveryReader) {
   EXPECT_TRUE(RecordsAreConsistent(bytes.data(), bytes.size(), c.layout, c.bus));
 
   size_t remaining = 1;
-  const std::vector<RawFrameView> frames = ReadRecords(bytes.data(), bytes.size(), c.layout, &remaining);
+  const std::vector<RawFrameView> frames =
+      ReadRecords(bytes.data(), bytes.size(), c.layout, &remaining);
   const size_t records = frames.size();
   std::map<uint32_t, int> counted;
   for (const RawFrameView& frame : frames) {
     const auto size = c.recordSizes.find(frame.header.identifier);
     ASSERT_NE(size, c.recordSizes.end()) << std::hex << frame.header.identifier;
-    EXPECT_EQ(BinaryRecordSize(c.layout, frame.header), size->second) << std::hex << frame.header.identifier;
+    EXPECT_EQ(BinaryRecordSize(c.layout, frame.header), size->second)
+        << std::hex << frame.header.identifier;
     ++counted[frame.header.identifier];
   }
   EXPECT_EQ(remaining, 0u);
@@ -107,18 +109,27 @@ TEST_P(VoraBusTest, LogHoldsTheBusRecordsReadableByEveryReader) {
   }
 
   // vora-dump decodes one text log line per record.
-  const std::string lines = Output(std::string(VORADUMP_PATH) + " --decode " + Quote(LogPath("run.vora")));
-  EXPECT_EQ(Count(lines, std::regex(R"((^|\n)\d\d:\d\d:\d\d,\d\d\d\t)")), records) << lines.substr(0, 400);
+  const std::string lines =
+      Output(std::string(VORADUMP_PATH) + " --decode " + Quote(LogPath("run.vora")));
+  EXPECT_EQ(Count(lines, std::regex(R"((^|\n)\d\d:\d\d:\d\d,\d\d\d\t)")), records)
+      << lines.substr(0, 400);
 
-  // h5dump, reading the file on its own: the group, the dataset of the channel's size, the properties.
+  // h5dump, reading the file on its own: the group, the dataset of the channel's size, the
+  // properties.
   const std::string header = Output(std::string(H5DUMP_PATH) + " -A " + Quote(LogPath("run.vora")));
   EXPECT_NE(header.find("GROUP \"Bus\""), std::string::npos) << header;
   EXPECT_NE(header.find("DATASET \"Frames\""), std::string::npos) << header;
-  EXPECT_NE(header.find("( " + std::to_string(bytes.size()) + " ) / ( H5S_UNLIMITED )"), std::string::npos) << header;
-  for (const auto& [name, value] : std::vector<std::pair<std::string, int64_t>>{
-           {"QV_network_frame_byte_order", 0}, {"QV_network_frame_version", 512}, {"QV_network_protocol", c.protocol}}) {
-    const std::string attribute = Output(std::string(H5DUMP_PATH) + " -a /Bus/Frames/" + name + " " + Quote(LogPath("run.vora")));
-    EXPECT_NE(attribute.find("(0): " + std::to_string(value) + "\n"), std::string::npos) << attribute;
+  EXPECT_NE(header.find("( " + std::to_string(bytes.size()) + " ) / ( H5S_UNLIMITED )"),
+            std::string::npos)
+      << header;
+  for (const auto& [name, value] :
+       std::vector<std::pair<std::string, int64_t>>{{"QV_network_frame_byte_order", 0},
+                                                    {"QV_network_frame_version", 512},
+                                                    {"QV_network_protocol", c.protocol}}) {
+    const std::string attribute = Output(std::string(H5DUMP_PATH) + " -a /Bus/Frames/" + name +
+                                         " " + Quote(LogPath("run.vora")));
+    EXPECT_NE(attribute.find("(0): " + std::to_string(value) + "\n"), std::string::npos)
+        << attribute;
   }
 }
 
@@ -127,22 +138,44 @@ constexpr uint32_t kExtended = 0x20000000;
 INSTANTIATE_TEST_SUITE_P(
     DefaultHardware, VoraBusTest,
     ::testing::Values(
-        BusCase{"ClassicCan", {"SET_PROP_SESSION_PORTNAME=CAN1"}, kvhost::kCanRecords, BinaryRecordLayout::kFixed24,
-                RecordBus::kCan, {{0x100, 24}, {0x1A0, 24}, {0x321, 24}, {kExtended | 0x18FEF100, 24}, {0, 24}}, 0, {0}},
-        BusCase{"CanFd", {"SET_PROP_SESSION_PORTNAME=CAN5"}, kvhost::kCanRecords, BinaryRecordLayout::kCanVariable,
-                RecordBus::kCan, {{0x200, 80}, {0x201, 32}, {kExtended | 0x1ABCDE00, 32}, {0x080, 24}}, 0},
-        BusCase{"Lin", {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
-                        "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"},
-                kvhost::kLinRecords, BinaryRecordLayout::kFixed24, RecordBus::kLin,
-                {{0x10, 24}, {0x11, 24}, {0x12, 24}, {0x13, 24}}, 2},
-        BusCase{"FlexRay", {"SET_PROP_SESSION_PORTNAME=FlexRay1"}, kvhost::kFlexRayRecords,
-                BinaryRecordLayout::kFlexRayVariable, RecordBus::kFlexRay, {{1, 32}, {2, 32}, {3, 24}, {40, 48}}, 1}),
+        BusCase{"ClassicCan",
+                {"SET_PROP_SESSION_PORTNAME=CAN1"},
+                kvhost::kCanRecords,
+                BinaryRecordLayout::kFixed24,
+                RecordBus::kCan,
+                {{0x100, 24}, {0x1A0, 24}, {0x321, 24}, {kExtended | 0x18FEF100, 24}, {0, 24}},
+                0,
+                {0}},
+        BusCase{"CanFd",
+                {"SET_PROP_SESSION_PORTNAME=CAN5"},
+                kvhost::kCanRecords,
+                BinaryRecordLayout::kCanVariable,
+                RecordBus::kCan,
+                {{0x200, 80}, {0x201, 32}, {kExtended | 0x1ABCDE00, 32}, {0x080, 24}},
+                0},
+        BusCase{"Lin",
+                {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
+                 "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"},
+                kvhost::kLinRecords,
+                BinaryRecordLayout::kFixed24,
+                RecordBus::kLin,
+                {{0x10, 24}, {0x11, 24}, {0x12, 24}, {0x13, 24}},
+                2},
+        BusCase{"FlexRay",
+                {"SET_PROP_SESSION_PORTNAME=FlexRay1"},
+                kvhost::kFlexRayRecords,
+                BinaryRecordLayout::kFlexRayVariable,
+                RecordBus::kFlexRay,
+                {{1, 32}, {2, 32}, {3, 24}, {40, 48}},
+                1}),
     [](const ::testing::TestParamInfo<BusCase>& info) { return std::string(info.param.what); });
 
 TEST_F(VoraOverTcpTest, MissingLibraryIsReportedOnceAndLoadedByALaterSessionOnceInstalled) {
-  const std::vector<std::string> properties = {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=late",
+  const std::vector<std::string> properties = {"SET_PROP_SESSION_PORTNAME=CAN1",
+                                               "SET_PROP_LOGFILE_NAME=late",
                                                "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE=1"};
-  EXPECT_EQ(Run(properties, kvhost::kCanRecords), std::vector<std::string>{"<ERROR:LOG FILE: -24> \n"});
+  EXPECT_EQ(Run(properties, kvhost::kCanRecords),
+            std::vector<std::string>{"<ERROR:LOG FILE: -24> \n"});
   EXPECT_FALSE(fs::exists(LogPath("late.vora")));
   InstallLibrary(drive_);
   EXPECT_TRUE(Run(properties, kvhost::kCanRecords).empty());
@@ -156,27 +189,30 @@ TEST_F(VoraOverTcpTest, MissingLibraryIsReportedOnceAndLoadedByALaterSessionOnce
 TEST_F(VoraOverTcpTest, TwoSessionsLogAtOnceEachToItsOwnFile) {
   InstallLibrary(drive_);
   std::vector<std::string> errors;
-  kvhost::HostClient can = Configured({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=can",
-                                       "SET_PROP_LOGFILE_TYPE=2", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=CAN1",
-                                       "SET_PROP_LOGFILE=1"},
-                                      errors);
-  kvhost::HostClient lin = Configured({"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
-                                       "SET_PROP_LOGFILE_NAME=lin", "SET_PROP_LOGFILE_TYPE=2",
-                                       "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=LIN1", "SET_PROP_LOGFILE=1"},
-                                      errors);
+  kvhost::HostClient can = Configured(
+      {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=can", "SET_PROP_LOGFILE_TYPE=2",
+       "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=CAN1", "SET_PROP_LOGFILE=1"},
+      errors);
+  kvhost::HostClient lin =
+      Configured({"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_BAUDRATE=19200",
+                  "SET_PROP_LOGFILE_NAME=lin", "SET_PROP_LOGFILE_TYPE=2",
+                  "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=LIN1", "SET_PROP_LOGFILE=1"},
+                 errors);
   WaitForRecords(can, kvhost::kCanRecords, errors);
   WaitForRecords(lin, kvhost::kLinRecords, errors);
   Terminate(can);
   Terminate(lin);
   EXPECT_TRUE(errors.empty());
-  for (const auto& [file, name, protocol, bus] : {std::tuple{"can.vora", "CAN1", 0, RecordBus::kCan},
-                                                  std::tuple{"lin.vora", "LIN1", 2, RecordBus::kLin}}) {
+  for (const auto& [file, name, protocol, bus] :
+       {std::tuple{"can.vora", "CAN1", 0, RecordBus::kCan},
+        std::tuple{"lin.vora", "LIN1", 2, RecordBus::kLin}}) {
     const auto channel = OnlyChannel(LogPath(file));
     ASSERT_TRUE(channel) << file;
     EXPECT_EQ(channel->channel.name, name);
     EXPECT_EQ(channel->channel.IntegerProperty("QV_network_protocol"), protocol);
     EXPECT_GT(channel->bytes.size(), 0u);
-    EXPECT_TRUE(RecordsAreConsistent(channel->bytes.data(), channel->bytes.size(), BinaryRecordLayout::kFixed24, bus))
+    EXPECT_TRUE(RecordsAreConsistent(channel->bytes.data(), channel->bytes.size(),
+                                     BinaryRecordLayout::kFixed24, bus))
         << file;
   }
 }

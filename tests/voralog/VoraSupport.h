@@ -1,4 +1,5 @@
-// Test helper: the built vora.dll installed on a temporary drive, and the one channel of a type 2 log.
+// Test helper: the built vora.dll installed on a temporary drive, and the one channel of a type 2
+// log.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -17,7 +18,8 @@ inline constexpr char kVoraBelowDrive[] = "Program Files\\Quovera\\Shared\\vora\
 
 // Copies `library` (the built vora.dll by default) to `belowDrive`. The old file is removed first,
 // so the loader sees a new file and not a cached one.
-inline void InstallLibrary(const TemporaryDrive& drive, const std::string& belowDrive = kVoraBelowDrive,
+inline void InstallLibrary(const TemporaryDrive& drive,
+                           const std::string& belowDrive = kVoraBelowDrive,
                            const char* library = VORA_DLL_PATH) {
   const std::filesystem::path target = drive.Native(belowDrive);
   std::filesystem::create_directories(target.parent_path());
