@@ -94,6 +94,28 @@ int ConvertRecords(const uint8_t* records, size_t size, RecordBus bus,
   return result.writeFailed ? 1 : 0;
 }
 
+bool ChosenCanChannel(const voradump::Group& group, const voradump::Channel& channel,
+                      const ConvertOptions& options) {
+  const auto protocol = channel.IntegerProperty("QV_network_protocol");
+  return (!options.hasGroup || group.name == options.group) &&
+         (!options.hasChannel || channel.name == options.channel) && protocol &&
+         voradump::BusOfProtocol(*protocol) == RecordBus::kCan;
+}
+
+// One CAN channel to candump lines; a channel that cannot be read is named on `err`.
+int ConvertCanChannel(const voradump::VoraReader& reader, const std::string& path,
+                      const voradump::Channel& channel, const ConvertOptions& options,
+                      std::FILE* out, std::FILE* err) {
+  std::vector<uint8_t> bytes;
+  if (const std::string problem = reader.ReadBytes(channel, bytes); !problem.empty()) {
+    std::fprintf(err, "kvlog: %s: group %s channel %s: %s\n", path.c_str(),
+                 voradump::Quoted(channel.group).c_str(), voradump::Quoted(channel.name).c_str(),
+                 problem.c_str());
+    return 1;
+  }
+  return ConvertRecords(bytes.data(), bytes.size(), RecordBus::kCan, options, out, err);
+}
+
 int ConvertMeasurementFile(const std::string& path, const ConvertOptions& options, std::FILE* out,
                            std::FILE* err) {
   voradump::DumpSelection selection;
@@ -103,6 +125,7 @@ int ConvertMeasurementFile(const std::string& path, const ConvertOptions& option
   selection.channel = options.channel;
   selection.hasChannel = options.hasChannel;
   selection.options = options.decode;
+  selection.tool = "kvlog";
   if (options.format == OutputFormat::kText)
     return voradump::DumpVoraFile(path, selection, out, err);
 
@@ -116,16 +139,8 @@ int ConvertMeasurementFile(const std::string& path, const ConvertOptions& option
   uint64_t converted = 0;
   for (const auto& group : reader->Groups()) {
     for (const auto& channel : group.channels) {
-      const auto protocol = channel.IntegerProperty("QV_network_protocol");
-      if ((options.hasGroup && group.name != options.group) ||
-          (options.hasChannel && channel.name != options.channel) || !protocol ||
-          voradump::BusOfProtocol(*protocol) != RecordBus::kCan) {
-        continue;
-      }
-      std::vector<uint8_t> bytes;
-      if (!reader->ReadBytes(channel, bytes)) return 1;
-      status = std::max(
-          status, ConvertRecords(bytes.data(), bytes.size(), RecordBus::kCan, options, out, err));
+      if (!ChosenCanChannel(group, channel, options)) continue;
+      status = std::max(status, ConvertCanChannel(*reader, path, channel, options, out, err));
       ++converted;
     }
   }
@@ -176,6 +191,12 @@ int ConvertBinaryLog(const std::vector<uint8_t>& file, const ConvertOptions& opt
   }
   return ConvertRecords(file.data() + kBinaryLogFileHeaderSize,
                         file.size() - kBinaryLogFileHeaderSize, *options.bus, options, out, err);
+}
+
+int ConvertFile(const std::string& path, const std::vector<uint8_t>& file,
+                const ConvertOptions& options, std::FILE* out, std::FILE* err) {
+  return IsMeasurementFile(path, file) ? ConvertMeasurementFile(path, options, out, err)
+                                       : ConvertBinaryLog(file, options, out, err);
 }
 
 namespace {
@@ -274,8 +295,7 @@ int RunKvlog(int argc, char** argv) {
     std::fprintf(stderr, "kvlog: cannot write %s: %s\n", output.c_str(), std::strerror(errno));
     return 1;
   }
-  int status = IsMeasurementFile(input, file) ? ConvertMeasurementFile(input, options, out, stderr)
-                                              : ConvertBinaryLog(file, options, out, stderr);
+  int status = ConvertFile(input, file, options, out, stderr);
   if ((out == stdout ? std::fflush(out) : std::fclose(out)) != 0) status = 1;
   return status;
 }

@@ -38,6 +38,13 @@ CandumpResult WriteCandumpLog(const uint8_t* records, size_t size,
 int ConvertBinaryLog(const std::vector<uint8_t>& file, const ConvertOptions& options,
                      std::FILE* out, std::FILE* err);
 
+// Converts the file at `path`, whose bytes `file` holds: a measurement-data file (HDF5 signature
+// or ".vora" name) is read from `path`, anything else is taken for a binary log. Every channel of
+// a measurement-data file is converted that can be; a damaged one is named on `err` and makes the
+// result 1. Returns the exit code.
+int ConvertFile(const std::string& path, const std::vector<uint8_t>& file,
+                const ConvertOptions& options, std::FILE* out, std::FILE* err);
+
 // The command line of kvlog. Returns the exit code: 0 done, 1 a file problem, 2 a usage error.
 int RunKvlog(int argc, char** argv);
 

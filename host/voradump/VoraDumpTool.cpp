@@ -54,26 +54,32 @@ void ListChannel(const Channel& c, std::FILE* out) {
   ListProperties(c.properties, "    ", out);
 }
 
+// "TOOL: FILE: group "G" channel "C": " before a problem with one channel.
+std::string Where(const DumpSelection& s, const std::string& path, const Channel& c) {
+  return std::string(s.tool) + ": " + path + ": group " + Quoted(c.group) + " channel " +
+         Quoted(c.name) + ": ";
+}
+
 // Decodes one channel; false when it cannot be read, its bus is unknown or the output fails.
-bool DecodeChannel(const VoraReader& reader, const Channel& c, const DecodeOptions& options,
-                   std::FILE* out, std::FILE* err) {
-  const std::string where = "group " + Quoted(c.group) + " channel " + Quoted(c.name);
+bool DecodeChannel(const VoraReader& reader, const std::string& path, const Channel& c,
+                   const DumpSelection& s, std::FILE* out, std::FILE* err) {
+  const std::string where = Where(s, path, c);
   const auto protocol = c.IntegerProperty(kProtocolProperty);
   const auto bus = protocol ? BusOfProtocol(*protocol) : std::nullopt;
   if (!bus) {
-    std::fprintf(err, "vora-dump: %s: no known %s property, frames not decoded\n", where.c_str(),
+    std::fprintf(err, "%sno known %s property, frames not decoded\n", where.c_str(),
                  kProtocolProperty);
     return false;
   }
   std::vector<uint8_t> bytes;
-  if (!reader.ReadBytes(c, bytes)) {
-    std::fprintf(err, "vora-dump: %s: cannot read its bytes\n", where.c_str());
+  if (const std::string problem = reader.ReadBytes(c, bytes); !problem.empty()) {
+    std::fprintf(err, "%s%s\n", where.c_str(), problem.c_str());
     return false;
   }
-  const DecodeResult result = WriteTextLog(bytes.data(), bytes.size(), *bus, options, out);
+  const DecodeResult result = WriteTextLog(bytes.data(), bytes.size(), *bus, s.options, out);
   if (result.trailingBytes > 0) {
-    std::fprintf(err, "vora-dump: %s: %llu bytes after the last whole frame record ignored\n",
-                 where.c_str(), static_cast<unsigned long long>(result.trailingBytes));
+    std::fprintf(err, "%s%llu bytes after the last whole frame record ignored\n", where.c_str(),
+                 static_cast<unsigned long long>(result.trailingBytes));
   }
   return !result.writeFailed;
 }
@@ -112,10 +118,11 @@ int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::F
   std::string error;
   const auto reader = VoraReader::Open(path, error);
   if (!reader) {
-    std::fprintf(err, "vora-dump: %s\n", error.c_str());
+    std::fprintf(err, "%s: %s\n", selection.tool, error.c_str());
     return 1;
   }
   std::vector<const Channel*> chosen;
+  bool ok = true;
   const std::vector<Group> groups = reader->Groups();
   for (const Group& g : groups) {
     if (!selection.decode && (!selection.hasGroup || g.name == selection.group)) {
@@ -125,20 +132,23 @@ int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::F
     for (const Channel& c : g.channels) {
       if (!Selected(selection, c)) continue;
       if (!selection.decode) ListChannel(c, out);
+      if (!selection.decode && !c.damage.empty()) {
+        std::fprintf(err, "%s%s\n", Where(selection, path, c).c_str(), c.damage.c_str());
+        ok = false;
+      }
       chosen.push_back(&c);
     }
   }
-  if (!selection.decode) return std::fflush(out) == 0 ? 0 : 1;
+  if (!selection.decode) return ok && std::fflush(out) == 0 ? 0 : 1;
   if (chosen.empty()) {
-    std::fprintf(err, "vora-dump: %s: no channel to decode\n", path.c_str());
+    std::fprintf(err, "%s: %s: no channel to decode\n", selection.tool, path.c_str());
     return 1;
   }
-  bool ok = true;
   for (const Channel* c : chosen) {
     if (chosen.size() > 1)
       std::fprintf(out, "== group %s channel %s ==\n", Quoted(c->group).c_str(),
                    Quoted(c->name).c_str());
-    ok = DecodeChannel(*reader, *c, selection.options, out, err) && ok;
+    ok = DecodeChannel(*reader, path, *c, selection, out, err) && ok;
   }
   return ok && std::fflush(out) == 0 ? 0 : 1;
 }

@@ -15,11 +15,13 @@ struct DumpSelection {
   bool hasGroup = false;
   bool hasChannel = false;
   DecodeOptions options;
+  const char* tool = "vora-dump";  // names the tool in the messages on `err`
 };
 
 // Lists the file's groups, channels and properties, or (with `decode`) writes the text log of every
-// selected channel to `out`; problems go to `err`. Returns the process exit code: 0 done, 1 the
-// file or a channel could not be read or written.
+// selected channel to `out`; problems go to `err`, naming the file and the channel. A damaged
+// channel does not stop the others. Returns the process exit code: 0 done, 1 the file or a channel
+// could not be read or written.
 int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out,
                  std::FILE* err);
 

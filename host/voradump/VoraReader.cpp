@@ -1,12 +1,35 @@
 // Walking an HDF5 measurement-data file with the HDF5 C API.
 #include "host/voradump/VoraReader.h"
 
+#include <filesystem>
+#include <new>
 #include <string>
+#include <system_error>
 
 #include "vora/VoraNames.h"
 
 namespace voradump {
 namespace {
+
+// A compressed dataset may unpack to more bytes than the file holds, but not to more than this.
+constexpr uint64_t kMaxUnpackedChannelBytes = uint64_t{4} << 30;
+
+// Owns one HDF5 identifier of any kind (file, group, dataset, dataspace, attribute, type, property
+// list) and closes it when it goes out of scope; an invalid identifier is left alone.
+class Hid {
+ public:
+  explicit Hid(hid_t id) : id_(id) {}
+  ~Hid() {
+    if (id_ >= 0) H5Idec_ref(id_);
+  }
+  Hid(const Hid&) = delete;
+  Hid& operator=(const Hid&) = delete;
+  hid_t get() const { return id_; }
+  bool valid() const { return id_ >= 0; }
+
+ private:
+  hid_t id_;
+};
 
 // Names of the links directly below `group`, in name order.
 std::vector<std::string> LinkNames(hid_t group) {
@@ -23,22 +46,20 @@ std::vector<std::string> LinkNames(hid_t group) {
 
 Property ReadProperty(hid_t object, const std::string& name) {
   Property property{name, std::nullopt, "(not readable)"};
-  const hid_t attribute = H5Aopen(object, name.c_str(), H5P_DEFAULT);
-  if (attribute < 0) return property;
-  const hid_t type = H5Aget_type(attribute);
-  const hid_t space = H5Aget_space(attribute);
-  if (H5Tget_class(type) == H5T_INTEGER && H5Sget_simple_extent_npoints(space) == 1) {
-    int64_t value = 0;
-    if (H5Aread(attribute, H5T_NATIVE_INT64, &value) >= 0) {
-      property.integer = value;
-      property.text = std::to_string(value);
-    }
-  } else {
+  const Hid attribute(H5Aopen(object, name.c_str(), H5P_DEFAULT));
+  if (!attribute.valid()) return property;
+  const Hid type(H5Aget_type(attribute.get()));
+  const Hid space(H5Aget_space(attribute.get()));
+  if (!type.valid() || !space.valid()) return property;
+  if (H5Tget_class(type.get()) != H5T_INTEGER || H5Sget_simple_extent_npoints(space.get()) != 1) {
     property.text = "(not an integer)";
+    return property;
   }
-  H5Sclose(space);
-  H5Tclose(type);
-  H5Aclose(attribute);
+  int64_t value = 0;
+  if (H5Aread(attribute.get(), H5T_NATIVE_INT64, &value) >= 0) {
+    property.integer = value;
+    property.text = std::to_string(value);
+  }
   return property;
 }
 
@@ -58,18 +79,28 @@ std::vector<Property> Properties(hid_t object) {
 
 // A channel is a one-dimensional dataset of 8-bit integers; anything else is not ours.
 std::optional<uint64_t> ChannelBytes(hid_t dataset) {
-  const hid_t type = H5Dget_type(dataset);
-  const hid_t space = H5Dget_space(dataset);
-  std::optional<uint64_t> bytes;
+  const Hid type(H5Dget_type(dataset));
+  const Hid space(H5Dget_space(dataset));
   hsize_t size = 0;
-  if (H5Tget_class(type) == H5T_INTEGER && H5Tget_size(type) == 1 &&
-      H5Sget_simple_extent_ndims(space) == 1 &&
-      H5Sget_simple_extent_dims(space, &size, nullptr) == 1) {
-    bytes = size;
+  if (type.valid() && space.valid() && H5Tget_class(type.get()) == H5T_INTEGER &&
+      H5Tget_size(type.get()) == 1 && H5Sget_simple_extent_ndims(space.get()) == 1 &&
+      H5Sget_simple_extent_dims(space.get(), &size, nullptr) == 1) {
+    return size;
   }
-  H5Sclose(space);
-  H5Tclose(type);
-  return bytes;
+  return std::nullopt;
+}
+
+// The most bytes a dataset can hold in a file of `fileBytes`: the file itself, unless compressed.
+uint64_t MostBytesHeld(hid_t dataset, uint64_t fileBytes) {
+  const Hid creation(H5Dget_create_plist(dataset));
+  const bool packed = creation.valid() && H5Pget_nfilters(creation.get()) > 0;
+  return packed ? kMaxUnpackedChannelBytes : fileBytes;
+}
+
+std::string SizeDamage(uint64_t bytes, uint64_t most, uint64_t fileBytes) {
+  if (bytes <= most) return {};
+  return "its size of " + std::to_string(bytes) + " bytes is more than the file of " +
+         std::to_string(fileBytes) + " bytes can hold: the file is damaged";
 }
 
 H5O_type_t ObjectType(hid_t parent, const std::string& name) {
@@ -80,14 +111,15 @@ H5O_type_t ObjectType(hid_t parent, const std::string& name) {
 }
 
 void AddChannel(hid_t group, const std::string& groupStored, const std::string& stored,
-                Group& out) {
-  const hid_t dataset = H5Dopen2(group, stored.c_str(), H5P_DEFAULT);
-  if (dataset < 0) return;
-  if (const auto bytes = ChannelBytes(dataset)) {
-    out.channels.push_back(Channel{out.name, vora::DecodeStoredName(stored),
-                                   "/" + groupStored + "/" + stored, *bytes, Properties(dataset)});
-  }
-  H5Dclose(dataset);
+                uint64_t fileBytes, Group& out) {
+  const Hid dataset(H5Dopen2(group, stored.c_str(), H5P_DEFAULT));
+  if (!dataset.valid()) return;
+  const auto bytes = ChannelBytes(dataset.get());
+  if (!bytes) return;
+  out.channels.push_back(
+      Channel{out.name, vora::DecodeStoredName(stored), "/" + groupStored + "/" + stored, *bytes,
+              Properties(dataset.get()),
+              SizeDamage(*bytes, MostBytesHeld(dataset.get(), fileBytes), fileBytes)});
 }
 
 }  // namespace
@@ -101,7 +133,9 @@ std::optional<int64_t> Channel::IntegerProperty(const std::string& propertyName)
 
 std::unique_ptr<VoraReader> VoraReader::Open(const std::string& path, std::string& error) {
   H5Eset_auto2(H5E_DEFAULT, nullptr, nullptr);
-  if (H5Fis_hdf5(path.c_str()) <= 0) {
+  std::error_code failure;
+  const uint64_t fileBytes = std::filesystem::file_size(path, failure);
+  if (failure || H5Fis_hdf5(path.c_str()) <= 0) {
     error = "not a measurement-data (HDF5) file: " + path;
     return nullptr;
   }
@@ -110,7 +144,7 @@ std::unique_ptr<VoraReader> VoraReader::Open(const std::string& path, std::strin
     error = "cannot open " + path;
     return nullptr;
   }
-  return std::unique_ptr<VoraReader>(new VoraReader(file));
+  return std::unique_ptr<VoraReader>(new VoraReader(file, fileBytes));
 }
 
 VoraReader::~VoraReader() { H5Fclose(file_); }
@@ -119,30 +153,36 @@ std::vector<Group> VoraReader::Groups() const {
   std::vector<Group> groups;
   for (const std::string& stored : LinkNames(file_)) {
     if (ObjectType(file_, stored) != H5O_TYPE_GROUP) continue;
-    const hid_t group = H5Gopen2(file_, stored.c_str(), H5P_DEFAULT);
-    if (group < 0) continue;
-    Group g{vora::DecodeStoredName(stored), Properties(group), {}};
-    for (const std::string& channel : LinkNames(group)) {
-      if (ObjectType(group, channel) == H5O_TYPE_DATASET) AddChannel(group, stored, channel, g);
+    const Hid group(H5Gopen2(file_, stored.c_str(), H5P_DEFAULT));
+    if (!group.valid()) continue;
+    Group g{vora::DecodeStoredName(stored), Properties(group.get()), {}};
+    for (const std::string& channel : LinkNames(group.get())) {
+      if (ObjectType(group.get(), channel) == H5O_TYPE_DATASET)
+        AddChannel(group.get(), stored, channel, fileBytes_, g);
     }
-    H5Gclose(group);
     groups.push_back(std::move(g));
   }
   return groups;
 }
 
-bool VoraReader::ReadBytes(const Channel& channel, std::vector<uint8_t>& out) const {
-  const hid_t dataset = H5Dopen2(file_, channel.hdf5Path.c_str(), H5P_DEFAULT);
-  if (dataset < 0) return false;
-  const auto bytes = ChannelBytes(dataset);
-  bool ok = bytes.has_value();
-  if (ok) {
-    out.resize(*bytes);
-    ok = *bytes == 0 ||
-         H5Dread(dataset, H5T_NATIVE_UINT8, H5S_ALL, H5S_ALL, H5P_DEFAULT, out.data()) >= 0;
+std::string VoraReader::ReadBytes(const Channel& channel, std::vector<uint8_t>& out) const {
+  const Hid dataset(H5Dopen2(file_, channel.hdf5Path.c_str(), H5P_DEFAULT));
+  const auto bytes = dataset.valid() ? ChannelBytes(dataset.get()) : std::nullopt;
+  if (!bytes) return "its bytes cannot be read: the file is damaged";
+  if (std::string damage = SizeDamage(*bytes, MostBytesHeld(dataset.get(), fileBytes_), fileBytes_);
+      !damage.empty()) {
+    return damage;
   }
-  H5Dclose(dataset);
-  return ok;
+  try {
+    out.resize(*bytes);
+  } catch (const std::bad_alloc&) {
+    return "its " + std::to_string(*bytes) + " bytes do not fit in memory";
+  }
+  if (*bytes > 0 &&
+      H5Dread(dataset.get(), H5T_NATIVE_UINT8, H5S_ALL, H5S_ALL, H5P_DEFAULT, out.data()) < 0) {
+    return "its bytes cannot be read: the file is damaged";
+  }
+  return {};
 }
 
 }  // namespace voradump

@@ -21,8 +21,10 @@ struct Channel {
   std::string group;  // decoded names, as the writer gave them
   std::string name;
   std::string hdf5Path;  // the dataset's path in the file
-  uint64_t bytes = 0;
+  uint64_t bytes = 0;    // the size the file states; see `damage`
   std::vector<Property> properties;
+  // Why the stated size cannot be true (more bytes than the file can hold); empty when it can.
+  std::string damage;
 
   std::optional<int64_t> IntegerProperty(const std::string& propertyName) const;
 };
@@ -33,7 +35,9 @@ struct Group {
   std::vector<Channel> channels;
 };
 
-// A measurement-data file opened for reading. Not thread-safe (HDF5 is not).
+// A measurement-data file opened for reading. Not thread-safe (HDF5 is not). Every HDF5 object it
+// opens is closed again before the call that opened it returns, on every path; the file itself
+// is closed by the destructor.
 class VoraReader {
  public:
   // Null with `error` set when the file cannot be opened as HDF5.
@@ -45,12 +49,15 @@ class VoraReader {
   // Every group below the root with its channels (one-dimensional byte datasets), in name order.
   // Other objects (written by other tools) are skipped.
   std::vector<Group> Groups() const;
-  // The raw bytes of a channel; false when they cannot be read.
-  bool ReadBytes(const Channel& channel, std::vector<uint8_t>& out) const;
+  // Reads the raw bytes of a channel. Returns why they cannot be read (a damaged size, too little
+  // memory, a damaged file), or an empty text when `out` holds them. Nothing is allocated for a
+  // size the file cannot hold.
+  [[nodiscard]] std::string ReadBytes(const Channel& channel, std::vector<uint8_t>& out) const;
 
  private:
-  explicit VoraReader(hid_t file) : file_(file) {}
+  VoraReader(hid_t file, uint64_t fileBytes) : file_(file), fileBytes_(fileBytes) {}
   hid_t file_;
+  uint64_t fileBytes_;  // the file's size on disk
 };
 
 }  // namespace voradump

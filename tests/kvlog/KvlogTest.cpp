@@ -223,4 +223,40 @@ TEST(KvlogMeasurementFile, CanChannelsBecomeCandumpLinesAndOtherBusesAreLeftOut)
   EXPECT_EQ(run.out, "(1715936703.042000) vcan1 1A0#AABBCC\n");
 }
 
+// A channel whose stated size is far beyond the file (as one changed byte makes it): nothing is
+// allocated for it, it is named, and the other channel is still converted.
+TEST(KvlogMeasurementFile, ChannelOfDamagedSizeIsNamedAndTheOthersConverted) {
+  voratest::VoraDll dll;
+  ASSERT_TRUE(dll.complete());
+  voratest::TempDir dir;
+  const std::string path = dir / "run.vora";
+  int32_t file = -1;
+  ASSERT_EQ(dll.FileOpenExA(path.c_str(), 2, 2, 4713, &file), 0);
+  const int32_t good = dll.OpenChannel(file, "/'Bus'/'CAN1'", 0);
+  dll.OpenChannel(file, "/'Bus'/'CAN2'", 0);
+  const auto batch = kvtest::Batch({{.identifier = 0x1A0, .payload = {0xaa}}});
+  uint8_t record[24];
+  CopyBinaryRecord(record, sizeof record, kvtest::FirstView(batch), BinaryRecordLayout::kFixed24);
+  dll.ObjRawSet(5, 24, record, file, good);
+  dll.FileClose(file);
+  dll.Unload();
+  constexpr hsize_t kClaimed = hsize_t{1} << 40;
+  ASSERT_TRUE(voratest::SetExtent(path, "/Bus/CAN2", kClaimed));
+
+  const struct {
+    const char* format;
+    const char* goodFrame;
+  } cases[] = {{"--candump", " 1A0#AA\n"}, {"--format text", "\t1a0\taa  \t1\t"}};
+  for (const auto& c : cases) {
+    const auto run =
+        RunTool(std::string(KVLOG_PATH) + " " + c.format + " '" + path + "'", dir.path);
+    EXPECT_EQ(run.exitCode, 1) << c.format;
+    EXPECT_NE(run.out.find(c.goodFrame), std::string::npos) << c.format << ": " << run.out;
+    EXPECT_NE(run.err.find(path + ": group \"Bus\" channel \"CAN2\": its size of " +
+                           std::to_string(kClaimed) + " bytes is more than the file"),
+              std::string::npos)
+        << c.format << ": " << run.err;
+  }
+}
+
 }  // namespace

@@ -46,7 +46,7 @@ inline std::optional<ChannelContents> OnlyChannel(const std::filesystem::path& f
     return std::nullopt;
   }
   ChannelContents contents{groups[0].channels[0], {}};
-  EXPECT_TRUE(reader->ReadBytes(contents.channel, contents.bytes));
+  EXPECT_EQ(reader->ReadBytes(contents.channel, contents.bytes), "");
   return contents;
 }
 
