@@ -1,6 +1,7 @@
 // Sources of frames on a simulated CAN bus.
 #include "tarvix/CanSource.h"
 
+#include <algorithm>
 #include <cmath>
 
 #include "driver/FrameTypes.h"
@@ -74,8 +75,12 @@ ReplaySource::ReplaySource(std::vector<LoggedFrame> frames, const ReplayConfig& 
     : frames_(std::move(frames)), loop_(config.loop), startNs_(epochNs + MsToNs(config.offsetMs)) {
   done_ = frames_.empty();
   if (done_) return;
-  // A looping log repeats one millisecond after its last frame.
-  spanNs_ = (frames_.back().timeUs - frames_.front().timeUs) * 1000 + 1000000;
+  // A looping log repeats one millisecond after its latest frame. Logs are in time order, but a
+  // damaged or hand-made one need not be: a round must still move forward.
+  const auto latest = std::max_element(
+      frames_.begin(), frames_.end(),
+      [](const LoggedFrame& a, const LoggedFrame& b) { return a.timeUs < b.timeUs; });
+  spanNs_ = (latest->timeUs - frames_.front().timeUs) * 1000 + 1000000;
   build();
 }
 
@@ -100,7 +105,7 @@ void ReplaySource::sent(int64_t, int64_t) {
 }
 
 void ReplaySource::skipTo(int64_t nowNs) {
-  if (!done_ && loop_ && pending_.dueNs + spanNs_ < nowNs) {
+  if (!done_ && loop_ && nowNs - pending_.dueNs > spanNs_) {
     round_ += (nowNs - pending_.dueNs) / spanNs_;  // whole rounds nobody heard
     build();
   }

@@ -32,21 +32,41 @@ bool ParseHex(std::string_view text, uint32_t& out) {
   return true;
 }
 
+// Seconds are bounded (the year 2096) so that the replay's sums of times, distances between times
+// and a round's length stay well inside its signed 64-bit nanoseconds.
+constexpr int64_t kMaxSeconds = 4'000'000'000;
+
+bool ParseSeconds(std::string_view digits, int64_t& seconds) {
+  if (digits.empty()) return false;
+  seconds = 0;
+  for (char c : digits) {
+    if (c < '0' || c > '9') return false;
+    seconds = seconds * 10 + (c - '0');
+    if (seconds > kMaxSeconds) return false;
+  }
+  return true;
+}
+
+// Any number of decimals: the first six are the microseconds, later ones are dropped.
+bool ParseMicroseconds(std::string_view decimals, int64_t& micros) {
+  micros = 0;
+  for (size_t i = 0; i < decimals.size(); ++i) {
+    const char c = decimals[i];
+    if (c < '0' || c > '9') return false;
+    if (i < 6) micros = micros * 10 + (c - '0');
+  }
+  for (size_t i = decimals.size(); i < 6; ++i) micros *= 10;
+  return true;
+}
+
 bool ParseTime(std::string_view token, int64_t& timeUs) {
   if (token.size() < 3 || token.front() != '(' || token.back() != ')') return false;
   token = token.substr(1, token.size() - 2);
   const size_t dot = token.find('.');
-  if (dot == std::string_view::npos || token.size() - dot - 1 != 6) return false;
-  int64_t seconds = 0;
-  for (char c : token.substr(0, dot)) {
-    if (c < '0' || c > '9' || seconds > 1000000000000LL) return false;
-    seconds = seconds * 10 + (c - '0');
-  }
-  int64_t micros = 0;
-  for (char c : token.substr(dot + 1)) {
-    if (c < '0' || c > '9') return false;
-    micros = micros * 10 + (c - '0');
-  }
+  int64_t seconds = 0, micros = 0;
+  if (!ParseSeconds(token.substr(0, dot), seconds)) return false;
+  if (dot != std::string_view::npos && !ParseMicroseconds(token.substr(dot + 1), micros))
+    return false;
   timeUs = seconds * 1000000 + micros;
   return true;
 }
@@ -134,23 +154,28 @@ bool ParseCandumpLine(std::string_view line, LoggedFrame& out) {
   return ParseFrameToken(frame, out.frame);
 }
 
+bool ReadCandumpLog(std::istream& in, const std::string& name, std::vector<LoggedFrame>& out,
+                    std::string& error) {
+  std::string line;
+  for (size_t number = 1; std::getline(in, line); ++number) {
+    if (line.find_first_not_of(" \t\r\n") == std::string::npos) continue;
+    LoggedFrame f;
+    if (!ParseCandumpLine(line, f)) {
+      error = "candump log \"" + name + "\" line " + std::to_string(number) + ": malformed frame";
+      return false;
+    }
+    out.push_back(std::move(f));
+  }
+  return true;
+}
+
 bool ReadCandumpFile(const std::string& path, std::vector<LoggedFrame>& out, std::string& error) {
   std::ifstream in(path);
   if (!in) {
     error = "cannot read candump log \"" + path + "\"";
     return false;
   }
-  std::string line;
-  for (size_t number = 1; std::getline(in, line); ++number) {
-    if (line.find_first_not_of(" \t\r\n") == std::string::npos) continue;
-    LoggedFrame f;
-    if (!ParseCandumpLine(line, f)) {
-      error = "candump log \"" + path + "\" line " + std::to_string(number) + ": malformed frame";
-      return false;
-    }
-    out.push_back(std::move(f));
-  }
-  return true;
+  return ReadCandumpLog(in, path, out, error);
 }
 
 std::string FormatCandumpLine(const SimFrame& f, const std::string& interfaceName) {

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <istream>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -17,13 +18,18 @@ struct LoggedFrame {
   SimFrame frame;
 };
 
-// Line format: "(SECONDS.MICROS) IFACE ID#DATA", where ID is 3 hex digits (standard), 8 hex digits
-// (extended; with bit 29 set: an error frame), DATA is hex bytes; "ID#R" or "ID#Rn" a remote frame
-// with length n; "ID##F" + DATA a CAN FD frame whose flags nibble F has bit 0 for bit-rate
-// switching. Anything after the frame token is ignored. Returns false for a malformed line.
+// Line format: "(SECONDS.DECIMALS) IFACE ID#DATA". The time takes any number of decimals, or none
+// ("(1)", "(1.5)", "(1.000001)"; digits past the microseconds are dropped), and at most
+// 4 000 000 000 seconds. ID is 3 hex digits (standard) or 8 hex digits (extended; with bit 29 set:
+// an error frame), DATA is hex bytes; "ID#R" or "ID#Rn" a remote frame with length n; "ID##F" +
+// DATA a CAN FD frame whose flags nibble F has bit 0 for bit-rate switching. Anything after the
+// frame token is ignored. Returns false for a malformed line.
 bool ParseCandumpLine(std::string_view line, LoggedFrame& out);
 
-// Reads a whole log; blank lines are skipped, the first malformed line fails with its number.
+// Reads a whole log; blank lines are skipped, the first malformed line fails with its number
+// (`name` names the log in the error).
+bool ReadCandumpLog(std::istream& in, const std::string& name, std::vector<LoggedFrame>& out,
+                    std::string& error);
 bool ReadCandumpFile(const std::string& path, std::vector<LoggedFrame>& out, std::string& error);
 
 // The log line of a frame carried on a bus, with its newline. Bus-error frames are written as
