@@ -138,6 +138,7 @@ int ConvertMeasurementFile(const std::string& path, const ConvertOptions& option
   int status = 0;
   uint64_t converted = 0;
   for (const auto& group : reader->Groups()) {
+    if (!voradump::ReportUnreadable(group, selection, path, err)) status = 1;
     for (const auto& channel : group.channels) {
       if (!ChosenCanChannel(group, channel, options)) continue;
       status = std::max(status, ConvertCanChannel(*reader, path, channel, options, out, err));

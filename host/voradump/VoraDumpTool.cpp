@@ -113,6 +113,25 @@ std::string Quoted(const std::string& name) {
   return quoted + "\"";
 }
 
+bool ReportUnreadable(const Group& group, const DumpSelection& selection, const std::string& path,
+                      std::FILE* err) {
+  if (selection.hasGroup && group.name != selection.group) return true;
+  const std::string where =
+      std::string(selection.tool) + ": " + path + ": group " + Quoted(group.name);
+  if (!group.readable) {
+    std::fprintf(err, "%s: cannot be read: the file is damaged\n", where.c_str());
+    return false;
+  }
+  bool none = true;
+  for (const std::string& name : group.unreadable) {
+    if (selection.hasChannel && name != selection.channel) continue;
+    std::fprintf(err, "%s object %s: cannot be read: the file is damaged\n", where.c_str(),
+                 Quoted(name).c_str());
+    none = false;
+  }
+  return none;
+}
+
 int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out,
                  std::FILE* err) {
   std::string error;
@@ -125,6 +144,8 @@ int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::F
   bool ok = true;
   const std::vector<Group> groups = reader->Groups();
   for (const Group& g : groups) {
+    ok = ReportUnreadable(g, selection, path, err) && ok;
+    if (!g.readable) continue;
     if (!selection.decode && (!selection.hasGroup || g.name == selection.group)) {
       std::fprintf(out, "group %s\n", Quoted(g.name).c_str());
       ListProperties(g.properties, "  ", out);

@@ -5,6 +5,7 @@
 #include <string>
 
 #include "host/voradump/RecordDecoder.h"
+#include "host/voradump/VoraReader.h"
 
 namespace voradump {
 
@@ -24,6 +25,12 @@ struct DumpSelection {
 // could not be read or written.
 int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out,
                  std::FILE* err);
+
+// Names on `err` what of `group` cannot be read and is selected: the group itself, or objects
+// below it ("TOOL: FILE: group "G" object "X": cannot be read: the file is damaged"). Returns false
+// when there was something to name.
+bool ReportUnreadable(const Group& group, const DumpSelection& selection, const std::string& path,
+                      std::FILE* err);
 
 // The command line of vora-dump. Returns the exit code (2 for a usage error).
 int RunVoraDump(int argc, char** argv);

@@ -103,10 +103,11 @@ std::string SizeDamage(uint64_t bytes, uint64_t most, uint64_t fileBytes) {
          std::to_string(fileBytes) + " bytes can hold: the file is damaged";
 }
 
-H5O_type_t ObjectType(hid_t parent, const std::string& name) {
+// The type of the object a link names; nullopt when its header cannot be read.
+std::optional<H5O_type_t> ObjectType(hid_t parent, const std::string& name) {
   H5O_info_t info{};
   if (H5Oget_info_by_name2(parent, name.c_str(), &info, H5O_INFO_BASIC, H5P_DEFAULT) < 0)
-    return H5O_TYPE_UNKNOWN;
+    return std::nullopt;
   return info.type;
 }
 
@@ -149,18 +150,32 @@ std::unique_ptr<VoraReader> VoraReader::Open(const std::string& path, std::strin
 
 VoraReader::~VoraReader() { H5Fclose(file_); }
 
+Group VoraReader::ReadGroup(const std::string& stored) const {
+  Group g{vora::DecodeStoredName(stored), {}, {}, true, {}};
+  const Hid group(H5Gopen2(file_, stored.c_str(), H5P_DEFAULT));
+  if (!group.valid()) {
+    g.readable = false;
+    return g;
+  }
+  g.properties = Properties(group.get());
+  for (const std::string& channel : LinkNames(group.get())) {
+    const auto type = ObjectType(group.get(), channel);
+    if (!type)
+      g.unreadable.push_back(vora::DecodeStoredName(channel));
+    else if (*type == H5O_TYPE_DATASET)
+      AddChannel(group.get(), stored, channel, fileBytes_, g);
+  }
+  return g;
+}
+
 std::vector<Group> VoraReader::Groups() const {
   std::vector<Group> groups;
   for (const std::string& stored : LinkNames(file_)) {
-    if (ObjectType(file_, stored) != H5O_TYPE_GROUP) continue;
-    const Hid group(H5Gopen2(file_, stored.c_str(), H5P_DEFAULT));
-    if (!group.valid()) continue;
-    Group g{vora::DecodeStoredName(stored), Properties(group.get()), {}};
-    for (const std::string& channel : LinkNames(group.get())) {
-      if (ObjectType(group.get(), channel) == H5O_TYPE_DATASET)
-        AddChannel(group.get(), stored, channel, fileBytes_, g);
-    }
-    groups.push_back(std::move(g));
+    const auto type = ObjectType(file_, stored);
+    if (!type)
+      groups.push_back(Group{vora::DecodeStoredName(stored), {}, {}, false, {}});
+    else if (*type == H5O_TYPE_GROUP)
+      groups.push_back(ReadGroup(stored));
   }
   return groups;
 }

@@ -33,6 +33,8 @@ struct Group {
   std::string name;  // decoded
   std::vector<Property> properties;
   std::vector<Channel> channels;
+  bool readable = true;  // false: the group's own object cannot be read (a damaged file)
+  std::vector<std::string> unreadable;  // decoded names of objects below it that cannot be read
 };
 
 // A measurement-data file opened for reading. Not thread-safe (HDF5 is not). Every HDF5 object it
@@ -47,7 +49,8 @@ class VoraReader {
   VoraReader& operator=(const VoraReader&) = delete;
 
   // Every group below the root with its channels (one-dimensional byte datasets), in name order.
-  // Other objects (written by other tools) are skipped.
+  // Other objects (written by other tools) are skipped; objects that cannot be read at all are
+  // listed as unreadable.
   std::vector<Group> Groups() const;
   // Reads the raw bytes of a channel. Returns why they cannot be read (a damaged size, too little
   // memory, a damaged file), or an empty text when `out` holds them. Nothing is allocated for a
@@ -56,6 +59,7 @@ class VoraReader {
 
  private:
   VoraReader(hid_t file, uint64_t fileBytes) : file_(file), fileBytes_(fileBytes) {}
+  Group ReadGroup(const std::string& stored) const;
   hid_t file_;
   uint64_t fileBytes_;  // the file's size on disk
 };

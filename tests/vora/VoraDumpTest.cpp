@@ -117,4 +117,15 @@ TEST_F(VoraDump, ChannelsWithoutAKnownBusOrFilesOfOtherKindsFail) {
   EXPECT_NE(other.err.find("not a measurement-data (HDF5) file"), std::string::npos) << other.err;
 }
 
+// A file from the fuzz corpus whose channel header was damaged: the channel cannot even be opened.
+TEST(VoraDumpDamagedFile, ChannelThatCannotBeReadIsNamed) {
+  voratest::TempDir dir;
+  const std::string file = std::string(KV_MEASUREMENT_CORPUS) + "/regression-huge-object-header";
+  const auto run = kvtest::RunTool(std::string(VORADUMP_PATH) + " '" + file + "'", dir.path);
+  EXPECT_EQ(run.exitCode, 1);
+  EXPECT_NE(run.err.find(file + ": group \"Bus\" object \"CAN1\": cannot be read"),
+            std::string::npos)
+      << run.err;
+}
+
 }  // namespace
