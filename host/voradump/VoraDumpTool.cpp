@@ -132,6 +132,33 @@ bool ReportUnreadable(const Group& group, const DumpSelection& selection, const 
   return none;
 }
 
+namespace {
+
+// Lists one group (unless decoding) and adds its selected channels to `chosen`; false when
+// something of it is damaged.
+bool WalkGroup(const Group& g, const DumpSelection& selection, const std::string& path,
+               std::vector<const Channel*>& chosen, std::FILE* out, std::FILE* err) {
+  bool ok = ReportUnreadable(g, selection, path, err);
+  if (!g.readable) return ok;
+  if (!selection.decode && (!selection.hasGroup || g.name == selection.group)) {
+    std::fprintf(out, "group %s\n", Quoted(g.name).c_str());
+    ListProperties(g.properties, "  ", out);
+  }
+  for (const Channel& c : g.channels) {
+    if (!Selected(selection, c)) continue;
+    chosen.push_back(&c);
+    if (selection.decode) continue;
+    ListChannel(c, out);
+    if (!c.damage.empty()) {
+      std::fprintf(err, "%s%s\n", Where(selection, path, c).c_str(), c.damage.c_str());
+      ok = false;
+    }
+  }
+  return ok;
+}
+
+}  // namespace
+
 int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::FILE* out,
                  std::FILE* err) {
   std::string error;
@@ -143,23 +170,7 @@ int DumpVoraFile(const std::string& path, const DumpSelection& selection, std::F
   std::vector<const Channel*> chosen;
   bool ok = true;
   const std::vector<Group> groups = reader->Groups();
-  for (const Group& g : groups) {
-    ok = ReportUnreadable(g, selection, path, err) && ok;
-    if (!g.readable) continue;
-    if (!selection.decode && (!selection.hasGroup || g.name == selection.group)) {
-      std::fprintf(out, "group %s\n", Quoted(g.name).c_str());
-      ListProperties(g.properties, "  ", out);
-    }
-    for (const Channel& c : g.channels) {
-      if (!Selected(selection, c)) continue;
-      if (!selection.decode) ListChannel(c, out);
-      if (!selection.decode && !c.damage.empty()) {
-        std::fprintf(err, "%s%s\n", Where(selection, path, c).c_str(), c.damage.c_str());
-        ok = false;
-      }
-      chosen.push_back(&c);
-    }
-  }
+  for (const Group& g : groups) ok = WalkGroup(g, selection, path, chosen, out, err) && ok;
   if (!selection.decode) return ok && std::fflush(out) == 0 ? 0 : 1;
   if (chosen.empty()) {
     std::fprintf(err, "%s: %s: no channel to decode\n", selection.tool, path.c_str());
