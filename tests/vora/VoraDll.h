@@ -121,4 +121,13 @@ inline bool SetExtent(const std::string& file, const std::string& dataset, hsize
   return H5Fclose(f) >= 0 && done;
 }
 
+// Adds a soft link to nothing at `name`; false when that fails.
+inline bool AddDanglingLink(const std::string& file, const std::string& name) {
+  H5Eset_auto2(H5E_DEFAULT, nullptr, nullptr);
+  const hid_t f = H5Fopen(file.c_str(), H5F_ACC_RDWR, H5P_DEFAULT);
+  if (f < 0) return false;
+  const bool done = H5Lcreate_soft("/nowhere", f, name.c_str(), H5P_DEFAULT, H5P_DEFAULT) >= 0;
+  return H5Fclose(f) >= 0 && done;
+}
+
 }  // namespace voratest
