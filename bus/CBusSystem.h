@@ -6,6 +6,7 @@
 #include <memory>
 #include <memory_resource>
 
+#include "hostlink/LinkedSession.h"
 #include "logging/LogFile.h"
 #include "qvapal/iThread.h"
 #include "qvapal/tThreadController.h"
@@ -14,12 +15,6 @@
 namespace nKV_DLL300 {
 
 class HostConnection;
-
-// Bus kinds, as the connection's busType numbers them.
-inline constexpr uint32_t kBusTypeNone = 0;
-inline constexpr uint32_t kBusTypeCan = 1;
-inline constexpr uint32_t kBusTypeLin = 2;
-inline constexpr uint32_t kBusTypeFlexRay = 3;
 
 // The read status that only says "no frame yet": never recorded as lastStatus.
 inline constexpr int32_t kReadNothingYet = static_cast<int32_t>(0xBFF6300A);
@@ -33,10 +28,11 @@ inline constexpr int32_t kStatusTableNotAllocated = -22;
 //
 // Two threads share a session: the poll thread (run, pollLoop, reportBusState) and the service
 // thread (commands, watchdog, stop, destructor). The flags, idCount and lastStatus are atomics;
-// everything else is one thread's at a time as noted. The connection outlives the session.
+// everything else is one thread's at a time as noted. The connection outlives the session. The
+// bus kind, the connection, idCount and lastStatus are the LinkedSession part.
 //
 // The virtual operations keep this slot order in every bus class.
-class CBusSystem {
+class CBusSystem : public LinkedSession {
  public:
   explicit CBusSystem(HostConnection* owner, uint32_t kind = kBusTypeNone);
   CBusSystem(const CBusSystem&) = delete;
@@ -69,15 +65,6 @@ class CBusSystem {
     if (status != 0) lastStatus.store(status);
   }
 
-  // The bus this session was created for (kBusTypeCan ...). It stays what it was even when the
-  // host names another bus with SET_PROP_SESSION_PORTNAME while the session runs: bus-specific
-  // commands and texts follow this kind, not the connection's busType.
-  const uint32_t busType;
-
-  // Used entries of the identifier table: written by the poll thread, read by SendReply anywhere.
-  std::atomic<uint16_t> idCount{0};
-  // Last non-zero driver status or program error code; nothing resets it. Both threads write.
-  std::atomic<int32_t> lastStatus{0};
   // The poll loop runs while true; cleared by CMD_SESSION_STOP and stop(). Never set again.
   std::atomic<bool> pollActive{true};
   // The poll thread runs while true; cleared by stop(), the destructor and a failed start.
@@ -87,8 +74,6 @@ class CBusSystem {
   // Reference of kxCreateSession; 0 when none is held. Written by the service thread while no poll
   // thread runs (open, stop); the poll thread only reads it.
   uint32_t driverSession = 0;
-  // The connection whose settings the session reads and to which it sends. Not owned.
-  HostConnection* const connection;
   // Where identifier tables are allocated; tests give a resource that refuses. Set before the
   // poll thread starts.
   std::pmr::memory_resource* tableResource = std::pmr::get_default_resource();

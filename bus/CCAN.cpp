@@ -6,7 +6,7 @@
 #include "bus/CPollCANDataThread.h"
 #include "bus/CanStatistics.h"
 #include "driver/tarvix.h"
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 
 namespace nKV_DLL300 {
 

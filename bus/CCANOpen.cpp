@@ -5,7 +5,7 @@
 #include "driver/Properties.h"
 #include "driver/Sessions.h"
 #include "driver/tarvix.h"
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 #include "timing/Time.h"
 
 namespace nKV_DLL300 {

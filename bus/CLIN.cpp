@@ -10,7 +10,7 @@
 #include "driver/Sessions.h"
 #include "driver/States.h"
 #include "driver/tarvix.h"
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 
 namespace nKV_DLL300 {
 

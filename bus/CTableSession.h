@@ -10,10 +10,10 @@
 #include "bus/IdentifierTable.h"
 #include "bus/RawFrame.h"
 #include "driver/tarvix.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 #include "logging/LogWriters.h"
-#include "service/HostConnection.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
 #include "timing/Time.h"
 
 namespace nKV_DLL300 {

@@ -8,10 +8,10 @@
 #include <string>
 #include <string_view>
 
+#include "hostlink/HostConnection.h"
 #include "protocol/Dispatcher.h"
 #include "protocol/ValueReaders.h"
 #include "service/Configuration.h"
-#include "service/HostConnection.h"
 
 namespace {
 

@@ -4,10 +4,10 @@
 #include <exception>
 #include <string>
 
-#include "bus/CBusSystem.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/LinkedSession.h"
 #include "logging/LogFileName.h"
 #include "logging/VoraLog.h"
-#include "service/HostConnection.h"
 
 namespace nKV_DLL300 {
 

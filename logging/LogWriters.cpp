@@ -1,14 +1,14 @@
 // The per-bus writers: frame selection over a batch, then text lines or binary records.
 #include "logging/LogWriters.h"
 
-#include "bus/CBusSystem.h"
 #include "bus/RawFrame.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/LinkedSession.h"
 #include "logging/BinaryLogFormat.h"
 #include "logging/FrameSelection.h"
 #include "logging/LogFileName.h"
 #include "logging/TextLogFormat.h"
 #include "logging/VoraLog.h"
-#include "service/HostConnection.h"
 
 namespace nKV_DLL300 {
 

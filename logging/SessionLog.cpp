@@ -3,16 +3,16 @@
 
 #include <cstdio>
 
-#include "bus/CBusSystem.h"
+#include "hostlink/LinkedSession.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 #include "platform/Drive.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
 
 namespace nKV_DLL300 {
 
 namespace {
 
-void SendLogError(const CBusSystem& session, int32_t code) {
+void SendLogError(const LinkedSession& session, int32_t code) {
   char text[sizeof kLogErrorFormat + 16];
   std::snprintf(text, sizeof text, kLogErrorFormat, code);
   SendText(*session.connection, text, &session, kMessageErrorText);
@@ -51,6 +51,8 @@ void SessionLog::fail(int32_t code) {
   SendLogError(session_, code);
 }
 
-void ReportLogError(const CBusSystem& session) { SendLogError(session, session.lastStatus.load()); }
+void ReportLogError(const LinkedSession& session) {
+  SendLogError(session, session.lastStatus.load());
+}
 
 }  // namespace nKV_DLL300

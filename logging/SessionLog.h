@@ -12,7 +12,7 @@
 
 namespace nKV_DLL300 {
 
-class CBusSystem;
+class LinkedSession;
 
 // Logging error codes, stored in the session's lastStatus and reported to the host.
 inline constexpr int32_t kLogOpenFailed = -20;       // not named, no directory, or not opened
@@ -29,13 +29,13 @@ inline constexpr char kLogErrorFormat[] = "<ERROR:LOG FILE: %d> \n";
 // The two never overlap, so nothing here is locked.
 class SessionLog {
  public:
-  explicit SessionLog(CBusSystem& session) : session_(session) {}
+  explicit SessionLog(LinkedSession& session) : session_(session) {}
   // A stream still open (a session destroyed without stop) is closed without a report.
   ~SessionLog();
   SessionLog(const SessionLog&) = delete;
   SessionLog& operator=(const SessionLog&) = delete;
 
-  CBusSystem& session() const { return session_; }
+  LinkedSession& session() const { return session_; }
 
   // The log type this run opened with; the writers and the close follow it, not a type the
   // host sets while the session runs (that one takes effect at the next run). -1: none yet.
@@ -68,7 +68,7 @@ class SessionLog {
   int32_t voraChannel = -1;
 
  private:
-  CBusSystem& session_;
+  LinkedSession& session_;
   std::FILE* logFile_ = nullptr;
   int32_t openedType_ = -1;
   BinaryRecordLayout canLayout_ = BinaryRecordLayout::kFixed24;
@@ -81,6 +81,6 @@ class SessionLog {
 
 // Sends the session's lastStatus as "<ERROR:LOG FILE: %d> \n" (message type 5), with the session
 // attached so that the header carries lastStatus too. Any thread of the session.
-void ReportLogError(const CBusSystem& session);
+void ReportLogError(const LinkedSession& session);
 
 }  // namespace nKV_DLL300

@@ -4,11 +4,11 @@
 #include <exception>
 #include <iterator>
 
-#include "bus/CBusSystem.h"
 #include "bus/RawFrame.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/LinkedSession.h"
 #include "logging/FrameSelection.h"
 #include "logging/MeasurementLibrary.h"
-#include "service/HostConnection.h"
 #include "vora/VoraApi.h"
 
 namespace nKV_DLL300 {

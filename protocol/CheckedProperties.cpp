@@ -4,8 +4,8 @@
 #include <atomic>
 #include <type_traits>
 
+#include "hostlink/HostConnection.h"
 #include "protocol/ValueReaders.h"
-#include "service/HostConnection.h"
 
 namespace nKV_DLL300 {
 

@@ -3,10 +3,10 @@
 
 #include <array>
 
+#include "hostlink/HostLink.h"
+#include "hostlink/MessageTable.h"
 #include "protocol/HardwareInfo.h"
-#include "protocol/MessageTable.h"
 #include "protocol/SessionCommands.h"
-#include "service/HostLink.h"
 
 namespace nKV_DLL300 {
 

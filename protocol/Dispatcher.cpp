@@ -3,12 +3,13 @@
 
 #include <array>
 
+#include "bus/CBusSystem.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/HostLink.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 #include "protocol/CommandHandlers.h"
 #include "protocol/PropertyHandlers.h"
-#include "service/HostConnection.h"
-#include "service/HostLink.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
 
 namespace nKV_DLL300 {
 

@@ -3,9 +3,10 @@
 
 #include <cstring>
 
-#include "service/HostConnection.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
+#include "bus/CBusSystem.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 
 namespace nKV_DLL300 {
 

@@ -4,8 +4,8 @@
 #include <cstdint>
 #include <vector>
 
+#include "hostlink/HardwareRecord.h"
 #include "protocol/DriverSystem.h"
-#include "protocol/HardwareRecord.h"
 
 namespace nKV_DLL300 {
 

@@ -1,7 +1,7 @@
 // The port name chooses the bus type; the log file name is kept inside the service directory.
 #include "protocol/NameProperties.h"
 
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 
 namespace nKV_DLL300 {
 

@@ -3,8 +3,8 @@
 
 #include <array>
 
+#include "hostlink/MessageTable.h"
 #include "protocol/CheckedProperties.h"
-#include "protocol/MessageTable.h"
 #include "protocol/NameProperties.h"
 #include "protocol/PlainProperties.h"
 #include "protocol/SessionLockedProperties.h"

@@ -1,9 +1,10 @@
 // Reply texts of the property handlers, formatted in full and sent with their message type.
 #include "protocol/PropertyReply.h"
 
-#include "service/HostConnection.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
+#include "bus/CBusSystem.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 
 namespace nKV_DLL300 {
 

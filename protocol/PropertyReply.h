@@ -6,7 +6,7 @@
 #include <string>
 #include <string_view>
 
-#include "protocol/MessageTable.h"
+#include "hostlink/MessageTable.h"
 #include "protocol/PropertyHandlers.h"
 
 namespace nKV_DLL300 {

@@ -7,11 +7,11 @@
 #include "bus/CCAN.h"
 #include "bus/CFlexRay.h"
 #include "bus/CLIN.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/HostLink.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 #include "protocol/TransmitProperties.h"
-#include "service/HostConnection.h"
-#include "service/HostLink.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
 
 namespace nKV_DLL300 {
 

@@ -4,8 +4,9 @@
 #include <atomic>
 #include <type_traits>
 
+#include "bus/CBusSystem.h"
+#include "hostlink/HostConnection.h"
 #include "protocol/ValueReaders.h"
-#include "service/HostConnection.h"
 
 namespace nKV_DLL300 {
 

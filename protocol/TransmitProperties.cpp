@@ -2,8 +2,8 @@
 #include "protocol/TransmitProperties.h"
 
 #include "bus/CCAN.h"
+#include "hostlink/HostConnection.h"
 #include "protocol/ValueReaders.h"
-#include "service/HostConnection.h"
 #include "transmit/CTransmitFrame.h"
 
 namespace nKV_DLL300 {

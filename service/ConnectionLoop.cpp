@@ -1,12 +1,12 @@
 // The connection loop's pass over the listener and the eight slots.
 #include "service/ConnectionLoop.h"
 
+#include "hostlink/HostLink.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 #include "platform/net/SocketError.h"
 #include "protocol/Dispatcher.h"
 #include "protocol/HardwareInfo.h"
-#include "service/HostLink.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
 #include "service/ServiceContext.h"
 
 namespace nKV_DLL300 {

@@ -9,12 +9,12 @@
 #include <string>
 #include <vector>
 
+#include "hostlink/HardwareRecord.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/ServiceStatistics.h"
 #include "platform/net/Socket.h"
 #include "protocol/DriverSystem.h"
-#include "protocol/HardwareRecord.h"
 #include "qvapal/tThreadController.h"
-#include "service/HostConnection.h"
-#include "service/ServiceStatistics.h"
 
 namespace nKV_DLL300 {
 

@@ -5,7 +5,7 @@
 #include <string_view>
 #include <vector>
 
-#include "protocol/SessionSettings.h"
+#include "hostlink/SessionSettings.h"
 
 namespace nKV_DLL300 {
 

@@ -14,12 +14,12 @@
 
 #include "bus/CBusSystem.h"
 #include "bus/RawFrame.h"
+#include "hostlink/HostConnection.h"
 #include "logging/LogFile.h"
 #include "logging/LogFileName.h"
 #include "logging/LogWriters.h"
 #include "logging/TextLogFormat.h"
 #include "platform/net/Socket.h"
-#include "service/HostConnection.h"
 
 namespace {
 

@@ -6,7 +6,7 @@
 
 #include "bus/CFlexRay.h"
 #include "bus/CLIN.h"
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 #include "tarvix/TarvixControl.h"
 
 namespace nKV_DLL300 {

@@ -15,10 +15,10 @@
 
 #include "bus/CBusSystem.h"
 #include "host/HostClient.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 #include "logging/SessionLog.h"
-#include "service/HostConnection.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
 #include "tests/support/ServiceFixture.h"
 
 namespace kvtest {

@@ -9,8 +9,8 @@
 #include <sstream>
 
 #include "host/HostMessage.h"
+#include "hostlink/HostConnection.h"
 #include "protocol/Dispatcher.h"
-#include "service/HostConnection.h"
 #include "tests/support/FakeSession.h"
 
 namespace nKV_DLL300 {

@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 #include "tests/protocol/PropertyReplyCheck.h"
 #include "tests/support/ServiceFixture.h"
 

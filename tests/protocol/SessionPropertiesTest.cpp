@@ -6,9 +6,9 @@
 #include <vector>
 
 #include "host/HostClient.h"
+#include "hostlink/HostConnection.h"
 #include "platform/net/Socket.h"
 #include "protocol/Dispatcher.h"
-#include "service/HostConnection.h"
 #include "service/Listener.h"
 #include "tests/protocol/PropertyReplyCheck.h"
 #include "tests/support/FakeSession.h"

@@ -1,8 +1,8 @@
 // The heartbeat rule and sends on a connection without a socket, without any network.
 #include <gtest/gtest.h>
 
-#include "service/HostLink.h"
-#include "service/SendReply.h"
+#include "hostlink/HostLink.h"
+#include "hostlink/SendReply.h"
 #include "tests/support/FakeSession.h"
 
 namespace nKV_DLL300 {

@@ -1,7 +1,7 @@
 // The header's bytes, and which types carry a caller-given payload length.
 #include <gtest/gtest.h>
 
-#include "service/MessageHeader.h"
+#include "hostlink/MessageHeader.h"
 
 namespace nKV_DLL300 {
 namespace {

@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "bus/CBusSystem.h"
 #include "host/HostClient.h"
 #include "host/RecordDecoder.h"
 #include "service/ServiceContext.h"

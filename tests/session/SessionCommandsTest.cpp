@@ -6,7 +6,7 @@
 #include <functional>
 
 #include "driver/Status.h"
-#include "service/HostLink.h"
+#include "hostlink/HostLink.h"
 #include "tarvix/TarvixControl.h"
 #include "tests/session/CanSessionFixture.h"
 

@@ -7,8 +7,6 @@
 #include <sstream>
 #include <thread>
 
-#include "tests/support/FakeDriverSystem.h"
-
 namespace kvtest {
 
 namespace fs = std::filesystem;
@@ -69,16 +67,7 @@ nKV_DLL300::ServiceOptions ServiceFixture::Options() {
   return options;
 }
 
-nKV_DLL300::DriverSystem& ServiceFixture::Driver() {
-#ifdef KV_TEST_WITH_TARVIX
-  return nKV_DLL300::TarvixDriverSystem();
-#else
-  if (!fallbackDriver_) {
-    fallbackDriver_ = std::make_unique<FakeDriverSystem>(FakeDriverSystem::DefaultHardware());
-  }
-  return *fallbackDriver_;
-#endif
-}
+nKV_DLL300::DriverSystem& ServiceFixture::Driver() { return nKV_DLL300::TarvixDriverSystem(); }
 
 void ServiceFixture::StartService(bool requireListening) {
   StopService();

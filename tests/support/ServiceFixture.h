@@ -51,8 +51,7 @@ class ServiceFixture : public ::testing::Test {
 
   // The options of the service StartService makes; the default: delay 0, port "0".
   virtual nKV_DLL300::ServiceOptions Options();
-  // The driver the service uses: the linked driver library when the build has it, else a fake
-  // with the default hardware.
+  // The driver the service uses: the linked driver library.
   virtual nKV_DLL300::DriverSystem& Driver();
 
   // Starts the service and waits until it listens, or with kSetUpOnly until its set-up ended
@@ -81,7 +80,6 @@ class ServiceFixture : public ::testing::Test {
   TemporaryDrive drive_;
 
  private:
-  std::unique_ptr<nKV_DLL300::DriverSystem> fallbackDriver_;
   std::unique_ptr<nKV_DLL300::ServiceContext> service_;
   uint16_t port_ = 0;
 };

@@ -12,7 +12,7 @@
 
 #include "driver/Properties.h"
 #include "driver/Status.h"
-#include "protocol/SessionSettings.h"
+#include "hostlink/SessionSettings.h"
 #include "tarvix/TarvixControl.h"
 #include "transmit/CTransmitFrame.h"
 

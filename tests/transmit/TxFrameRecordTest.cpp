@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "protocol/SessionSettings.h"
+#include "hostlink/SessionSettings.h"
 #include "transmit/CTransmitFrame.h"
 #include "transmit/TransmitDatabaseName.h"
 #include "transmit/TxFrameRecord.h"

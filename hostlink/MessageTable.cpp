@@ -1,5 +1,5 @@
 // The vocabulary of the host protocol: every command and property name with its identifier.
-#include "protocol/MessageTable.h"
+#include "hostlink/MessageTable.h"
 
 namespace nKV_DLL300 {
 

@@ -1,11 +1,11 @@
 // The send procedure: header and payload go out together under the connection's send lock.
-#include "service/SendReply.h"
+#include "hostlink/SendReply.h"
 
 #include <cstring>
 
+#include "hostlink/LinkAccess.h"
+#include "hostlink/MessageHeader.h"
 #include "platform/net/SocketError.h"
-#include "service/LinkAccess.h"
-#include "service/MessageHeader.h"
 #include "timing/Time.h"
 
 namespace nKV_DLL300 {
@@ -28,8 +28,8 @@ uint32_t PayloadLength(const void* payload, uint8_t type, uint32_t length) {
                             : static_cast<uint32_t>(std::strlen(static_cast<const char*>(payload)));
 }
 
-MessageHeaderFields HeaderFor(HostConnection& connection, const CBusSystem* session, uint8_t type,
-                              uint32_t payloadLength, int32_t recordCount) {
+MessageHeaderFields HeaderFor(HostConnection& connection, const LinkedSession* session,
+                              uint8_t type, uint32_t payloadLength, int32_t recordCount) {
   MessageHeaderFields fields;
   fields.sequenceNumber = LinkAccess::sequenceNumber(connection);
   fields.type = type;
@@ -106,7 +106,7 @@ int32_t SendMessageLocked(HostConnection& connection, const net::ConstBuffer (&p
 }
 
 // recordCount: what bytes 12 to 15 show instead of the session's idCount, -1 for idCount.
-void SendMessage(HostConnection& connection, const void* payload, const CBusSystem* session,
+void SendMessage(HostConnection& connection, const void* payload, const LinkedSession* session,
                  uint8_t type, uint32_t length, int32_t recordCount) {
   uint32_t payloadLength = PayloadLength(payload, type, length);
   int32_t result;
@@ -124,12 +124,12 @@ void SendMessage(HostConnection& connection, const void* payload, const CBusSyst
 
 }  // namespace
 
-void SendReply(HostConnection& connection, const void* payload, const CBusSystem* session,
+void SendReply(HostConnection& connection, const void* payload, const LinkedSession* session,
                uint8_t type, uint32_t length) {
   SendMessage(connection, payload, session, type, length, -1);
 }
 
-void SendRecords(HostConnection& connection, const void* payload, const CBusSystem* session,
+void SendRecords(HostConnection& connection, const void* payload, const LinkedSession* session,
                  uint8_t type, uint32_t length, uint16_t recordCount) {
   SendMessage(connection, payload, session, type, length, recordCount);
 }

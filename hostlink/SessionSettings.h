@@ -4,7 +4,7 @@
 #include <atomic>
 #include <cstdint>
 
-#include "protocol/GuardedText.h"
+#include "hostlink/GuardedText.h"
 
 namespace nKV_DLL300 {
 

@@ -1,7 +1,7 @@
 // The host link's private access to a connection's send state (SendReply, HostLink only).
 #pragma once
 
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 
 namespace nKV_DLL300 {
 

@@ -1,9 +1,9 @@
 // Construction of a host connection with its defaults, and its last-resort clean-up.
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 
 #include <utility>
 
-#include "service/HostLink.h"
+#include "hostlink/HostLink.h"
 
 namespace nKV_DLL300 {
 

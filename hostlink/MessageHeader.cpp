@@ -1,5 +1,5 @@
 // Encoding of the message header, byte by byte so the host byte order never matters.
-#include "service/MessageHeader.h"
+#include "hostlink/MessageHeader.h"
 
 namespace nKV_DLL300 {
 

@@ -1,10 +1,10 @@
 // The service thread's side of a connection: one receive, the close, and the heartbeat rule.
-#include "service/HostLink.h"
+#include "hostlink/HostLink.h"
 
+#include "hostlink/LinkAccess.h"
+#include "hostlink/MessageHeader.h"
+#include "hostlink/SendReply.h"
 #include "platform/net/SocketError.h"
-#include "service/LinkAccess.h"
-#include "service/MessageHeader.h"
-#include "service/SendReply.h"
 
 namespace nKV_DLL300 {
 
@@ -59,7 +59,7 @@ void RestartHeartbeat(HostConnection& connection) { connection.heartbeatWatch.Re
 
 void EndSession(HostConnection& connection) {
   if (!connection.session) return;
-  (void)connection.session->stop();
+  (void)connection.session.get_deleter().Stop(connection.session.get());
   connection.session.reset();
 }
 

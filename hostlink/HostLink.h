@@ -4,7 +4,7 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
 
 namespace nKV_DLL300 {
 

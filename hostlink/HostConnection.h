@@ -7,12 +7,12 @@
 #include <mutex>
 #include <vector>
 
-#include "bus/CBusSystem.h"
+#include "hostlink/HardwareRecord.h"
+#include "hostlink/MessageTable.h"
+#include "hostlink/OwnedSession.h"
+#include "hostlink/ServiceStatistics.h"
+#include "hostlink/SessionSettings.h"
 #include "platform/net/Socket.h"
-#include "protocol/HardwareRecord.h"
-#include "protocol/MessageTable.h"
-#include "protocol/SessionSettings.h"
-#include "service/ServiceStatistics.h"
 #include "timing/Stopwatch.h"
 
 namespace nKV_DLL300 {
@@ -42,7 +42,7 @@ class HostConnection {
   uint32_t driverVersion[kDriverVersionCount] = {};  // set at construction, read-only after
   std::atomic<int32_t> lastTcpError{0};              // result of the last send on this connection
   Stopwatch heartbeatWatch;                          // service thread only
-  std::unique_ptr<CBusSystem> session;               // service thread only
+  OwnedSession session;  // service thread only; stopped and deleted as its own class
   std::atomic<bool> closeRequested{false};
   const std::vector<HardwareRecord> hardwareTable;  // own copy, read-only
   const uint16_t hardwareCount;

@@ -3,8 +3,8 @@
 
 #include <cstdint>
 
-#include "bus/CBusSystem.h"
-#include "service/HostConnection.h"
+#include "hostlink/HostConnection.h"
+#include "hostlink/LinkedSession.h"
 
 namespace nKV_DLL300 {
 
@@ -21,16 +21,16 @@ constexpr int32_t kSendFailed = -3;
 // per message, sent or not. A message is either queued whole or dropped whole: when the host
 // does not read, a send waits at most 1 s for room, then fails with -3 and the connection stays.
 // A message the system took only in part is finished before the next one.
-void SendReply(HostConnection& connection, const void* payload, const CBusSystem* session,
+void SendReply(HostConnection& connection, const void* payload, const LinkedSession* session,
                uint8_t type, uint32_t length);
 
 // SendReply of identifier records whose header (bytes 12 to 15) counts the `recordCount` records
 // this message carries: a table too large for one message goes out in several.
-void SendRecords(HostConnection& connection, const void* payload, const CBusSystem* session,
+void SendRecords(HostConnection& connection, const void* payload, const LinkedSession* session,
                  uint8_t type, uint32_t length, uint16_t recordCount);
 
 // SendReply of a NUL-terminated text.
-inline void SendText(HostConnection& connection, const char* text, const CBusSystem* session,
+inline void SendText(HostConnection& connection, const char* text, const LinkedSession* session,
                      uint8_t type) {
   SendReply(connection, text, session, type, 0);
 }
