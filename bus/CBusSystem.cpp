@@ -11,7 +11,7 @@ namespace {
 constexpr uint64_t kPollPeriodMs = 10;
 }  // namespace
 
-CBusSystem::CBusSystem(HostConnection* owner, uint32_t kind) : LinkedSession(owner, kind) {}
+CBusSystem::CBusSystem(HostConnection* owner, driver::BusKind kind) : LinkedSession(owner, kind) {}
 
 CBusSystem::~CBusSystem() { endForDestruction(); }
 

@@ -34,7 +34,7 @@ inline constexpr int32_t kStatusTableNotAllocated = -22;
 // The virtual operations keep this slot order in every bus class.
 class CBusSystem : public LinkedSession {
  public:
-  explicit CBusSystem(HostConnection* owner, uint32_t kind = kBusTypeNone);
+  explicit CBusSystem(HostConnection* owner, driver::BusKind kind = driver::BusKind::kNone);
   CBusSystem(const CBusSystem&) = delete;
   CBusSystem& operator=(const CBusSystem&) = delete;
 

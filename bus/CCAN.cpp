@@ -15,7 +15,7 @@ constexpr uint32_t kClassicFrameBytes = 24;
 }  // namespace
 
 CCAN::CCAN(HostConnection* owner)
-    : CTableSession(owner, kBusTypeCan, ReadPacing::kNearlyFullRule) {}
+    : CTableSession(owner, driver::BusKind::kCan, ReadPacing::kNearlyFullRule) {}
 
 CCAN::~CCAN() { endForDestruction(); }
 
@@ -39,14 +39,14 @@ void CCAN::prepareLoop() {
 
 uint32_t CCAN::batchFrameCount(uint32_t bytes) const {
   if (classicFrames) return bytes / kClassicFrameBytes;
-  RawFrameWalker walker(readBuffer, bytes);
-  RawFrameView frame;
+  driver::RawFrameWalker walker(readBuffer, bytes);
+  driver::RawFrameView frame;
   uint32_t frames = 0;
   while (walker.next(frame)) ++frames;
   return frames;
 }
 
-void CCAN::countFrame(const RawFrameView& frame, bool inWindow) {
+void CCAN::countFrame(const driver::RawFrameView& frame, bool inWindow) {
   nKV_DLL300::countFrame(statistics, frameTimes, frame.header, inWindow);
 }
 

@@ -54,7 +54,7 @@ class CCAN : public CTableSession<CanIdentifierRules, CanBusStatistics, kCanRead
   // Builds the frame-time tables for the bus load of this loop.
   void prepareLoop() override;
   uint32_t batchFrameCount(uint32_t bytes) const override;
-  void countFrame(const RawFrameView& frame, bool inWindow) override;
+  void countFrame(const driver::RawFrameView& frame, bool inWindow) override;
 
  private:
   int32_t openSubordinate(const std::string& interfaceName);

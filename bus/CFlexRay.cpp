@@ -24,7 +24,7 @@ int32_t SetProperty(uint32_t reference, uint32_t id, T value) {
 }  // namespace
 
 CFlexRay::CFlexRay(HostConnection* owner)
-    : CTableSession(owner, kBusTypeFlexRay, ReadPacing::kNearlyFullRule) {}
+    : CTableSession(owner, driver::BusKind::kFlexRay, ReadPacing::kNearlyFullRule) {}
 
 CFlexRay::~CFlexRay() { endForDestruction(); }
 
@@ -86,14 +86,14 @@ const char* CFlexRay::logHeaderLine() const {
 }
 
 uint32_t CFlexRay::batchFrameCount(uint32_t bytes) const {
-  RawFrameWalker walker(readBuffer, bytes);
-  RawFrameView frame;
+  driver::RawFrameWalker walker(readBuffer, bytes);
+  driver::RawFrameView frame;
   uint32_t frames = 0;
   while (walker.next(frame)) ++frames;
   return frames;
 }
 
-void CFlexRay::countFrame(const RawFrameView& frame, bool inWindow) {
+void CFlexRay::countFrame(const driver::RawFrameView& frame, bool inWindow) {
   nKV_DLL300::countFrame(statistics, frame.header.type, inWindow);
 }
 

@@ -41,7 +41,7 @@ class CFlexRay
   const char* logHeaderLine() const override;
   // Frames are of variable length: the batch is walked.
   uint32_t batchFrameCount(uint32_t bytes) const override;
-  void countFrame(const RawFrameView& frame, bool inWindow) override;
+  void countFrame(const driver::RawFrameView& frame, bool inWindow) override;
 
  private:
   int32_t openDatabase(const std::string& interfaceName, uint32_t termination);

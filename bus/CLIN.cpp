@@ -25,7 +25,8 @@ int32_t SetProperty(uint32_t reference, uint32_t id, T value) {
 
 }  // namespace
 
-CLIN::CLIN(HostConnection* owner) : CTableSession(owner, kBusTypeLin, ReadPacing::kAlwaysSleep) {}
+CLIN::CLIN(HostConnection* owner)
+    : CTableSession(owner, driver::BusKind::kLin, ReadPacing::kAlwaysSleep) {}
 
 CLIN::~CLIN() { endForDestruction(); }
 
@@ -112,7 +113,7 @@ const char* CLIN::logHeaderLine() const {
 
 uint32_t CLIN::batchFrameCount(uint32_t bytes) const { return bytes / kLinFrameBytes; }
 
-void CLIN::countFrame(const RawFrameView& frame, bool inWindow) {
+void CLIN::countFrame(const driver::RawFrameView& frame, bool inWindow) {
   nKV_DLL300::countFrame(statistics, frame.header.type, inWindow);
 }
 

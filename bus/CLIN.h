@@ -38,7 +38,7 @@ class CLIN : public CTableSession<LinIdentifierRules, LinBusStatistics, kLinRead
   const char* logHeaderLine() const override;
   // Every LIN frame takes 24 bytes.
   uint32_t batchFrameCount(uint32_t bytes) const override;
-  void countFrame(const RawFrameView& frame, bool inWindow) override;
+  void countFrame(const driver::RawFrameView& frame, bool inWindow) override;
 
  private:
   int32_t openSubordinate(const std::string& interfaceName);

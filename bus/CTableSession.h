@@ -8,7 +8,7 @@
 
 #include "bus/CBusSystem.h"
 #include "bus/IdentifierTable.h"
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 #include "driver/tarvix.h"
 #include "hostlink/HostConnection.h"
 #include "hostlink/MessageHeader.h"
@@ -54,7 +54,7 @@ class CTableSession : public CBusSystem {
   }
 
  protected:
-  CTableSession(HostConnection* owner, uint32_t kind, ReadPacing pacing)
+  CTableSession(HostConnection* owner, driver::BusKind kind, ReadPacing pacing)
       : CBusSystem(owner, kind), pacing_(pacing) {}
 
   // Bus-specific steps of the loop (called in the poll thread).
@@ -66,10 +66,10 @@ class CTableSession : public CBusSystem {
   // Hands a batch to the bus's log writer while logFileEnabled is set.
   virtual void logBatch(const uint8_t* batch, uint32_t bytes, uint32_t frames) {
     switch (busType) {
-      case kBusTypeLin:
+      case driver::BusKind::kLin:
         WriteLinLog(sessionLog, batch, bytes, frames);
         break;
-      case kBusTypeFlexRay:
+      case driver::BusKind::kFlexRay:
         WriteFlexRayLog(sessionLog, batch, bytes, frames);
         break;
       default:
@@ -78,7 +78,7 @@ class CTableSession : public CBusSystem {
     }
   }
   // A frame taken into the table while txTimeStatistic > 0.
-  virtual void countFrame(const RawFrameView& frame, bool inWindow) = 0;
+  virtual void countFrame(const driver::RawFrameView& frame, bool inWindow) = 0;
 
   // reportBusState, step 1: a new statistics period starts now.
   void beginReport() { stateWatch.Restart(); }
@@ -156,10 +156,11 @@ class CTableSession : public CBusSystem {
     const uint32_t statisticPeriod = settings.txTimeStatistic.load();
     // A batch is read at one moment, so the window is looked at once per batch.
     const bool inWindow = windowWatch.ElapsedMilliseconds() < statisticPeriod;
-    const int32_t status =
-        table->updateIdentifierTable(readBuffer, bytes, rules, [&](const RawFrameView& frame) {
-          if (statisticPeriod > 0) countFrame(frame, inWindow);
-        });
+    const int32_t status = table->updateIdentifierTable(readBuffer, bytes, rules,
+                                                        [&](const driver::RawFrameView& frame) {
+                                                          if (statisticPeriod > 0)
+                                                            countFrame(frame, inWindow);
+                                                        });
     recordStatus(status);
     idCount.store(table->idCount());
   }

@@ -5,7 +5,7 @@
 #include <cstdint>
 
 #include "bus/IdentifierEntry.h"
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
@@ -23,21 +23,25 @@ struct CanIdentifierRules {
   static constexpr int kKeyBits = 40;
   struct KeyState {};  // the key depends on the frame alone
 
-  static uint64_t key(const RawFrameView& frame, KeyState&) {
+  static uint64_t key(const driver::RawFrameView& frame, KeyState&) {
     return (uint64_t{frame.header.identifier} << 8) | frame.header.type;
   }
   static uint64_t entryKey(const Entry& e) { return (uint64_t{e.identifier} << 8) | e.type; }
-  static uint32_t payloadLength(const RawFrameView& frame) {
+  static uint32_t payloadLength(const driver::RawFrameView& frame) {
     return std::min(frame.payloadLength, kMaxPayload);
   }
-  static uint8_t echo(const RawFrameView& frame) { return frame.header.flags & kFrameFlagEcho; }
+  static uint8_t echo(const driver::RawFrameView& frame) {
+    return frame.header.flags & driver::kFlagEcho;
+  }
 
-  static void fill(Entry& e, const RawFrameView& frame, uint64_t) {
+  static void fill(Entry& e, const driver::RawFrameView& frame, uint64_t) {
     e.identifier = frame.header.identifier;
     e.type = frame.header.type;
     e.echo = echo(frame);
   }
-  static void refresh(Entry& e, const RawFrameView& frame, uint64_t) { e.echo = echo(frame); }
+  static void refresh(Entry& e, const driver::RawFrameView& frame, uint64_t) {
+    e.echo = echo(frame);
+  }
 };
 
 }  // namespace nKV_DLL300

@@ -15,7 +15,7 @@ void Count(uint32_t& total, uint32_t& perSecond, bool inWindow) {
 }
 }  // namespace
 
-void countFrame(CanBusStatistics& s, CanFrameTimes& times, const RawFrameHeader& frame,
+void countFrame(CanBusStatistics& s, CanFrameTimes& times, const driver::RawFrameHeader& frame,
                 bool inWindow) {
   switch (frame.type) {
     case kTypeRemote:
@@ -24,7 +24,7 @@ void countFrame(CanBusStatistics& s, CanFrameTimes& times, const RawFrameHeader&
     case kTypeBusError:
       Count(s.errorFrames, s.errorFramesPerSecond, inWindow);
       return;
-    case kFrameTypeJ1939:
+    case driver::kFrameJ1939:
       return;
     default:
       break;

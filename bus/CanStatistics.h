@@ -5,7 +5,7 @@
 
 #include "bus/BusStatistics.h"
 #include "bus/CanFrameTimes.h"
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
@@ -16,8 +16,8 @@ inline constexpr uint32_t kCanStateId = 0x00130010;  // 4-byte state word
 // J1939 frames (0xC0) count nowhere, every other type is a standard or extended data frame whose
 // durations go into the bus time. inWindow: the statistics window is still open, so the frame also
 // counts into the PerSecond field.
-void countFrame(CanBusStatistics& statistics, CanFrameTimes& times, const RawFrameHeader& frame,
-                bool inWindow);
+void countFrame(CanBusStatistics& statistics, CanFrameTimes& times,
+                const driver::RawFrameHeader& frame, bool inWindow);
 
 // Before a send, over the elapsed milliseconds since the last one: busLoad (and peakBusLoad when it
 // is exceeded) from the bus time, and the four window counts turned into frames per second.

@@ -5,7 +5,7 @@
 #include <cstdint>
 
 #include "bus/IdentifierEntry.h"
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
@@ -30,7 +30,7 @@ struct FlexRayIdentifierRules {
     uint8_t previousChannel = 0;
   };
 
-  static uint64_t key(const RawFrameView& frame, KeyState& state) {
+  static uint64_t key(const driver::RawFrameView& frame, KeyState& state) {
     const uint8_t flags = frame.header.flags;
     if (flags & kFlagChannelA) {
       state.previousChannel = 0;
@@ -40,19 +40,19 @@ struct FlexRayIdentifierRules {
     return (uint64_t{frame.header.identifier} << 1) | state.previousChannel;
   }
   static uint64_t entryKey(const Entry& e) { return (uint64_t{e.identifier} << 1) | e.channel; }
-  static uint32_t payloadLength(const RawFrameView& frame) {
+  static uint32_t payloadLength(const driver::RawFrameView& frame) {
     return std::min(frame.payloadLength, kMaxPayload);
   }
 
-  static void fill(Entry& e, const RawFrameView& frame, uint64_t key) {
+  static void fill(Entry& e, const driver::RawFrameView& frame, uint64_t key) {
     e.identifier = frame.header.identifier;
     e.type = frame.header.type;
     refresh(e, frame, key);
   }
 
-  static void refresh(Entry& e, const RawFrameView& frame, uint64_t key) {
+  static void refresh(Entry& e, const driver::RawFrameView& frame, uint64_t key) {
     const uint8_t flags = frame.header.flags;
-    e.echo = flags & kFrameFlagEcho;
+    e.echo = flags & driver::kFlagEcho;
     e.startup = flags & 0x01;
     e.sync = (flags >> 1) & 0x01;
     e.preamble = (flags >> 2) & 0x01;

@@ -14,7 +14,7 @@
 #include "bus/IdentifierIndex.h"
 #include "bus/LinIdentifierRules.h"
 #include "bus/PayloadCopies.h"
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
@@ -43,7 +43,8 @@ struct TableSettings {
 //   auto table = CanIdentifierTable::Create(settings.dataLogIdsMax, tableResource);
 //   if (!table) { recordStatus(kStatusPayloadNotStored); idle until stopped; }
 //   per batch:  recordStatus(table->updateIdentifierTable(buffer, bytesRead, {logTx, logErr},
-//                   [&](const RawFrameView& f) { if (txTimeStatistic > 0) countFrame(...); }));
+//                   [&](const driver::RawFrameView& f) { if (txTimeStatistic > 0) countFrame(...);
+//                   }));
 //               idCount = table->idCount();
 //   per period: bool reset = resetRequested.exchange(false);  if (reset) statistics = {};
 //               table->sendIdentifierRecords(reset, sendThroughSendReply); idCount = ...;
@@ -77,15 +78,15 @@ class IdentifierTable {
   // Entry i in the order first seen (0 <= i < idCount).
   const Entry& entry(uint32_t i) const { return entries_[i]; }
 
-  // Folds a batch of `bytes` bytes into the table. onTaken(const RawFrameView&) is called for every
-  // frame that was counted into an entry (the bus statistics count those). Returns 0, or
+  // Folds a batch of `bytes` bytes into the table. onTaken(const driver::RawFrameView&) is called
+  // for every frame that was counted into an entry (the bus statistics count those). Returns 0, or
   // kStatusPayloadNotStored when a payload copy could not be stored: that entry then holds no
   // payload (payloadLength 0) until a later frame's copy succeeds.
   template <class OnTaken>
   int32_t updateIdentifierTable(const void* batch, uint32_t bytes, const TableSettings& settings,
                                 OnTaken&& onTaken) {
-    RawFrameWalker walker(batch, bytes);
-    RawFrameView frame;
+    driver::RawFrameWalker walker(batch, bytes);
+    driver::RawFrameView frame;
     typename Rules::KeyState keyState;
     int32_t status = 0;
     while (walker.next(frame)) {
@@ -94,13 +95,13 @@ class IdentifierTable {
       const uint64_t key = Rules::key(frame, keyState);
       if (skipped(frame, settings)) continue;
       if (!take(frame, key, status)) continue;
-      onTaken(static_cast<const RawFrameView&>(frame));
+      onTaken(static_cast<const driver::RawFrameView&>(frame));
     }
     return status;
   }
 
   int32_t updateIdentifierTable(const void* batch, uint32_t bytes, const TableSettings& settings) {
-    return updateIdentifierTable(batch, bytes, settings, [](const RawFrameView&) {});
+    return updateIdentifierTable(batch, bytes, settings, [](const driver::RawFrameView&) {});
   }
 
   // Empties the table: idCount 0, every entry zero. Payload storage is kept for the entries that
@@ -163,14 +164,14 @@ class IdentifierTable {
     }
   }
 
-  static bool skipped(const RawFrameView& frame, const TableSettings& settings) {
-    if ((frame.header.flags & kFrameFlagEcho) && settings.logTransmittedFrames == 0) return true;
+  static bool skipped(const driver::RawFrameView& frame, const TableSettings& settings) {
+    if ((frame.header.flags & driver::kFlagEcho) && settings.logTransmittedFrames == 0) return true;
     return Rules::kFiltersBusErrors && settings.logBusErrorFrames == 0 &&
            frame.header.type == Rules::kBusErrorType;
   }
 
   // Counts the frame into its entry, making the entry if there is room. False: frame skipped.
-  bool take(const RawFrameView& frame, uint64_t key, int32_t& status) {
+  bool take(const driver::RawFrameView& frame, uint64_t key, int32_t& status) {
     const uint32_t slot = index_.probe(key);
     uint32_t i = index_.entryAt(slot);
     const uint64_t timestamp = frame.header.timestamp;
@@ -193,7 +194,7 @@ class IdentifierTable {
     return true;
   }
 
-  void storePayload(uint32_t i, const RawFrameView& frame, int32_t& status) {
+  void storePayload(uint32_t i, const driver::RawFrameView& frame, int32_t& status) {
     Entry& e = entries_[i];
     const uint32_t length = Rules::payloadLength(frame);
     if (length > 0 && payloads_.store(i, frame.payload, length)) {

@@ -6,7 +6,7 @@
 #include <cstring>
 
 #include "bus/IdentifierEntry.h"
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
@@ -24,17 +24,19 @@ struct LinIdentifierRules {
   static constexpr int kKeyBits = 32;
   struct KeyState {};
 
-  static uint64_t key(const RawFrameView& frame, KeyState&) { return frame.header.identifier; }
+  static uint64_t key(const driver::RawFrameView& frame, KeyState&) {
+    return frame.header.identifier;
+  }
   static uint64_t entryKey(const Entry& e) { return e.identifier; }
 
-  static void fill(Entry& e, const RawFrameView& frame, uint64_t) {
+  static void fill(Entry& e, const driver::RawFrameView& frame, uint64_t) {
     e.identifier = frame.header.identifier;
     e.payloadLength = payloadLength(frame);
     std::memcpy(e.payload, frame.payload, e.payloadLength);
     takeLastFrame(e, frame);
   }
 
-  static void refresh(Entry& e, const RawFrameView& frame, uint64_t) {
+  static void refresh(Entry& e, const driver::RawFrameView& frame, uint64_t) {
     const uint8_t length = payloadLength(frame);
     if (e.payloadLength != length) {
       e.payloadLength = length;
@@ -46,12 +48,12 @@ struct LinIdentifierRules {
 
  private:
   // A driver frame claiming more than 8 bytes keeps its first 8: the entry holds no more.
-  static uint8_t payloadLength(const RawFrameView& frame) {
+  static uint8_t payloadLength(const driver::RawFrameView& frame) {
     return static_cast<uint8_t>(std::min(frame.payloadLength, kMaxPayload));
   }
-  static void takeLastFrame(Entry& e, const RawFrameView& frame) {
+  static void takeLastFrame(Entry& e, const driver::RawFrameView& frame) {
     e.type = frame.header.type;
-    e.echo = frame.header.flags & kFrameFlagEcho;
+    e.echo = frame.header.flags & driver::kFlagEcho;
     e.flag = frame.header.flags & 0x01;
     e.checksum[0] = frame.header.info;
     e.checksum[1] = e.checksum[2] = e.checksum[3] = 0;

@@ -1,4 +1,4 @@
-// Frame type codes and flag bits of the driver's raw frames.
+// Frame type codes and flag bits of the driver's raw frames (driver/RawFrame.h).
 #pragma once
 
 #include <cstdint>
@@ -36,9 +36,7 @@ inline constexpr uint32_t kExtendedIdFlag = 0x20000000;
 inline constexpr uint32_t kStandardIdMask = 0x7FF;
 inline constexpr uint32_t kExtendedIdMask = 0x1FFFFFFF;
 
-// Raw frame sizes: 16-byte header, payload padded to a multiple of 8 (at least 8).
-inline constexpr uint32_t kRawHeaderSize = 16;
-inline constexpr uint32_t kLinRawFrameSize = 24;
+// Payload limits (the raw frame layout itself is driver/RawFrame.h).
 inline constexpr uint32_t kMaxCanFdPayload = 64;
 inline constexpr uint32_t kMaxJ1939Payload = 2047;
 

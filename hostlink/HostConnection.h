@@ -7,6 +7,7 @@
 #include <mutex>
 #include <vector>
 
+#include "driver/BusKind.h"
 #include "hostlink/HardwareRecord.h"
 #include "hostlink/MessageTable.h"
 #include "hostlink/OwnedSession.h"
@@ -38,7 +39,7 @@ class HostConnection {
   SessionSettings settings;  // see SessionSettings for its guards
   const MessageTable commandTable;
   const MessageTable propertyTable;
-  std::atomic<uint32_t> busType{0};                  // 0 none, 1 CAN, 2 LIN, 3 FlexRay
+  std::atomic<driver::BusKind> busType{driver::BusKind::kNone};
   uint32_t driverVersion[kDriverVersionCount] = {};  // set at construction, read-only after
   std::atomic<int32_t> lastTcpError{0};              // result of the last send on this connection
   Stopwatch heartbeatWatch;                          // service thread only

@@ -5,28 +5,24 @@
 #include <atomic>
 #include <cstdint>
 
+#include "driver/BusKind.h"
+
 namespace nKV_DLL300 {
 
 class HostConnection;
-
-// Bus kinds, as the connection's busType numbers them.
-inline constexpr uint32_t kBusTypeNone = 0;
-inline constexpr uint32_t kBusTypeCan = 1;
-inline constexpr uint32_t kBusTypeLin = 2;
-inline constexpr uint32_t kBusTypeFlexRay = 3;
 
 // The base of every bus session (CBusSystem derives from it). It holds no virtual operation, so
 // the slot order of the bus classes is theirs alone. Thread rules are CBusSystem's.
 class LinkedSession {
  public:
-  LinkedSession(HostConnection* owner, uint32_t kind) : busType(kind), connection(owner) {}
+  LinkedSession(HostConnection* owner, driver::BusKind kind) : busType(kind), connection(owner) {}
   LinkedSession(const LinkedSession&) = delete;
   LinkedSession& operator=(const LinkedSession&) = delete;
 
-  // The bus this session was created for (kBusTypeCan ...). It stays what it was even when the
+  // The bus this session was created for. It stays what it was even when the
   // host names another bus with SET_PROP_SESSION_PORTNAME while the session runs: bus-specific
   // commands and texts follow this kind, not the connection's busType.
-  const uint32_t busType;
+  const driver::BusKind busType;
 
   // Used entries of the identifier table: written by the poll thread, read by SendReply anywhere.
   std::atomic<uint16_t> idCount{0};

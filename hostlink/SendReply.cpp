@@ -34,8 +34,7 @@ MessageHeaderFields HeaderFor(HostConnection& connection, const LinkedSession* s
   fields.sequenceNumber = LinkAccess::sequenceNumber(connection);
   fields.type = type;
   fields.payloadLength = payloadLength;
-  uint32_t busType = connection.busType.load();
-  if (session != nullptr && busType >= 1 && busType <= 3) {
+  if (session != nullptr && connection.busType.load() != driver::BusKind::kNone) {
     fields.idCount =
         recordCount >= 0 ? static_cast<uint32_t>(recordCount) : session->idCount.load();
     fields.lastStatus = session->lastStatus.load();

@@ -15,7 +15,7 @@ constexpr int32_t kSendFailed = -3;
 // For binary types (0, 1, 2, 6, 7) the payload length is `length` when it is not 0; for every
 // other type, and for length 0, it is the length of the NUL-terminated text `payload` (the NUL
 // is not sent). A null payload sends the header alone. Header bytes 12 to 19 carry `session`'s
-// values when it is given and the connection's busType is 1 to 3.
+// values when it is given and the connection has a bus type.
 //
 // Any thread. Messages of one connection never interleave and the sequence number rises by one
 // per message, sent or not. A message is either queued whole or dropped whole: when the host

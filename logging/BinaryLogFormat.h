@@ -2,7 +2,8 @@
 //
 // A binary log is the file header followed by frame records, nothing else: no index, no trailer, no
 // record count, and nothing names the bus. A record is the frame exactly as the driver delivered it
-// (RawFrameHeader, then payload bytes), cut or padded to the record size of its bus:
+// (driver::RawFrameHeader of driver/RawFrame.h, then payload bytes), cut or padded to the record
+// size of its bus:
 //
 //   LIN                                          24 bytes, always
 //   CAN, canIoMode 0 and applicationProtocol 0   24 bytes, always (classic frames, 8 payload bytes)
@@ -22,7 +23,7 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
@@ -43,12 +44,6 @@ inline constexpr std::array<uint8_t, kBinaryLogFileHeaderSize> kBinaryLogFileHea
 // True when `size` bytes at `data` begin with the file header's magic characters.
 bool HasBinaryLogMagic(const uint8_t* data, size_t size);
 
-// The record head is the driver's frame head, byte for byte.
-static_assert(sizeof(RawFrameHeader) == 16);
-static_assert(offsetof(RawFrameHeader, timestamp) == 0);
-static_assert(offsetof(RawFrameHeader, flags) == 13);
-static_assert(offsetof(RawFrameHeader, info) == 14);
-
 // How the records of one log are sized (table above).
 enum class BinaryRecordLayout : uint8_t {
   kFixed24,          // LIN, classic CAN
@@ -66,23 +61,26 @@ constexpr BinaryRecordLayout CanBinaryRecordLayout(uint32_t canIoMode,
 }
 
 // Bytes of the record of a frame with this head.
-constexpr uint32_t BinaryRecordSize(BinaryRecordLayout layout, const RawFrameHeader& h) {
-  const auto rounded = [](uint32_t length) { return kRawFrameHeaderSize + ((length + 7u) & ~7u); };
+constexpr uint32_t BinaryRecordSize(BinaryRecordLayout layout, const driver::RawFrameHeader& h) {
+  const auto rounded = [](uint32_t length) {
+    return driver::kRawFrameHeaderSize + ((length + 7u) & ~7u);
+  };
   switch (layout) {
     case BinaryRecordLayout::kFixed24:
       return kFixedRecordSize;
     case BinaryRecordLayout::kCanVariable:
-      return rounded(RawPayloadLength(h));
+      return rounded(driver::RawPayloadLength(h));
     case BinaryRecordLayout::kFlexRayVariable:
       return rounded(h.length);
   }
   return kFixedRecordSize;
 }
 
-// Copies the record of `frame` (a view into a read batch, as RawFrameWalker yields it) into `out`
-// and returns its size; returns 0 and writes nothing when `cap` is too small. The record never
-// reaches past the frame's padded payload area, which the walker has checked lies in the batch.
-size_t CopyBinaryRecord(uint8_t* out, size_t cap, const RawFrameView& frame,
+// Copies the record of `frame` (a view into a read batch, as driver::RawFrameWalker yields it) into
+// `out` and returns its size; returns 0 and writes nothing when `cap` is too small. The record
+// never reaches past the frame's padded payload area, which the walker has checked lies in the
+// batch.
+size_t CopyBinaryRecord(uint8_t* out, size_t cap, const driver::RawFrameView& frame,
                         BinaryRecordLayout layout);
 
 }  // namespace nKV_DLL300

@@ -7,44 +7,47 @@
 namespace nKV_DLL300 {
 namespace {
 
-bool IsTypeOfBus(uint8_t type, RecordBus bus) {
+bool IsTypeOfBus(uint8_t type, driver::BusKind bus) {
   switch (bus) {
-    case RecordBus::kCan:
+    case driver::BusKind::kCan:
       return type == 0x00 || type == 0x01 || type == 0x02 || type == 0x10 || type == 0x18 ||
-             type == kFrameTypeJ1939;
-    case RecordBus::kLin:
+             type == driver::kFrameJ1939;
+    case driver::BusKind::kLin:
       return type == 0x40 || type == 0x41 || type == 0x42;
-    case RecordBus::kFlexRay:
+    case driver::BusKind::kFlexRay:
       return type == 0x20 || type == 0x21;
+    case driver::BusKind::kNone:
+      break;
   }
   return false;
 }
 
 }  // namespace
 
-bool BinaryRecordReader::next(RawFrameView& out) {
-  if (size_ - offset_ < kRawFrameHeaderSize) return false;
-  std::memcpy(&out.header, data_ + offset_, kRawFrameHeaderSize);
+bool BinaryRecordReader::next(driver::RawFrameView& out) {
+  if (size_ - offset_ < driver::kRawFrameHeaderSize) return false;
+  std::memcpy(&out.header, data_ + offset_, driver::kRawFrameHeaderSize);
   const uint32_t recordSize = BinaryRecordSize(layout_, out.header);
   if (recordSize > size_ - offset_) return false;
-  const uint32_t held = recordSize - kRawFrameHeaderSize;
+  const uint32_t held = recordSize - driver::kRawFrameHeaderSize;
   const uint32_t stated = layout_ == BinaryRecordLayout::kFlexRayVariable
                               ? out.header.length
-                              : RawPayloadLength(out.header);
-  out.payload = data_ + offset_ + kRawFrameHeaderSize;
+                              : driver::RawPayloadLength(out.header);
+  out.payload = data_ + offset_ + driver::kRawFrameHeaderSize;
   out.payloadLength = std::min(stated, held);
   offset_ += recordSize;
   return true;
 }
 
 bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayout layout,
-                          RecordBus bus) {
+                          driver::BusKind bus) {
   BinaryRecordReader reader(records, size, layout);
-  RawFrameView frame;
+  driver::RawFrameView frame;
   uint64_t lastTimestamp = 0;
   while (reader.next(frame)) {
     if (!IsTypeOfBus(frame.header.type, bus)) return false;
-    if (frame.payloadLength < RawPayloadLength(frame.header) && bus != RecordBus::kFlexRay)
+    if (frame.payloadLength < driver::RawPayloadLength(frame.header) &&
+        bus != driver::BusKind::kFlexRay)
       return false;
     if (frame.header.timestamp < lastTimestamp) return false;
     lastTimestamp = frame.header.timestamp;
@@ -53,7 +56,7 @@ bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayou
 }
 
 BinaryRecordLayout DetectCanRecordLayout(const uint8_t* records, size_t size) {
-  return RecordsAreConsistent(records, size, BinaryRecordLayout::kFixed24, RecordBus::kCan)
+  return RecordsAreConsistent(records, size, BinaryRecordLayout::kFixed24, driver::BusKind::kCan)
              ? BinaryRecordLayout::kFixed24
              : BinaryRecordLayout::kCanVariable;
 }

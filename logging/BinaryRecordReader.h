@@ -4,7 +4,8 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "bus/RawFrame.h"
+#include "driver/BusKind.h"
+#include "driver/RawFrame.h"
 #include "logging/BinaryLogFormat.h"
 
 namespace nKV_DLL300 {
@@ -19,7 +20,7 @@ class BinaryRecordReader {
 
   // The next record as a frame view. Its payloadLength is the length the head states, bounded by
   // the payload bytes the record holds (a 24-byte record holds 8).
-  bool next(RawFrameView& out);
+  bool next(driver::RawFrameView& out);
 
   size_t offset() const { return offset_; }
   size_t remaining() const { return size_ - offset_; }
@@ -34,9 +35,8 @@ class BinaryRecordReader {
 // Checks that every record of `size` bytes parses in `layout`, ends exactly at the end, has a type
 // of `bus` and a payload the layout can hold, with time stamps that never go back. Used to tell
 // apart the two CAN layouts of a log whose writer settings are unknown.
-enum class RecordBus : uint8_t { kCan, kLin, kFlexRay };
 bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayout layout,
-                          RecordBus bus);
+                          driver::BusKind bus);
 
 // The CAN layout that reads `size` bytes of records consistently: fixed 24-byte records when they
 // do, else the variable layout.

@@ -3,14 +3,14 @@
 
 #include <cstdint>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
 // A frame this interface transmitted itself (flags 0x80, an echo) is logged only when the session's
 // logTransmittedFrames setting is non-zero; every other frame is always logged.
-constexpr bool IsFrameLogged(const RawFrameHeader& h, uint8_t logTransmittedFrames) {
-  return (h.flags & kFrameFlagEcho) == 0 || logTransmittedFrames != 0;
+constexpr bool IsFrameLogged(const driver::RawFrameHeader& h, uint8_t logTransmittedFrames) {
+  return (h.flags & driver::kFlagEcho) == 0 || logTransmittedFrames != 0;
 }
 
 }  // namespace nKV_DLL300

@@ -1,7 +1,7 @@
 // The per-bus writers: frame selection over a batch, then text lines or binary records.
 #include "logging/LogWriters.h"
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 #include "hostlink/HostConnection.h"
 #include "hostlink/LinkedSession.h"
 #include "logging/BinaryLogFormat.h"
@@ -13,8 +13,6 @@
 namespace nKV_DLL300 {
 
 namespace {
-
-enum class LogBus : uint8_t { kCan, kLin, kFlexRay };
 
 // Settings a batch is written with; a batch is read at one moment, so they are read once for it.
 struct BatchSettings {
@@ -32,63 +30,68 @@ BatchSettings ReadBatchSettings(const SessionLog& log) {
 template <class Write>
 void ForEachLoggedFrame(const uint8_t* batch, uint32_t bytes, uint32_t frames,
                         uint8_t logTransmitted, Write&& write) {
-  RawFrameWalker walker(batch, bytes);
-  RawFrameView frame;
+  driver::RawFrameWalker walker(batch, bytes);
+  driver::RawFrameView frame;
   for (uint32_t i = 0; i < frames && walker.next(frame); ++i) {
     if (IsFrameLogged(frame.header, logTransmitted)) write(frame);
   }
 }
 
-size_t FormatLine(LogBus bus, char* out, const RawFrameView& frame, uint8_t logChecksum) {
+size_t FormatLine(driver::BusKind bus, char* out, const driver::RawFrameView& frame,
+                  uint8_t logChecksum) {
   switch (bus) {
-    case LogBus::kCan:
+    case driver::BusKind::kCan:
       return FormatCanTextLine(out, SessionLog::kLineBufferSize, frame);
-    case LogBus::kLin:
+    case driver::BusKind::kLin:
       return FormatLinTextLine(out, SessionLog::kLineBufferSize, frame, logChecksum);
-    case LogBus::kFlexRay:
+    case driver::BusKind::kFlexRay:
       return FormatFlexRayTextLine(out, SessionLog::kLineBufferSize, frame);
+    case driver::BusKind::kNone:
+      break;
   }
   return 0;
 }
 
-void WriteTextLines(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes,
+void WriteTextLines(SessionLog& log, driver::BusKind bus, const uint8_t* batch, uint32_t bytes,
                     uint32_t frames) {
   const BatchSettings settings = ReadBatchSettings(log);
   char* line = log.lineBuffer();
   ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames,
-                     [&](const RawFrameView& frame) {
+                     [&](const driver::RawFrameView& frame) {
                        const size_t length = FormatLine(bus, line, frame, settings.logChecksum);
                        if (!log.write(line, length)) log.fail(kLogWriteIncomplete);
                      });
 }
 
-BinaryRecordLayout RecordLayout(const SessionLog& log, LogBus bus) {
+BinaryRecordLayout RecordLayout(const SessionLog& log, driver::BusKind bus) {
   switch (bus) {
-    case LogBus::kCan:
+    case driver::BusKind::kCan:
       return log.canLayout();
-    case LogBus::kLin:
+    case driver::BusKind::kLin:
       return BinaryRecordLayout::kFixed24;
-    case LogBus::kFlexRay:
+    case driver::BusKind::kFlexRay:
       return BinaryRecordLayout::kFlexRayVariable;
+    case driver::BusKind::kNone:
+      break;
   }
   return BinaryRecordLayout::kFixed24;
 }
 
 // A record is the frame's first bytes in the read buffer, never more than the frame occupies
 // there, so it is written straight from the batch.
-void WriteRecords(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes,
+void WriteRecords(SessionLog& log, driver::BusKind bus, const uint8_t* batch, uint32_t bytes,
                   uint32_t frames) {
   const BatchSettings settings = ReadBatchSettings(log);
   const BinaryRecordLayout layout = RecordLayout(log, bus);
   ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames,
-                     [&](const RawFrameView& frame) {
-                       const uint8_t* record = frame.payload - kRawFrameHeaderSize;
+                     [&](const driver::RawFrameView& frame) {
+                       const uint8_t* record = frame.payload - driver::kRawFrameHeaderSize;
                        if (!log.write(record, BinaryRecordSize(layout, frame.header)))
                          log.fail(kLogWriteIncomplete);
                      });
 }
 
-void WriteBatch(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t bytes,
+void WriteBatch(SessionLog& log, driver::BusKind bus, const uint8_t* batch, uint32_t bytes,
                 uint32_t frames) {
   if (bytes == 0 || frames == 0) return;
   switch (log.openedType()) {
@@ -109,15 +112,15 @@ void WriteBatch(SessionLog& log, LogBus bus, const uint8_t* batch, uint32_t byte
 }  // namespace
 
 void WriteCanLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
-  WriteBatch(log, LogBus::kCan, batch, bytes, frames);
+  WriteBatch(log, driver::BusKind::kCan, batch, bytes, frames);
 }
 
 void WriteLinLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
-  WriteBatch(log, LogBus::kLin, batch, bytes, frames);
+  WriteBatch(log, driver::BusKind::kLin, batch, bytes, frames);
 }
 
 void WriteFlexRayLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames) {
-  WriteBatch(log, LogBus::kFlexRay, batch, bytes, frames);
+  WriteBatch(log, driver::BusKind::kFlexRay, batch, bytes, frames);
 }
 
 }  // namespace nKV_DLL300

@@ -71,23 +71,24 @@ char* AppendTimeCell(char* p, uint64_t fileTime) {
   return p;
 }
 
-size_t FormatCanTextLine(char* out, size_t cap, const RawFrameView& frame) {
+size_t FormatCanTextLine(char* out, size_t cap, const driver::RawFrameView& frame) {
   if (cap < CanTextLineMaxLength(frame.payloadLength)) return 0;
-  const RawFrameHeader& h = frame.header;
+  const driver::RawFrameHeader& h = frame.header;
   const bool extended = (h.identifier & kExtendedIdentifierFlag) != 0;
   char* p = AppendTimeCell(out, h.timestamp);
   p = AppendHex(p, h.identifier & (extended ? 0x1FFF'FFFFu : 0x7FFu));
   *p++ = '\t';
   p = AppendPayloadGroups(p, frame.payload, frame.payloadLength);
-  p = AppendLengthCell(p, RawPayloadLength(h));
+  p = AppendLengthCell(p, driver::RawPayloadLength(h));
   const TypeText type = CanTypeText(h.type, extended);
   p = AppendText(p, type.text, type.length);
   return static_cast<size_t>(p - out);
 }
 
-size_t FormatLinTextLine(char* out, size_t cap, const RawFrameView& frame, uint8_t logChecksum) {
+size_t FormatLinTextLine(char* out, size_t cap, const driver::RawFrameView& frame,
+                         uint8_t logChecksum) {
   if (cap < kLinTextLineMaxLength) return 0;
-  const RawFrameHeader& h = frame.header;
+  const driver::RawFrameHeader& h = frame.header;
   const uint32_t shown = std::min(frame.payloadLength, kLinPayloadGroups);
   char* p = AppendTimeCell(out, h.timestamp);
   p = AppendHex(p, h.identifier);
@@ -105,8 +106,8 @@ size_t FormatLinTextLine(char* out, size_t cap, const RawFrameView& frame, uint8
   return static_cast<size_t>(p - out);
 }
 
-size_t FormatFlexRayTextLine(char* out, size_t cap, const RawFrameView& frame) {
-  const RawFrameHeader& h = frame.header;
+size_t FormatFlexRayTextLine(char* out, size_t cap, const driver::RawFrameView& frame) {
+  const driver::RawFrameHeader& h = frame.header;
   const uint32_t shown = std::min<uint32_t>(frame.payloadLength, h.length);
   if (cap < FlexRayTextLineMaxLength(shown)) return 0;
   char* p = AppendTimeCell(out, h.timestamp);

@@ -24,7 +24,7 @@
 #include <cstdint>
 #include <string_view>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
@@ -62,9 +62,10 @@ inline constexpr size_t kTextLineCapacity = CanTextLineMaxLength(2047);
 // the length the frame header states. The two differ only for frames cut short in a record of fixed
 // size. A LIN frame holds at most 8 payload bytes: a length above 8 prints those 8 groups and the
 // stated length, and nothing is read past the frame.
-size_t FormatCanTextLine(char* out, size_t cap, const RawFrameView& frame);
-size_t FormatLinTextLine(char* out, size_t cap, const RawFrameView& frame, uint8_t logChecksum);
-size_t FormatFlexRayTextLine(char* out, size_t cap, const RawFrameView& frame);
+size_t FormatCanTextLine(char* out, size_t cap, const driver::RawFrameView& frame);
+size_t FormatLinTextLine(char* out, size_t cap, const driver::RawFrameView& frame,
+                         uint8_t logChecksum);
+size_t FormatFlexRayTextLine(char* out, size_t cap, const driver::RawFrameView& frame);
 
 // Writes the time cell "hh:mm:ss,mmm\t" (kTimeCellLength bytes) and returns the end.
 char* AppendTimeCell(char* out, uint64_t fileTime);

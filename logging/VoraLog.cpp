@@ -4,7 +4,7 @@
 #include <exception>
 #include <iterator>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 #include "hostlink/HostConnection.h"
 #include "hostlink/LinkedSession.h"
 #include "logging/FrameSelection.h"
@@ -54,12 +54,12 @@ void AppendRecords(SessionLog& log, BinaryRecordLayout layout, const uint8_t* ba
                    uint32_t frames) {
   const MeasurementLibrary& library = TheMeasurementLibrary();
   const uint8_t logTransmitted = log.session().connection->settings.logTransmittedFrames.load();
-  RawFrameWalker walker(batch, bytes);
-  RawFrameView frame;
+  driver::RawFrameWalker walker(batch, bytes);
+  driver::RawFrameView frame;
   for (uint32_t i = 0; i < frames && walker.next(frame); ++i) {
     if (!IsFrameLogged(frame.header, logTransmitted)) continue;
     // The record is the frame's first bytes in the read buffer, never more than the frame takes.
-    const uint8_t* record = frame.payload - kRawFrameHeaderSize;
+    const uint8_t* record = frame.payload - driver::kRawFrameHeaderSize;
     (void)library.ObjRawSet(kRawType, BinaryRecordSize(layout, frame.header), record, log.voraFile,
                             log.voraChannel);
   }
@@ -86,15 +86,8 @@ std::string VoraChannelPath(std::string_view group, std::string_view channel) {
   return path;
 }
 
-int32_t VoraNetworkProtocol(uint32_t busType) {
-  switch (busType) {
-    case kBusTypeLin:
-      return kVoraProtocolLin;
-    case kBusTypeFlexRay:
-      return kVoraProtocolFlexRay;
-    default:
-      return kVoraProtocolCan;
-  }
+int32_t VoraNetworkProtocol(driver::BusKind bus) {
+  return static_cast<int32_t>(driver::ProtocolOfBus(bus));
 }
 
 void OpenVoraLog(SessionLog& log, const std::string& path) {

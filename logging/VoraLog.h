@@ -5,6 +5,7 @@
 #include <string>
 #include <string_view>
 
+#include "driver/BusKind.h"
 #include "logging/BinaryLogFormat.h"
 #include "logging/SessionLog.h"
 
@@ -21,13 +22,10 @@ inline constexpr char kVoraPropertyVersion[] = "QV_network_frame_version";
 inline constexpr char kVoraPropertyProtocol[] = "QV_network_protocol";
 inline constexpr int32_t kVoraByteOrderLittleEndian = 0;
 inline constexpr int32_t kVoraFrameVersion = 0x200;
-inline constexpr int32_t kVoraProtocolCan = 0;
-inline constexpr int32_t kVoraProtocolFlexRay = 1;
-inline constexpr int32_t kVoraProtocolLin = 2;
 
 std::string VoraChannelPath(std::string_view group, std::string_view channel);
-// The protocol property of a session of this bus kind (kBusType*); 0 for anything else.
-int32_t VoraNetworkProtocol(uint32_t busType);
+// The protocol property of a session of this bus (driver::ProtocolOfBus).
+int32_t VoraNetworkProtocol(driver::BusKind bus);
 
 // The type-2 branch of OpenLogFile: loads the library (first use in the process), opens `path`
 // (replacing a file of that name), creates the channel named by the settings and sets its

@@ -19,7 +19,6 @@ constexpr std::string_view kPropertyPrefix = "SET_PROP";
 constexpr std::string_view kTxPropertyPrefix = "SET_TX_PROP";
 constexpr char kUnknownCommandText[] = "<ERROR: unknown command>\n";
 constexpr char kUnknownPropertyText[] = "<ERROR: unknown SETPROP command>\n";
-constexpr uint32_t kCanBus = 1;  // busType of a CAN connection
 
 int32_t HandleProperty(HostConnection& connection, std::string_view text) {
   size_t equals = text.find('=');
@@ -48,7 +47,8 @@ int32_t HandleMessageText(HostConnection& connection, std::string_view text) {
   bool txProperty = text.starts_with(kTxPropertyPrefix);
   // Transmit properties belong to a CAN session's frame; without one they are dropped.
   // The session's own kind counts, not a port name set while it runs.
-  if (txProperty && (!connection.session || connection.session->busType != kCanBus)) return 0;
+  if (txProperty && (!connection.session || connection.session->busType != driver::BusKind::kCan))
+    return 0;
   if (txProperty || text.starts_with(kPropertyPrefix)) return HandleProperty(connection, text);
   return HandleCommand(connection, text);
 }

@@ -8,28 +8,26 @@ namespace nKV_DLL300 {
 namespace {
 
 constexpr ReplySession kNone = ReplySession::kNone;
-constexpr uint32_t kNoBus = 0;
-
-// The bus type a port name stands for by its first characters; kNoBus when none matches.
-uint32_t BusTypeOfPort(std::string_view portName) {
-  if (portName.starts_with("CAN")) return 1;
-  if (portName.starts_with("LIN")) return 2;
-  if (portName.starts_with("FlexRay")) return 3;
-  return kNoBus;
+// The bus a port name stands for by its first characters; kNone when none matches.
+driver::BusKind BusOfPort(std::string_view portName) {
+  if (portName.starts_with("CAN")) return driver::BusKind::kCan;
+  if (portName.starts_with("LIN")) return driver::BusKind::kLin;
+  if (portName.starts_with("FlexRay")) return driver::BusKind::kFlexRay;
+  return driver::BusKind::kNone;
 }
 
 void PortName(HostConnection& connection, std::string_view value) {
-  uint32_t busType = BusTypeOfPort(value);
+  const driver::BusKind bus = BusOfPort(value);
   // A name of another bus while a session runs is taken for the next session: the live session
   // keeps its own kind (CBusSystem::busType), and its commands, refusals and transmit follow that.
   connection.settings.portName.Set(value);
   connection.settings.interfaceName.Set(std::string(value).append(kInterfaceSuffix));
   if (value.empty()) {
     SendPropertyReply(connection, "<ERROR: SET_PROP_SESSION_PORTNAME: empty paramter>\n", kNone);
-  } else if (busType == kNoBus) {
+  } else if (bus == driver::BusKind::kNone) {
     SendPropertyReply(connection, "<ERROR: WRONG PORT NAME>\n", kNone);
   } else {
-    connection.busType.store(busType);
+    connection.busType.store(bus);
     std::string stored = connection.settings.portName.Get();
     SendPropertyReply(connection, FillReply("<ACK: SET_PROP_SESSION_PORTNAME %s>", stored), kNone);
   }

@@ -89,9 +89,9 @@ int32_t StartFlexRay(HostConnection& connection) {
 // The "already started" text of the live session's own bus.
 const char* AlreadyStartedText(const CBusSystem& session) {
   switch (session.busType) {
-    case kBusTypeLin:
+    case driver::BusKind::kLin:
       return kLinAlreadyStarted;
-    case kBusTypeFlexRay:
+    case driver::BusKind::kFlexRay:
       return kFlexRayAlreadyStarted;
     default:
       return kCanAlreadyStarted;
@@ -101,14 +101,14 @@ const char* AlreadyStartedText(const CBusSystem& session) {
 }  // namespace
 
 int32_t StartSession(HostConnection& connection) {
-  const uint32_t busType = connection.busType.load();
+  const driver::BusKind busType = connection.busType.load();
   const SessionSettings& settings = connection.settings;
-  if (busType == kBusTypeFlexRay && settings.runMode.Contains("NORMAL") && settings.alias.Empty() &&
-      settings.cluster.Empty()) {
+  if (busType == driver::BusKind::kFlexRay && settings.runMode.Contains("NORMAL") &&
+      settings.alias.Empty() && settings.cluster.Empty()) {
     SendText(connection, kNoAliasAndCluster, nullptr, kMessageErrorText);
     return 0;
   }
-  if (busType < kBusTypeCan || busType > kBusTypeFlexRay) {
+  if (busType == driver::BusKind::kNone) {
     SendText(connection, kWrongPortName, nullptr, kMessageErrorText);
     return 0;
   }
@@ -117,8 +117,8 @@ int32_t StartSession(HostConnection& connection) {
              kMessageErrorText);
     return 0;
   }
-  if (busType == kBusTypeCan) return StartCan(connection);
-  if (busType == kBusTypeLin) return StartLin(connection);
+  if (busType == driver::BusKind::kCan) return StartCan(connection);
+  if (busType == driver::BusKind::kLin) return StartLin(connection);
   return StartFlexRay(connection);
 }
 
@@ -135,7 +135,7 @@ int32_t TerminateSession(HostConnection& connection) {
   if (connection.session) {
     result = connection.session->stop();
     connection.session.reset();
-    connection.busType.store(kBusTypeNone);
+    connection.busType.store(driver::BusKind::kNone);
   }
   CloseConnection(connection);
   return result;
@@ -148,10 +148,10 @@ int32_t ReadLastError(HostConnection& connection) {
     SendFormatted(connection, kMessageText, "<TCP Error: %d> \n", tcpError);
     return 0;
   }
-  const char* format = session->busType == kBusTypeLin ? "<LIN Error: %d>  <TCP Error: %d> \n"
-                       : session->busType == kBusTypeFlexRay
-                           ? "<FlexRay Error: %d>  <TCP Error: %d> \n"
-                           : "<CAN Error: %d>  <TCP Error: %d> \n";
+  const char* format =
+      session->busType == driver::BusKind::kLin       ? "<LIN Error: %d>  <TCP Error: %d> \n"
+      : session->busType == driver::BusKind::kFlexRay ? "<FlexRay Error: %d>  <TCP Error: %d> \n"
+                                                      : "<CAN Error: %d>  <TCP Error: %d> \n";
   SendFormatted(connection, kMessageText, format, session->lastStatus.load(), tcpError);
   return 0;
 }

@@ -39,13 +39,13 @@ constexpr LockedRule kCluster{"SET_PROP_SESSION_CLUSTER", "<ACK: SET_PROP_SESSIO
                               "", 0};
 
 // The bus word of the refusal texts; empty for a bus type that names no bus.
-std::string_view BusWord(uint32_t busType) {
-  switch (busType) {
-    case 1:
+std::string_view BusWord(driver::BusKind bus) {
+  switch (bus) {
+    case driver::BusKind::kCan:
       return "CAN";
-    case 2:
+    case driver::BusKind::kLin:
       return "LIN";
-    case 3:
+    case driver::BusKind::kFlexRay:
       return "FR";
     default:
       return "";

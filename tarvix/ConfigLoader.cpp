@@ -186,10 +186,10 @@ FlexRaySlot Slot(const json& j, const std::string& where) {
   return s;
 }
 
-BusProtocol Protocol(const std::string& text, const std::string& where) {
-  if (text == "CAN") return BusProtocol::Can;
-  if (text == "LIN") return BusProtocol::Lin;
-  if (text == "FlexRay") return BusProtocol::FlexRay;
+driver::BusKind Protocol(const std::string& text, const std::string& where) {
+  if (text == "CAN") return driver::BusKind::kCan;
+  if (text == "LIN") return driver::BusKind::kLin;
+  if (text == "FlexRay") return driver::BusKind::kFlexRay;
   Fail(where + ".protocol", "\"" + text + "\" is not one of CAN, LIN, FlexRay");
 }
 
@@ -198,9 +198,9 @@ BusConfig Bus(const json& j, const std::string& where, const std::string& base) 
   BusConfig b;
   b.name = RequiredText(j, "name", where);
   b.protocol = Protocol(TextOr(j, "protocol", where, "CAN"), where);
-  const uint64_t defaultRate = b.protocol == BusProtocol::Lin       ? 19200
-                               : b.protocol == BusProtocol::FlexRay ? 10000000
-                                                                    : 500000;
+  const uint64_t defaultRate = b.protocol == driver::BusKind::kLin       ? 19200
+                               : b.protocol == driver::BusKind::kFlexRay ? 10000000
+                                                                         : 500000;
   b.bitRate = UnsignedOr(j, "bitRate", where, 12000000, defaultRate);
   if (b.bitRate == 0) Fail(where + ".bitRate", "must not be 0");
   b.dataBitRate = UnsignedOr(j, "dataBitRate", where, 12000000, 0);
@@ -223,11 +223,12 @@ BusConfig Bus(const json& j, const std::string& where, const std::string& base) 
   b.flexRaySlotUs = NumberOr(j, "slotUs", where, 50);
   for (size_t i = 0; const json& s : Array(j, "slots", where))
     b.flexRaySlots.push_back(Slot(s, where + ".slots[" + std::to_string(i++) + "]"));
-  if ((b.protocol == BusProtocol::Lin && b.linSlotMs <= 0) ||
-      (b.protocol == BusProtocol::FlexRay && (b.flexRayCycleMs <= 0 || b.flexRaySlotUs <= 0))) {
+  if ((b.protocol == driver::BusKind::kLin && b.linSlotMs <= 0) ||
+      (b.protocol == driver::BusKind::kFlexRay &&
+       (b.flexRayCycleMs <= 0 || b.flexRaySlotUs <= 0))) {
     Fail(where, "slot and cycle times must be above 0");
   }
-  if (b.protocol != BusProtocol::Can &&
+  if (b.protocol != driver::BusKind::kCan &&
       (!b.traffic.empty() || !b.replays.empty() || !b.capture.empty())) {
     Fail(where, "traffic, replay and capture need a CAN bus");
   }
@@ -238,14 +239,7 @@ uint32_t InterfaceProtocol(const std::string& busName, const std::vector<BusConf
                            const std::string& where) {
   for (const BusConfig& b : buses) {
     if (b.name != busName) continue;
-    switch (b.protocol) {
-      case BusProtocol::Lin:
-        return driver::kProtocolLin;
-      case BusProtocol::FlexRay:
-        return driver::kProtocolFlexRay;
-      default:
-        return driver::kProtocolCan;
-    }
+    return driver::ProtocolOfBus(b.protocol);
   }
   Fail(where + ".bus", "unknown bus \"" + busName + "\"");
 }

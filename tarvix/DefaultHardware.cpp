@@ -62,7 +62,7 @@ LinSlot Lin(uint8_t id, bool response, uint32_t length, PayloadPattern payload) 
 BusConfig LinBus() {
   BusConfig b;
   b.name = "lin";
-  b.protocol = BusProtocol::Lin;
+  b.protocol = driver::BusKind::kLin;
   b.bitRate = 19200;
   b.linSlotMs = 10;
   b.linSchedule = {
@@ -87,7 +87,7 @@ FlexRaySlot Slot(uint16_t slot, bool a, bool b, uint32_t length, PayloadPattern 
 BusConfig FlexRayBus() {
   BusConfig b;
   b.name = "fr";
-  b.protocol = BusProtocol::FlexRay;
+  b.protocol = driver::BusKind::kFlexRay;
   b.bitRate = 10000000;
   b.flexRayCycleMs = 5;
   FlexRaySlot key = Slot(1, true, true, 16, PayloadPattern::Ramp(0x10));

@@ -16,21 +16,10 @@ namespace {
 
 constexpr uint32_t kGenerationShift = 12;
 
-uint32_t ProtocolCode(BusProtocol p) {
-  switch (p) {
-    case BusProtocol::Lin:
-      return driver::kProtocolLin;
-    case BusProtocol::FlexRay:
-      return driver::kProtocolFlexRay;
-    default:
-      return driver::kProtocolCan;
-  }
-}
-
 std::shared_ptr<Bus> MakeBus(BusConfig config, int64_t epochNs, std::string& error) {
-  if (config.protocol == BusProtocol::Lin)
+  if (config.protocol == driver::BusKind::kLin)
     return std::make_shared<LinBus>(std::move(config), epochNs);
-  if (config.protocol == BusProtocol::FlexRay) {
+  if (config.protocol == driver::BusKind::kFlexRay) {
     std::sort(config.flexRaySlots.begin(), config.flexRaySlots.end(),
               [](const FlexRaySlot& a, const FlexRaySlot& b) { return a.slot < b.slot; });
     return std::make_shared<FlexRayBus>(std::move(config), epochNs);
@@ -68,7 +57,7 @@ std::shared_ptr<Hardware> Hardware::Empty(const VersionValues& versions) {
 bool Hardware::buildBuses(uint32_t, std::string& error) {
   const int64_t epoch = NowNs();
   for (const BusConfig& b : config_.buses) {
-    if (!b.capture.empty() && b.protocol != BusProtocol::Can) {
+    if (!b.capture.empty() && b.protocol != driver::BusKind::kCan) {
       error = "bus \"" + b.name + "\": a capture file needs a CAN bus";
       return false;
     }
@@ -91,7 +80,7 @@ bool Hardware::buildDevices(uint32_t generation, std::string& error) {
         error = "interface \"" + i.name + "\": unknown bus \"" + i.bus + "\"";
         return false;
       }
-      if (ProtocolCode((*bus)->config().protocol) != i.protocol) {
+      if (driver::ProtocolOfBus((*bus)->config().protocol) != i.protocol) {
         error = "interface \"" + i.name + "\": its protocol differs from bus \"" + i.bus + "\"";
         return false;
       }

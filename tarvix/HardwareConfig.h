@@ -5,11 +5,10 @@
 #include <string>
 #include <vector>
 
+#include "driver/BusKind.h"
 #include "tarvix/PayloadPattern.h"
 
 namespace tarvix {
-
-enum class BusProtocol : uint8_t { Can, Lin, FlexRay };
 
 // A CAN frame the bus carries periodically. `type` is a driver frame type: data, remote, bus error,
 // FD data or FD data with bit-rate switching. A period of 0 sends back to back (a saturated bus).
@@ -56,7 +55,7 @@ struct FlexRaySlot {
 
 struct BusConfig {
   std::string name;
-  BusProtocol protocol = BusProtocol::Can;
+  driver::BusKind protocol = driver::BusKind::kCan;
   uint64_t bitRate = 500000;
   uint64_t dataBitRate = 0;  // CAN FD data phase; 0: none
   uint32_t canIoMode = 0;    // what subordinate sessions read as their CAN I/O mode

@@ -7,6 +7,7 @@
 
 #include "driver/FrameTypes.h"
 #include "driver/Properties.h"
+#include "driver/RawFrame.h"
 #include "driver/Sessions.h"
 #include "driver/States.h"
 #include "driver/Status.h"
@@ -233,10 +234,10 @@ int32_t Session::parseRecords(const uint8_t* data, uint32_t size,
                               std::vector<std::pair<SimFrame, const FrameDefinition*>>& out) const {
   uint32_t offset = 0;
   while (offset < size) {
-    RawHeader h;
+    driver::RawFrameHeader h;
     if (size - offset < sizeof h) return driver::kInvalidFrame;
     std::memcpy(&h, data + offset, sizeof h);
-    const uint32_t frameSize = driver::kRawHeaderSize + RawPayloadArea(h.length);
+    const uint32_t frameSize = driver::kRawFrameHeaderSize + driver::RawPayloadArea(h.length);
     if (h.type == driver::kFrameJ1939 || frameSize > size - offset) return driver::kInvalidFrame;
     const FrameDefinition* def = setup_.frames.size() == 1 ? &setup_.frames.front() : nullptr;
     for (const FrameDefinition& d : setup_.frames) {
@@ -255,7 +256,8 @@ int32_t Session::parseRecords(const uint8_t* data, uint32_t size,
              : fd                                             ? driver::kFrameCanFdData
                                                               : driver::kFrameCanData;
     f.length = h.length;
-    if (!remote) std::memcpy(f.payload.data(), data + offset + driver::kRawHeaderSize, h.length);
+    if (!remote)
+      std::memcpy(f.payload.data(), data + offset + driver::kRawFrameHeaderSize, h.length);
     f.origin = setup_.interfaceIndex;
     out.emplace_back(f, def);
     offset += frameSize;

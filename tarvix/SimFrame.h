@@ -1,4 +1,5 @@
-// One frame on a simulated bus, and its encoding in the driver's raw frame layout.
+// One frame on a simulated bus, and its encoding in the driver's raw frame layout
+// (driver/RawFrame.h).
 #pragma once
 
 #include <array>
@@ -6,6 +7,7 @@
 #include <cstdint>
 
 #include "driver/FrameTypes.h"
+#include "driver/RawFrame.h"
 
 namespace tarvix {
 
@@ -22,35 +24,12 @@ struct SimFrame {
   std::array<uint8_t, driver::kMaxCanFdPayload> payload{};
 };
 
-// Raw frame layout written by kxReadFrame (little-endian):
-//   offset 0  u64 timestamp, 100 ns units since 1601-01-01 UTC, the end of the frame
-//   offset 8  u32 identifier
-//   offset 12 u8  type, 13 u8 flags, 14 u8 info, 15 u8 payload length (low 8 bits)
-//   offset 16 payload, padded with zeros to a multiple of 8 bytes, at least 8
-struct RawHeader {
-  uint64_t timestamp;
-  uint32_t identifier;
-  uint8_t type;
-  uint8_t flags;
-  uint8_t info;
-  uint8_t length;
-};
-static_assert(sizeof(RawHeader) == driver::kRawHeaderSize);
-static_assert(offsetof(RawHeader, identifier) == 8);
-static_assert(offsetof(RawHeader, type) == 12);
-static_assert(offsetof(RawHeader, flags) == 13);
-static_assert(offsetof(RawHeader, info) == 14);
-static_assert(offsetof(RawHeader, length) == 15);
-
-constexpr uint32_t RawPayloadArea(uint32_t length) {
-  return length == 0 ? 8u : ((length + 7u) & ~7u);
-}
-
 constexpr uint32_t RawSize(const SimFrame& f) {
-  return driver::kRawHeaderSize + RawPayloadArea(f.length);
+  return driver::kRawFrameHeaderSize + driver::RawPayloadArea(f.length);
 }
 
-// Writes `f` at `out` (RawSize(f) bytes of room); returns the bytes written.
+// Writes `f` at `out` as a raw frame, payload padded with zeros (RawSize(f) bytes of room);
+// returns the bytes written.
 uint32_t EncodeRaw(const SimFrame& f, uint8_t* out);
 
 }  // namespace tarvix

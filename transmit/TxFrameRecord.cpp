@@ -16,7 +16,7 @@ uint32_t BuildTxFrameRecord(const TxFrameFields& fields, TxFrameRecord& record) 
   const size_t given =
       fields.payload != nullptr ? std::min<size_t>(fields.payload->size(), length) : 0;
   if (given > 0) std::copy_n(fields.payload->data(), given, record.payload);
-  return kRawFrameHeaderSize + RawPayloadArea(length);
+  return driver::kRawFrameHeaderSize + driver::RawPayloadArea(length);
 }
 
 }  // namespace nKV_DLL300

@@ -5,11 +5,11 @@
 #include <cstdint>
 #include <vector>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300 {
 
-// The driver's raw frame layout (see RawFrameHeader), limited to a CAN FD payload:
+// The driver's raw frame layout (see driver::RawFrameHeader), limited to a CAN FD payload:
 //
 //   offset size field
 //   0      8    timestamp: 0 (send now)
@@ -22,11 +22,11 @@ namespace nKV_DLL300 {
 inline constexpr uint32_t kTxMaxPayload = 64;
 
 struct TxFrameRecord {
-  RawFrameHeader header{};
+  driver::RawFrameHeader header{};
   uint8_t payload[kTxMaxPayload]{};
 };
-static_assert(sizeof(TxFrameRecord) == kRawFrameHeaderSize + kTxMaxPayload);
-static_assert(offsetof(TxFrameRecord, payload) == kRawFrameHeaderSize);
+static_assert(sizeof(TxFrameRecord) == driver::kRawFrameHeaderSize + kTxMaxPayload);
+static_assert(offsetof(TxFrameRecord, payload) == driver::kRawFrameHeaderSize);
 
 // What the frame fields make of one write.
 struct TxFrameFields {

@@ -5,7 +5,7 @@
 #include <cstring>
 #include <vector>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 #include "logging/BinaryLogFormat.h"
 #include "logging/FrameSelection.h"
 #include "logging/TextLogFormat.h"
@@ -20,12 +20,12 @@ constexpr uint64_t kTicksPerFrame = 2'300;  // 230 us, a busy bus
 
 enum class Bus { kCan, kCanFd, kLin, kFlexRay };
 
-void Append(std::vector<uint8_t>& batch, RawFrameHeader h, const uint8_t* payload) {
-  const uint32_t length = RawPayloadLength(h);
+void Append(std::vector<uint8_t>& batch, driver::RawFrameHeader h, const uint8_t* payload) {
+  const uint32_t length = driver::RawPayloadLength(h);
   const size_t at = batch.size();
-  batch.resize(at + RawFrameSize(h), 0);
+  batch.resize(at + driver::RawFrameSize(h), 0);
   std::memcpy(batch.data() + at, &h, sizeof h);
-  std::memcpy(batch.data() + at + kRawFrameHeaderSize, payload, length);
+  std::memcpy(batch.data() + at + driver::kRawFrameHeaderSize, payload, length);
 }
 
 // A batch shaped like a loaded bus of the kind: mixed identifiers, types and lengths.
@@ -58,7 +58,7 @@ std::vector<uint8_t> MakeBatch(Bus bus) {
   return batch;
 }
 
-size_t FormatLine(Bus bus, char* out, size_t cap, const RawFrameView& v) {
+size_t FormatLine(Bus bus, char* out, size_t cap, const driver::RawFrameView& v) {
   switch (bus) {
     case Bus::kCan:
     case Bus::kCanFd:
@@ -92,8 +92,8 @@ void TextLines(benchmark::State& state, Bus bus) {
   std::vector<char> stream(1 << 16);
   size_t used = 0;
   for (auto _ : state) {
-    RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
-    RawFrameView view;
+    driver::RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
+    driver::RawFrameView view;
     while (walker.next(view)) {
       if (!IsFrameLogged(view.header, 0)) continue;
       const size_t n = FormatLine(bus, line, sizeof line, view);
@@ -112,11 +112,11 @@ void BinaryRecords(benchmark::State& state, Bus bus) {
   std::vector<uint8_t> stream(1 << 16);
   size_t used = 0;
   for (auto _ : state) {
-    RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
-    RawFrameView view;
+    driver::RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
+    driver::RawFrameView view;
     while (walker.next(view)) {
       if (!IsFrameLogged(view.header, 0)) continue;
-      if (used + 2048 + kRawFrameHeaderSize > stream.size()) used = 0;
+      if (used + 2048 + driver::kRawFrameHeaderSize > stream.size()) used = 0;
       used += CopyBinaryRecord(stream.data() + used, stream.size() - used, view, layout);
     }
     benchmark::DoNotOptimize(stream.data());

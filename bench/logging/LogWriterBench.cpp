@@ -13,7 +13,7 @@
 #include <vector>
 
 #include "bus/CBusSystem.h"
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 #include "hostlink/HostConnection.h"
 #include "logging/LogFile.h"
 #include "logging/LogFileName.h"
@@ -34,18 +34,20 @@ enum class Bus { kCan, kCanFd, kLin, kFlexRay };
 
 class BenchSession : public CBusSystem {
  public:
-  explicit BenchSession(HostConnection* connection) : CBusSystem(connection, kBusTypeCan) {}
+  explicit BenchSession(HostConnection* connection)
+      : CBusSystem(connection, driver::BusKind::kCan) {}
   void startPollThread() override {}
   int32_t pollLoop() override { return 0; }
   void reportBusState(uint64_t) override {}
   SessionLog& log() { return sessionLog; }
 };
 
-void Append(std::vector<uint8_t>& batch, RawFrameHeader h, const uint8_t* payload) {
+void Append(std::vector<uint8_t>& batch, driver::RawFrameHeader h, const uint8_t* payload) {
   const size_t at = batch.size();
-  batch.resize(at + RawFrameSize(h), 0);
+  batch.resize(at + driver::RawFrameSize(h), 0);
   std::memcpy(batch.data() + at, &h, sizeof h);
-  std::memcpy(batch.data() + at + kRawFrameHeaderSize, payload, RawPayloadLength(h));
+  std::memcpy(batch.data() + at + driver::kRawFrameHeaderSize, payload,
+              driver::RawPayloadLength(h));
 }
 
 // A batch like a loaded bus of the kind: mixed identifiers, types and lengths.

@@ -9,7 +9,7 @@
 namespace kvlog {
 namespace {
 
-using nKV_DLL300::RawFrameView;
+using driver::RawFrameView;
 
 constexpr uint32_t kExtendedFlag = 0x2000'0000;
 constexpr uint32_t kClassicMax = 8;
@@ -19,12 +19,12 @@ constexpr uint8_t kFdFlag = 0x04, kBitRateSwitchFlag = 0x01;
 
 enum class Kind { kData, kRemote, kBusError, kFd, kNone };
 
-Kind KindOf(const RawFrameView& f) {
-  const uint32_t length = nKV_DLL300::RawPayloadLength(f.header);
+Kind KindOf(const driver::RawFrameView& f) {
+  const uint32_t length = driver::RawPayloadLength(f.header);
   const bool whole = f.payloadLength == length;
   switch (f.header.type) {
     case 0x00:
-    case nKV_DLL300::kFrameTypeJ1939:
+    case driver::kFrameJ1939:
       return whole && length <= kClassicMax ? Kind::kData : Kind::kNone;
     case 0x01:
       return Kind::kRemote;
@@ -61,11 +61,11 @@ char* AppendTime(char* p, uint64_t fileTime) {
                           static_cast<unsigned long long>(micros % 1'000'000));
 }
 
-char* AppendFrame(char* p, Kind kind, const RawFrameView& f) {
+char* AppendFrame(char* p, Kind kind, const driver::RawFrameView& f) {
   if (kind == Kind::kBusError) return p + std::sprintf(p, "%s", kBusErrorFrame);
   p = AppendIdentifier(p, f.header.identifier);
   *p++ = '#';
-  const uint32_t length = nKV_DLL300::RawPayloadLength(f.header);
+  const uint32_t length = driver::RawPayloadLength(f.header);
   if (kind == Kind::kRemote) {
     *p++ = 'R';
     if (length > 0 && length <= kClassicMax) *p++ = static_cast<char>('0' + length);
@@ -89,7 +89,7 @@ bool IsValidInterfaceName(std::string_view name) {
   return true;
 }
 
-size_t FormatCandumpLine(char* out, size_t cap, const RawFrameView& frame,
+size_t FormatCandumpLine(char* out, size_t cap, const driver::RawFrameView& frame,
                          std::string_view interfaceName) {
   const Kind kind = KindOf(frame);
   if (kind == Kind::kNone || cap < kCandumpLineCapacity || !IsValidInterfaceName(interfaceName))
@@ -99,7 +99,7 @@ size_t FormatCandumpLine(char* out, size_t cap, const RawFrameView& frame,
   p += interfaceName.size();
   *p++ = ' ';
   p = AppendFrame(p, kind, frame);
-  if (kind != Kind::kBusError && (frame.header.flags & nKV_DLL300::kFrameFlagEcho) != 0) {
+  if (kind != Kind::kBusError && (frame.header.flags & driver::kFlagEcho) != 0) {
     *p++ = ' ';
     *p++ = 'T';
   }

@@ -14,7 +14,7 @@
 #include <cstdint>
 #include <string_view>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace kvlog {
 
@@ -25,7 +25,7 @@ inline constexpr size_t kCandumpLineCapacity = 64 + kMaxInterfaceName + 2 * 64;
 // has no form in this format: a J1939 or classic payload over 8 bytes, an FD payload over 64 bytes,
 // a payload the record does not hold whole, a type that is not CAN, or a `cap` below
 // kCandumpLineCapacity. Time stamps before 1970 are written as 0.
-size_t FormatCandumpLine(char* out, size_t cap, const nKV_DLL300::RawFrameView& frame,
+size_t FormatCandumpLine(char* out, size_t cap, const driver::RawFrameView& frame,
                          std::string_view interfaceName);
 
 // Interface names hold 1 to kMaxInterfaceName printable characters without blanks.

@@ -161,7 +161,7 @@ CandumpResult WriteCandumpLog(const uint8_t* records, size_t size, BinaryRecordL
   CandumpResult result;
   BinaryRecordReader reader(records, size, layout);
   char line[kCandumpLineCapacity];
-  RawFrameView frame;
+  driver::RawFrameView frame;
   while (reader.next(frame)) {
     const size_t n = FormatCandumpLine(line, sizeof line, frame, interfaceName);
     if (n == 0) {

@@ -69,6 +69,8 @@ const char* BusName(Bus bus) {
       return "LIN";
     case Bus::kFlexRay:
       return "FlexRay";
+    case Bus::kNone:
+      break;
   }
   return "?";
 }
@@ -138,6 +140,8 @@ RowKey KeyOf(Bus bus, const kvhost::IdentifierRecord& record) {
       return {record.identifier, 0};
     case Bus::kFlexRay:
       return {record.identifier, record.channel};
+    case Bus::kNone:
+      break;
   }
   return {record.identifier, 0};
 }

@@ -8,11 +8,13 @@
 #include <tuple>
 #include <vector>
 
+#include "driver/BusKind.h"
 #include "host/RecordDecoder.h"
 
 namespace kvmon {
 
-enum class Bus : uint8_t { kCan, kLin, kFlexRay };
+// The bus of a session: the driver's bus kind (never kNone here).
+using Bus = driver::BusKind;
 
 // The bus of an identifier-record message type (0, 1, 2); nullopt for other types.
 std::optional<Bus> BusOfRecordType(uint8_t messageType);

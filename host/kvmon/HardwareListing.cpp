@@ -1,15 +1,14 @@
 // The hardware table printed for people and for programs.
 #include "host/kvmon/HardwareListing.h"
 
+#include "driver/Properties.h"
 #include "host/kvmon/JsonLines.h"
 
 namespace kvmon {
 namespace {
 
-constexpr uint32_t kProtocolCan = 0;
-
 const char* CanFdText(const kvhost::HardwareEntry& entry) {
-  if (entry.protocol != kProtocolCan) return "-";
+  if (entry.protocol != driver::kProtocolCan) return "-";
   return entry.canProperty != 0 ? "yes" : "no";
 }
 
@@ -17,11 +16,11 @@ const char* CanFdText(const kvhost::HardwareEntry& entry) {
 
 std::string ProtocolName(uint32_t protocol) {
   switch (protocol) {
-    case 0:
+    case driver::kProtocolCan:
       return "CAN";
-    case 1:
+    case driver::kProtocolFlexRay:
       return "FlexRay";
-    case 2:
+    case driver::kProtocolLin:
       return "LIN";
     default:
       return std::to_string(protocol);
@@ -43,10 +42,11 @@ void PrintHardwareTable(const std::vector<kvhost::HardwareEntry>& entries,
 
 void PrintHardwareJson(const std::vector<kvhost::HardwareEntry>& entries, std::FILE* out) {
   for (const auto& entry : entries) {
-    std::fprintf(out, "{\"interface\":%s,\"port\":%u,\"protocol\":%u,\"bus\":%s,\"can_fd\":%s}\n",
-                 JsonString(entry.name).c_str(), entry.port, entry.protocol,
-                 JsonString(ProtocolName(entry.protocol)).c_str(),
-                 entry.protocol == kProtocolCan && entry.canProperty != 0 ? "true" : "false");
+    std::fprintf(
+        out, "{\"interface\":%s,\"port\":%u,\"protocol\":%u,\"bus\":%s,\"can_fd\":%s}\n",
+        JsonString(entry.name).c_str(), entry.port, entry.protocol,
+        JsonString(ProtocolName(entry.protocol)).c_str(),
+        entry.protocol == driver::kProtocolCan && entry.canProperty != 0 ? "true" : "false");
   }
 }
 

@@ -14,6 +14,7 @@ BinaryRecordLayout RecordLayout(RecordBus bus, CanRecords choice, const uint8_t*
       return BinaryRecordLayout::kFixed24;
     case RecordBus::kFlexRay:
       return BinaryRecordLayout::kFlexRayVariable;
+    case RecordBus::kNone:
     case RecordBus::kCan:
       break;
   }
@@ -26,19 +27,6 @@ BinaryRecordLayout RecordLayout(RecordBus bus, CanRecords choice, const uint8_t*
       break;
   }
   return DetectCanRecordLayout(records, size);
-}
-
-std::optional<RecordBus> BusOfProtocol(int64_t protocol) {
-  switch (protocol) {
-    case 0:
-      return RecordBus::kCan;
-    case 1:
-      return RecordBus::kFlexRay;
-    case 2:
-      return RecordBus::kLin;
-    default:
-      return std::nullopt;
-  }
 }
 
 std::optional<RecordBus> BusOfName(std::string_view name) {
@@ -56,6 +44,8 @@ const char* NameOfBus(RecordBus bus) {
       return "LIN";
     case RecordBus::kFlexRay:
       return "FlexRay";
+    case RecordBus::kNone:
+      break;
   }
   return "?";
 }
@@ -70,11 +60,14 @@ std::string_view HeaderOf(RecordBus bus, uint8_t linChecksum) {
       return LinTextLogHeader(linChecksum);
     case RecordBus::kFlexRay:
       return kFlexRayTextLogHeader;
+    case RecordBus::kNone:
+      break;
   }
   return {};
 }
 
-size_t FormatLine(RecordBus bus, char* line, const RawFrameView& frame, uint8_t linChecksum) {
+size_t FormatLine(RecordBus bus, char* line, const driver::RawFrameView& frame,
+                  uint8_t linChecksum) {
   switch (bus) {
     case RecordBus::kCan:
       return FormatCanTextLine(line, kTextLineCapacity, frame);
@@ -82,6 +75,8 @@ size_t FormatLine(RecordBus bus, char* line, const RawFrameView& frame, uint8_t 
       return FormatLinTextLine(line, kTextLineCapacity, frame, linChecksum);
     case RecordBus::kFlexRay:
       return FormatFlexRayTextLine(line, kTextLineCapacity, frame);
+    case RecordBus::kNone:
+      break;
   }
   return 0;
 }
@@ -99,7 +94,7 @@ DecodeResult WriteTextLog(const uint8_t* records, size_t size, RecordBus bus,
   }
   BinaryRecordReader reader(records, size, RecordLayout(bus, options.canRecords, records, size));
   char line[kTextLineCapacity];
-  RawFrameView frame;
+  driver::RawFrameView frame;
   while (reader.next(frame)) {
     const size_t n = FormatLine(bus, line, frame, options.linChecksum);
     if (std::fwrite(line, 1, n, out) != n) {

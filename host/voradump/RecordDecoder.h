@@ -7,13 +7,15 @@
 #include <optional>
 #include <string_view>
 
+#include "driver/BusKind.h"
 #include "logging/BinaryLogFormat.h"
 #include "logging/BinaryRecordReader.h"
 
 namespace voradump {
 
 using nKV_DLL300::BinaryRecordLayout;
-using nKV_DLL300::RecordBus;
+// The bus of a log or a channel: the driver's bus kind (never kNone here).
+using RecordBus = driver::BusKind;
 
 // How CAN records are sized: fixed 24 bytes (classic sessions), variable (FD and J1939 sessions),
 // or found from the records themselves.
@@ -35,7 +37,7 @@ BinaryRecordLayout RecordLayout(RecordBus bus, CanRecords choice, const uint8_t*
                                 size_t size);
 
 // The bus a channel's "QV_network_protocol" names: 0 CAN, 1 FlexRay, 2 LIN.
-std::optional<RecordBus> BusOfProtocol(int64_t protocol);
+using driver::BusOfProtocol;
 // "can", "lin" or "flexray".
 std::optional<RecordBus> BusOfName(std::string_view name);
 const char* NameOfBus(RecordBus bus);

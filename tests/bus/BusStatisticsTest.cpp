@@ -14,13 +14,13 @@ namespace {
 constexpr bool kInWindow = true;
 constexpr bool kWindowOver = false;
 
-RawFrameHeader CanFrame(uint32_t identifier, uint8_t type, uint8_t length) {
-  return RawFrameHeader{0, identifier, type, 0, 0, length};
+driver::RawFrameHeader CanFrame(uint32_t identifier, uint8_t type, uint8_t length) {
+  return driver::RawFrameHeader{0, identifier, type, 0, 0, length};
 }
 
 TEST(CanStatistics, EachFrameTypeCountsIntoItsOwnFields) {
   const struct {
-    RawFrameHeader frame;
+    driver::RawFrameHeader frame;
     uint32_t CanBusStatistics::*total;
     uint32_t CanBusStatistics::*perSecond;
   } rows[] = {
@@ -55,7 +55,7 @@ TEST(CanStatistics, OnlyDataFramesAddBusTimeAndJ1939CountsNowhere) {
   times.buildFrameTimeTables({0, 0, 500000, 0});
   countFrame(s, times, CanFrame(0x321, 0x01, 0), kInWindow);
   countFrame(s, times, CanFrame(0, 0x02, 0), kInWindow);
-  countFrame(s, times, CanFrame(0x38FEF100, kFrameTypeJ1939, 8), kInWindow);
+  countFrame(s, times, CanFrame(0x38FEF100, driver::kFrameJ1939, 8), kInWindow);
   EXPECT_EQ(times.busTimeMax(), 0.0);
   EXPECT_EQ(s.extendedFrames + s.standardFrames, 0u);
   countFrame(s, times, CanFrame(0x20000100, 0x00, 8), kInWindow);

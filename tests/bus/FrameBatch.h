@@ -8,7 +8,7 @@
 #include <new>
 #include <vector>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace nKV_DLL300::test {
 
@@ -17,14 +17,14 @@ class FrameBatch {
  public:
   FrameBatch& add(uint64_t timestamp, uint32_t identifier, uint8_t type, uint8_t flags,
                   uint8_t info, const std::vector<uint8_t>& payload) {
-    RawFrameHeader h{timestamp, identifier, type,
-                     flags,     info,       static_cast<uint8_t>(payload.size() & 0xFF)};
-    if (type == kFrameTypeJ1939)
+    driver::RawFrameHeader h{timestamp, identifier, type,
+                             flags,     info,       static_cast<uint8_t>(payload.size() & 0xFF)};
+    if (type == driver::kFrameJ1939)
       h.info = static_cast<uint8_t>((info & ~7u) | (payload.size() >> 8));
     const size_t at = bytes_.size();
-    bytes_.resize(at + RawFrameSize(h), 0);
+    bytes_.resize(at + driver::RawFrameSize(h), 0);
     std::memcpy(bytes_.data() + at, &h, sizeof h);
-    const size_t length = std::min<size_t>(payload.size(), RawPayloadLength(h));
+    const size_t length = std::min<size_t>(payload.size(), driver::RawPayloadLength(h));
     if (length > 0) std::memcpy(bytes_.data() + at + sizeof h, payload.data(), length);
     return *this;
   }

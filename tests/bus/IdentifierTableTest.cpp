@@ -78,7 +78,7 @@ TEST(IdentifierTable, EchoesAndBusErrorsEnterOnlyWhenTheirSettingAllowsIt) {
     batch.can(1, 0x10, {}, row.type, row.flags);
     int taken = 0;
     table->updateIdentifierTable(batch.data(), batch.size(), row.settings,
-                                 [&](const RawFrameView&) { ++taken; });
+                                 [&](const driver::RawFrameView&) { ++taken; });
     EXPECT_EQ(table->idCount(), row.taken ? 1 : 0) << int(row.type) << " " << int(row.flags);
     EXPECT_EQ(taken, row.taken ? 1 : 0);
     if (row.taken) {
@@ -99,7 +99,7 @@ TEST(IdentifierTable, FullTableIgnoresNewIdentifiersAndKeepsUpdatingKnownOnes) {
   batch.can(1, 0x1, {}).can(2, 0x2, {}).can(3, 0x3, {}).can(4, 0x1, {});
   int taken = 0;
   table->updateIdentifierTable(batch.data(), batch.size(), kDefaults,
-                               [&](const RawFrameView&) { ++taken; });
+                               [&](const driver::RawFrameView&) { ++taken; });
   EXPECT_EQ(taken, 3);
   ASSERT_EQ(table->idCount(), 2);
   EXPECT_EQ(table->entry(0).count, 2u);
@@ -150,7 +150,7 @@ TEST(CanIdentifierTable, PayloadCopyFollowsEveryLengthChange) {
     EXPECT_EQ(records[0].payload, payload);
   }
   FrameBatch batch;
-  batch.add(1, 0x38FEF100, kFrameTypeJ1939, 0, 0, j1939);
+  batch.add(1, 0x38FEF100, driver::kFrameJ1939, 0, 0, j1939);
   table->updateIdentifierTable(batch.data(), batch.size(), kDefaults);
   const auto records = DecodeRecords(Send(*table)[0], kCanRecordSize);
   EXPECT_EQ(records[1].payloadLength, 2047u);

@@ -26,12 +26,12 @@ class LiteralIdentifierTable {
   uint16_t idCount() const { return static_cast<uint16_t>(count_); }
 
   void updateIdentifierTable(const void* batch, uint32_t bytes, const TableSettings& settings) {
-    RawFrameWalker walker(batch, bytes);
-    RawFrameView f;
+    driver::RawFrameWalker walker(batch, bytes);
+    driver::RawFrameView f;
     typename Rules::KeyState keyState;
     while (walker.next(f)) {
       const uint64_t key = Rules::key(f, keyState);
-      if ((f.header.flags & kFrameFlagEcho) && !settings.logTransmittedFrames) continue;
+      if ((f.header.flags & driver::kFlagEcho) && !settings.logTransmittedFrames) continue;
       if (Rules::kFiltersBusErrors && !settings.logBusErrorFrames &&
           f.header.type == Rules::kBusErrorType)
         continue;

@@ -41,9 +41,9 @@ TEST(BinaryLogFormat, FileHeaderBytes) {
 // Writes each frame of `frames` as a record, as a writer would, and returns the record bytes.
 std::vector<uint8_t> Records(std::initializer_list<FrameSpec> frames, BinaryRecordLayout layout) {
   const auto batch = kvtest::Batch(frames);
-  RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
+  driver::RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
   std::vector<uint8_t> records;
-  RawFrameView view;
+  driver::RawFrameView view;
   uint8_t record[4096];
   while (walker.next(view)) {
     const size_t n = CopyBinaryRecord(record, sizeof record, view, layout);
@@ -60,7 +60,7 @@ TEST(BinaryRecordReader, ReadsBackEveryRecordOfEachLayout) {
               BinaryRecordLayout::kCanVariable);
   ASSERT_EQ(fd.size(), 80u + 16 + 32);
   BinaryRecordReader reader(fd.data(), fd.size(), BinaryRecordLayout::kCanVariable);
-  RawFrameView v;
+  driver::RawFrameView v;
   ASSERT_TRUE(reader.next(v));
   EXPECT_EQ(v.payloadLength, 64u);
   EXPECT_EQ(v.payload[63], 7);
@@ -78,7 +78,7 @@ TEST(BinaryRecordReader, CutLastRecordStaysUnread) {
                      BinaryRecordLayout::kFixed24);
   lin.resize(lin.size() - 5);
   BinaryRecordReader reader(lin.data(), lin.size(), BinaryRecordLayout::kFixed24);
-  RawFrameView v;
+  driver::RawFrameView v;
   EXPECT_TRUE(reader.next(v));
   EXPECT_FALSE(reader.next(v));
   EXPECT_EQ(reader.remaining(), 19u);
@@ -88,7 +88,7 @@ TEST(BinaryRecordReader, FixedRecordBoundsAnOverlongPayloadToItsEightBytes) {
   const auto rec = Records({{.type = 0x10, .payload = std::vector<uint8_t>(20, 1)}},
                            BinaryRecordLayout::kFixed24);
   BinaryRecordReader reader(rec.data(), rec.size(), BinaryRecordLayout::kFixed24);
-  RawFrameView v;
+  driver::RawFrameView v;
   ASSERT_TRUE(reader.next(v));
   EXPECT_EQ(v.payloadLength, 8u);
 }

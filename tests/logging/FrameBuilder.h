@@ -6,7 +6,7 @@
 #include <initializer_list>
 #include <vector>
 
-#include "bus/RawFrame.h"
+#include "driver/RawFrame.h"
 
 namespace kvtest {
 
@@ -25,16 +25,16 @@ struct FrameSpec {
 
 // Appends one frame with its payload padded to the driver's payload area (pad bytes `pad`).
 inline void AppendFrame(std::vector<uint8_t>& batch, const FrameSpec& f, uint8_t pad = 0) {
-  nKV_DLL300::RawFrameHeader h{
+  driver::RawFrameHeader h{
       f.timestamp, f.identifier,
       f.type,      f.flags,
       f.info,      static_cast<uint8_t>(f.lengthByte >= 0 ? f.lengthByte : f.payload.size())};
-  const uint32_t area = nKV_DLL300::RawPayloadArea(nKV_DLL300::RawPayloadLength(h));
+  const uint32_t area = driver::RawPayloadArea(driver::RawPayloadLength(h));
   const size_t at = batch.size();
-  batch.resize(at + nKV_DLL300::kRawFrameHeaderSize + area, pad);
+  batch.resize(at + driver::kRawFrameHeaderSize + area, pad);
   std::memcpy(batch.data() + at, &h, sizeof h);
   if (!f.payload.empty()) {
-    std::memcpy(batch.data() + at + nKV_DLL300::kRawFrameHeaderSize, f.payload.data(),
+    std::memcpy(batch.data() + at + driver::kRawFrameHeaderSize, f.payload.data(),
                 std::min<size_t>(f.payload.size(), area));
   }
 }
@@ -53,9 +53,9 @@ inline std::vector<uint8_t> Batch(std::initializer_list<FrameSpec> frames) {
 }
 
 // The view of the first frame of a one-frame batch.
-inline nKV_DLL300::RawFrameView FirstView(const std::vector<uint8_t>& batch) {
-  nKV_DLL300::RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
-  nKV_DLL300::RawFrameView view{};
+inline driver::RawFrameView FirstView(const std::vector<uint8_t>& batch) {
+  driver::RawFrameWalker walker(batch.data(), static_cast<uint32_t>(batch.size()));
+  driver::RawFrameView view{};
   walker.next(view);
   return view;
 }

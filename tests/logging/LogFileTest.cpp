@@ -66,7 +66,7 @@ TEST_F(LogFileTest, SecondRunWithTheSameNameKeepsOnlyItsOwnFrames) {
     settings().logFileName.Set("again");
     const std::string file = "again" + LogFileExtension(type);
     for (uint8_t run : {1, 2}) {
-      UseBus(kBusTypeCan);
+      UseBus(driver::BusKind::kCan);
       OpenLogFile(log(), kHeader);
       for (uint8_t i = 0; i < (run == 1 ? 5 : 2); ++i) {
         const std::vector<uint8_t> batch = OneCanFrame(i);
@@ -140,7 +140,7 @@ TEST_F(LogFileTest, OpenFailuresReportAndSkipTheRun) {
        2},
   };
   for (const Case& c : cases) {
-    UseBus(kBusTypeCan);
+    UseBus(driver::BusKind::kCan);
     settings().logFileType.store(c.type);
     settings().logFileName.Set(c.name);
     c.arrange();
@@ -218,7 +218,7 @@ TEST_F(FullDiskTest, WritesBeyondTheLimitReportIncompleteLinesAndTheRunGoesOn) {
     EXPECT_EQ(session().lastStatus.load(), kLogWriteIncomplete);
     EXPECT_LE(fs::file_size(ServiceDirectory() / ("full" + LogFileExtension(type))), kLimit);
     // The session still logs once there is room again.
-    UseBus(kBusTypeCan);
+    UseBus(driver::BusKind::kCan);
     OpenLogFile(log(), kHeader);
     CloseLogFile(log());
     EXPECT_TRUE(SentMessages().empty());

@@ -133,7 +133,7 @@ TEST_F(LogOverTcpTest, FdTextAndBinaryLogsShowSwitchingAndVariableRecords) {
       {0x200, 80}, {0x201, 32}, {kExtendedFlag | 0x1ABCDE00, 32}, {0x080, 24}};
   std::map<uint32_t, int> counted;
   size_t remaining = 1, total = 12;
-  for (const RawFrameView& frame :
+  for (const driver::RawFrameView& frame :
        ReadRecords(file, BinaryRecordLayout::kCanVariable, &remaining)) {
     ASSERT_TRUE(sizes.count(frame.header.identifier)) << std::hex << frame.header.identifier;
     total += sizes.at(frame.header.identifier);
@@ -171,7 +171,7 @@ TEST_F(LogOverTcpTest, LinLogsHaveTheChecksumColumnNoResponseFramesAndFixedRecor
   EXPECT_EQ((file.size() - 12) % 24, 0u);
   EXPECT_TRUE(RecordsAreConsistent(reinterpret_cast<const uint8_t*>(file.data()) + 12,
                                    file.size() - 12, BinaryRecordLayout::kFixed24,
-                                   RecordBus::kLin));
+                                   driver::BusKind::kLin));
 }
 
 TEST_F(LogOverTcpTest, FlexRayTextLogShowsChannelsStartupAndSync) {
@@ -220,8 +220,8 @@ TEST_F(LogOverTcpTest, BinaryLogHoldsEveryFrameOfTheBusCaptureInOrder) {
   ASSERT_EQ((file.size() - 12) % 24, 0u);
   // Each record as the capture writes it: "(seconds.micros) body ID#DATA".
   std::vector<std::string> logged;
-  for (const RawFrameView& frame : ReadRecords(file, BinaryRecordLayout::kFixed24)) {
-    const RawFrameHeader& h = frame.header;
+  for (const driver::RawFrameView& frame : ReadRecords(file, BinaryRecordLayout::kFixed24)) {
+    const driver::RawFrameHeader& h = frame.header;
     const uint64_t micros = (h.timestamp - kFileTimeUnixEpoch) / 10;
     char text[96];
     int n = std::snprintf(text, sizeof text, "(%llu.%06llu) body ",
@@ -263,7 +263,7 @@ TEST_F(LogOverTcpTest, EchoFramesAreLoggedOnlyWithTheSetting) {
     Terminate(host);
     const std::string file = LogFile("echo.zfl");
     std::vector<uint32_t> ids;
-    for (const RawFrameView& frame : ReadRecords(file, BinaryRecordLayout::kCanVariable)) {
+    for (const driver::RawFrameView& frame : ReadRecords(file, BinaryRecordLayout::kCanVariable)) {
       ids.push_back(frame.header.identifier);
     }
     const std::vector<uint32_t> expected =

@@ -81,19 +81,19 @@ class LogRunTest : public CanSessionTest {
 };
 
 // The whole records of `bytes` (views into it) and the count of bytes after them.
-inline std::vector<nKV_DLL300::RawFrameView> ReadRecords(const uint8_t* bytes, size_t size,
-                                                         nKV_DLL300::BinaryRecordLayout layout,
-                                                         size_t* remaining = nullptr) {
+inline std::vector<driver::RawFrameView> ReadRecords(const uint8_t* bytes, size_t size,
+                                                     nKV_DLL300::BinaryRecordLayout layout,
+                                                     size_t* remaining = nullptr) {
   nKV_DLL300::BinaryRecordReader reader(bytes, size, layout);
-  std::vector<nKV_DLL300::RawFrameView> records;
-  for (nKV_DLL300::RawFrameView view; reader.next(view);) records.push_back(view);
+  std::vector<driver::RawFrameView> records;
+  for (driver::RawFrameView view; reader.next(view);) records.push_back(view);
   if (remaining != nullptr) *remaining = reader.remaining();
   return records;
 }
 // The records of a binary log file, after its 12-byte header.
-inline std::vector<nKV_DLL300::RawFrameView> ReadRecords(const std::string& file,
-                                                         nKV_DLL300::BinaryRecordLayout layout,
-                                                         size_t* remaining = nullptr) {
+inline std::vector<driver::RawFrameView> ReadRecords(const std::string& file,
+                                                     nKV_DLL300::BinaryRecordLayout layout,
+                                                     size_t* remaining = nullptr) {
   if (file.size() < 12) return {};
   return ReadRecords(reinterpret_cast<const uint8_t*>(file.data()) + 12, file.size() - 12, layout,
                      remaining);

@@ -26,7 +26,7 @@ namespace kvtest {
 // A session with nothing to poll: the log operations are called by the test as a poll loop would.
 class LoggingSession : public nKV_DLL300::CBusSystem {
  public:
-  LoggingSession(nKV_DLL300::HostConnection* connection, uint32_t bus)
+  LoggingSession(nKV_DLL300::HostConnection* connection, driver::BusKind bus)
       : CBusSystem(connection, bus) {}
   void startPollThread() override {}
   int32_t pollLoop() override { return 0; }
@@ -57,7 +57,7 @@ class LogSessionTest : public ::testing::Test {
     ASSERT_GE(accepted, 0);
     connection_ =
         std::make_unique<nKV_DLL300::HostConnection>(accepted, nKV_DLL300::ConnectionSetup{});
-    UseBus(nKV_DLL300::kBusTypeCan);
+    UseBus(driver::BusKind::kCan);
   }
 
   void TearDown() override {
@@ -66,7 +66,7 @@ class LogSessionTest : public ::testing::Test {
   }
 
   // A new session of `bus`; the connection's busType follows it.
-  void UseBus(uint32_t bus) {
+  void UseBus(driver::BusKind bus) {
     session_.reset();
     connection_->busType.store(bus);
     session_ = std::make_unique<LoggingSession>(connection_.get(), bus);

@@ -18,7 +18,7 @@ using Writer = void (*)(SessionLog&, const uint8_t*, uint32_t, uint32_t);
 
 struct BusCase {
   const char* name;
-  uint32_t bus;
+  driver::BusKind bus;
   Writer writer;
   std::string_view header;
 };
@@ -38,9 +38,10 @@ class LogWritersTest : public LogSessionTest {
   }
 };
 
-const BusCase kCan{"CAN", kBusTypeCan, &WriteCanLog, kCanTextLogHeader};
-const BusCase kLin{"LIN", kBusTypeLin, &WriteLinLog, kLinTextLogHeader};
-const BusCase kFlexRay{"FlexRay", kBusTypeFlexRay, &WriteFlexRayLog, kFlexRayTextLogHeader};
+const BusCase kCan{"CAN", driver::BusKind::kCan, &WriteCanLog, kCanTextLogHeader};
+const BusCase kLin{"LIN", driver::BusKind::kLin, &WriteLinLog, kLinTextLogHeader};
+const BusCase kFlexRay{"FlexRay", driver::BusKind::kFlexRay, &WriteFlexRayLog,
+                       kFlexRayTextLogHeader};
 
 // The lines themselves are checked per frame kind by the text format's table.
 TEST_F(LogWritersTest, CanLinesFollowTheHeaderAndEchoFramesNeedTheSetting) {
@@ -69,7 +70,7 @@ TEST_F(LogWritersTest, LinLinesPadTheirPayloadAndShowTheChecksumWhileItIsSet) {
       "09:05:03,042\t12\t00  00  00  00  00  00  00  00  \t0\tNR\n";
   EXPECT_EQ(LogOf(kLin, kLogTypeText, batch, 3), std::string(kLinTextLogHeader) + "\n" + plain);
   settings().logChecksum.store(1);
-  const BusCase withChecksum{"LIN", kBusTypeLin, &WriteLinLog, LinTextLogHeader(1)};
+  const BusCase withChecksum{"LIN", driver::BusKind::kLin, &WriteLinLog, LinTextLogHeader(1)};
   EXPECT_EQ(LogOf(withChecksum, kLogTypeText, batch, 3),
             std::string(kLinTextLogHeaderWithChecksum) + "\n" +
                 "09:05:03,042\t10\t12  34  00  00  00  00  00  00  \t2\t5e\tS\n"

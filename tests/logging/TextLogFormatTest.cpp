@@ -23,7 +23,7 @@ struct LineCase {
 };
 void PrintTo(const LineCase& c, std::ostream* os) { *os << c.name; }
 
-std::string Format(Bus bus, const RawFrameView& view, size_t cap = kTextLineCapacity) {
+std::string Format(Bus bus, const driver::RawFrameView& view, size_t cap = kTextLineCapacity) {
   std::vector<char> out(cap);
   size_t n = 0;
   switch (bus) {
@@ -190,8 +190,8 @@ TEST(TextLogFormat, LinesStayWithinTheirBoundsAndNeedThemWhole) {
 
 TEST(TextLogFormat, LinLengthAboveEightPrintsOnlyTheFrameBytes) {
   // A LIN record holds 8 payload bytes; a bad length byte must not pull in the next frame.
-  RawFrameView view{};
-  view.header = RawFrameHeader{kvtest::kAt090503042, 0x10, 0x40, 0, 0, 200};
+  driver::RawFrameView view{};
+  view.header = driver::RawFrameHeader{kvtest::kAt090503042, 0x10, 0x40, 0, 0, 200};
   const uint8_t bytes[8] = {1, 2, 3, 4, 5, 6, 7, 8};
   view.payload = bytes;
   view.payloadLength = 8;

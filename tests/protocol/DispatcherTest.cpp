@@ -30,13 +30,13 @@ class DispatcherTest : public ::testing::Test {
     close(pair_[1]);
   }
 
-  void GiveSession(uint32_t kind) {
+  void GiveSession(driver::BusKind kind) {
     connection_->session = std::make_unique<kvtest::FakeSession>(connection_.get(), calls_, kind);
     connection_->session->idCount.store(kSessionIdCount);
     connection_->session->lastStatus.store(kSessionStatus);
     connection_->busType.store(kind);
   }
-  void GiveCanSession() { GiveSession(nKV_DLL300::kBusTypeCan); }
+  void GiveCanSession() { GiveSession(driver::BusKind::kCan); }
 
   // Sends `text` as the host and dispatches it; returns what the service answered (may be empty).
   std::vector<uint8_t> Dispatch(const std::string& text) {
@@ -63,9 +63,9 @@ TEST_F(DispatcherTest, TransmitPropertiesReachTheTableOnlyWithACanSession) {
   GiveCanSession();
   EXPECT_EQ(TextOf(Dispatch("SET_TX_PROP_FOO=1")), "<ERROR: unknown SETPROP command>\n");
   // A port name of another bus set while the CAN session runs does not change the session's kind.
-  connection_->busType.store(nKV_DLL300::kBusTypeLin);
+  connection_->busType.store(driver::BusKind::kLin);
   EXPECT_EQ(TextOf(Dispatch("SET_TX_PROP_FOO=1")), "<ERROR: unknown SETPROP command>\n");
-  GiveSession(nKV_DLL300::kBusTypeLin);
+  GiveSession(driver::BusKind::kLin);
   EXPECT_TRUE(Dispatch("SET_TX_PROP_FOO=1").empty());
 }
 

@@ -60,25 +60,29 @@ std::vector<Row> PortNameRows() {
       One("PortNameCanSetsBusTypeAndInterfaceName", kSetPort + "CAN3",
           {"<ACK: SET_PROP_SESSION_PORTNAME CAN3>"},
           [](auto& c) {
-            return c.busType == 1 && S(c).portName.Get() == "CAN3" &&
+            return c.busType == driver::BusKind::kCan && S(c).portName.Get() == "CAN3" &&
                    S(c).interfaceName.Get() == "CAN3@qv_corle_tarvix";
           }),
       One("PortNameLinSetsBusTypeTwo", kSetPort + "LIN1", {"<ACK: SET_PROP_SESSION_PORTNAME LIN1>"},
-          [](auto& c) { return c.busType == 2; }),
+          [](auto& c) { return c.busType == driver::BusKind::kLin; }),
       One("PortNameFlexRaySetsBusTypeThree", kSetPort + "FlexRay2",
-          {"<ACK: SET_PROP_SESSION_PORTNAME FlexRay2>"}, [](auto& c) { return c.busType == 3; }),
+          {"<ACK: SET_PROP_SESSION_PORTNAME FlexRay2>"},
+          [](auto& c) { return c.busType == driver::BusKind::kFlexRay; }),
       One("PortNameFlexWithoutRayIsWrong", kSetPort + "Flex1", {"<ERROR: WRONG PORT NAME>\n"},
-          [](auto& c) { return c.busType == 0; }),
+          [](auto& c) { return c.busType == driver::BusKind::kNone; }),
       {"PortNameUnknownKeepsBusTypeButStoresTheNames",
        {{kSetPort + "CAN1", {"<ACK: SET_PROP_SESSION_PORTNAME CAN1>"}},
         {kSetPort + "ETH1", {"<ERROR: WRONG PORT NAME>\n"}}},
        [](auto& c) {
-         return c.busType == 1 && S(c).portName.Get() == "ETH1" &&
+         return c.busType == driver::BusKind::kCan && S(c).portName.Get() == "ETH1" &&
                 S(c).interfaceName.Get() == "ETH1@qv_corle_tarvix";
        }},
       One("PortNameEmptyIsAnErrorAndStoresTheSuffixAlone", kSetPort,
           {"<ERROR: SET_PROP_SESSION_PORTNAME: empty paramter>\n"},
-          [](auto& c) { return c.busType == 0 && S(c).interfaceName.Get() == "@qv_corle_tarvix"; }),
+          [](auto& c) {
+            return c.busType == driver::BusKind::kNone &&
+                   S(c).interfaceName.Get() == "@qv_corle_tarvix";
+          }),
       One("PortNameKeepsAHostLineEndInTheValue", kSetPort + "CAN1\n",
           {"<ACK: SET_PROP_SESSION_PORTNAME CAN1\n>"},
           STORED(interfaceName.Get() == "CAN1\n@qv_corle_tarvix")),

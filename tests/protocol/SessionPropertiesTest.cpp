@@ -43,7 +43,7 @@ class SessionPropertiesTest : public ::testing::Test {
     if (listener_ != net::kInvalidSocket) net::Close(listener_);
   }
 
-  void StartSession(uint32_t busType) {
+  void StartSession(driver::BusKind busType) {
     connection_->busType.store(busType);
     auto session = std::make_unique<FakeSession>(connection_.get(), calls_, busType);
     session->idCount.store(kSessionIdCount);
@@ -88,7 +88,9 @@ const LockedProperty kLockedProperties[] = {
 
 // A refused value is still stored for the next session.
 TEST_F(SessionPropertiesTest, SessionSettingsAreRefusedNamingTheBusOfTheSession) {
-  const std::pair<uint32_t, std::string> buses[] = {{1, "CAN"}, {2, "LIN"}, {3, "FR"}};
+  const std::pair<driver::BusKind, std::string> buses[] = {{driver::BusKind::kCan, "CAN"},
+                                                           {driver::BusKind::kLin, "LIN"},
+                                                           {driver::BusKind::kFlexRay, "FR"}};
   for (const auto& [busType, word] : buses) {
     StartSession(busType);
     for (const LockedProperty& property : kLockedProperties) {
@@ -106,7 +108,7 @@ TEST_F(SessionPropertiesTest, SessionSettingsAreRefusedNamingTheBusOfTheSession)
 }
 
 TEST_F(SessionPropertiesTest, RangeErrorComesBeforeTheRefusalAndShowsNoSession) {
-  StartSession(2);
+  StartSession(driver::BusKind::kLin);
   ExpectReplies("SET_PROP_SESSION_LISTEN_ONLY=7",
                 {"<ERROR: SET_PROP_SESSION_LISTEN_ONLY: Value range error>\n"}, kHidden);
   ExpectReplies("SET_PROP_SESSION_RUNMODE=MASTER",
@@ -116,7 +118,7 @@ TEST_F(SessionPropertiesTest, RangeErrorComesBeforeTheRefusalAndShowsNoSession) 
 }
 
 TEST_F(SessionPropertiesTest, SessionOfNoKnownBusGetsNoReplyButTheValueIsStored) {
-  StartSession(0);
+  StartSession(driver::BusKind::kNone);
   nKV_DLL300::HandleMessageText(*connection_, "SET_PROP_SESSION_CLUSTER=Body");
   ExpectNothingMore();
   EXPECT_EQ(connection_->settings.cluster.Get(), "Body");
@@ -153,7 +155,7 @@ TEST_F(SessionPropertiesTest, HeaderShowsTheSessionOnlyInRepliesThatCarryIt) {
       {"SET_PROP_LOGFILE_VORA_GROUP_NAME=G", "<ACK: SET_PROP_LOGFILE_VORA_GROUP_NAME G>"},
       {"SET_PROP_SESSION_PORTNAME=CAN2", "<ACK: SET_PROP_SESSION_PORTNAME CAN2>"},
   };
-  StartSession(1);
+  StartSession(driver::BusKind::kCan);
   for (const auto& [text, replies] : shown) ExpectReplies(text, replies, kShown);
   for (const auto& [text, reply] : hidden) ExpectReplies(text, {reply}, kHidden);
   ExpectNothingMore();
@@ -162,7 +164,7 @@ TEST_F(SessionPropertiesTest, HeaderShowsTheSessionOnlyInRepliesThatCarryIt) {
 TEST_F(SessionPropertiesTest, LogFileNameIsRefusedOnlyWhileASessionLogs) {
   ExpectReplies("SET_PROP_LOGFILE=1", {"<ACK: SET_PROP_LOGFILE 1> \n"}, kHidden);
   ExpectReplies("SET_PROP_LOGFILE_NAME=first", {"<ACK: SET_PROP_LOGFILE_NAME first> \n"}, kHidden);
-  StartSession(1);
+  StartSession(driver::BusKind::kCan);
   ExpectReplies("SET_PROP_LOGFILE_NAME=second",
                 {"<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n"}, kHidden);
   ExpectReplies("SET_PROP_LOGFILE_NAME=", {"<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n"},

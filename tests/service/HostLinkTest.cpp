@@ -51,7 +51,7 @@ TEST(HostLinkTest, NewConnectionStartsFromTheDefaults) {
   HostConnection connection(platform::net::kInvalidSocket, std::move(setup));
   EXPECT_EQ(connection.hardwareCount, 3);
   EXPECT_EQ(connection.driverVersion[4], 5u);
-  EXPECT_EQ(connection.busType.load(), 0u);
+  EXPECT_EQ(connection.busType.load(), driver::BusKind::kNone);
   EXPECT_EQ(connection.settings.txTimeData.load(), 1000u);
   EXPECT_EQ(connection.settings.keySlot.load(), 0xFFFFFFFFu);
   EXPECT_EQ(connection.settings.runMode.Get(), "SUBORDINATE");

@@ -31,7 +31,7 @@ nKV_DLL300::HostConnection& CanSessionTest::ConnectionAt(size_t slot) {
 void CanSessionTest::UsePort(nKV_DLL300::HostConnection& connection, const std::string& port) {
   connection.settings.portName.Set(port);
   connection.settings.interfaceName.Set(port + "@qv_corle_tarvix");
-  connection.busType.store(nKV_DLL300::kBusTypeCan);
+  connection.busType.store(driver::BusKind::kCan);
 }
 
 std::optional<kvhost::HostMessage> CanSessionTest::ExpectReply(kvhost::HostClient& host,

@@ -23,7 +23,7 @@ constexpr char kBodyInterface[] = "CAN1@qv_corle_tarvix";
 class MinimalSession : public CTableSession<CanIdentifierRules, CanBusStatistics, 100000> {
  public:
   explicit MinimalSession(HostConnection* owner)
-      : CTableSession(owner, kBusTypeCan, ReadPacing::kNearlyFullRule) {}
+      : CTableSession(owner, driver::BusKind::kCan, ReadPacing::kNearlyFullRule) {}
   ~MinimalSession() override { endForDestruction(); }
 
   int32_t open() {
@@ -45,7 +45,7 @@ class MinimalSession : public CTableSession<CanIdentifierRules, CanBusStatistics
  protected:
   const char* logHeaderLine() const override { return ""; }
   uint32_t batchFrameCount(uint32_t bytes) const override { return bytes / 24; }
-  void countFrame(const RawFrameView&, bool) override {}
+  void countFrame(const driver::RawFrameView&, bool) override {}
 };
 
 size_t CallsOf(const std::string& operation) {

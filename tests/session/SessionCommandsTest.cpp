@@ -80,7 +80,8 @@ TEST_F(CanSessionTest, CommandsOnARunningSessionAnswerWithTheirTexts) {
   expect("CMD_SESSION_READ_LAST_ERROR", "<CAN Error: 0>  <TCP Error: 0> \n", kvhost::kText, 4);
   expect("SET_PROP_SESSION_PORTNAME=LIN1", "<ACK: SET_PROP_SESSION_PORTNAME LIN1>", kvhost::kText,
          0);
-  EXPECT_EQ(ConnectionAt(0).busType.load(), 2u) << "the port is kept for the next session";
+  EXPECT_EQ(ConnectionAt(0).busType.load(), driver::BusKind::kLin)
+      << "the port is kept for the next session";
   EXPECT_EQ(ConnectionAt(0).settings.interfaceName.Get(), "LIN1@qv_corle_tarvix");
   expect("SET_PROP_SESSION_LISTEN_ONLY=1", canRefusal, kvhost::kErrorText, 4);
   expect("CMD_SESSION_START", started, kvhost::kErrorText, 4);

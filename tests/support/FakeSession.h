@@ -12,7 +12,7 @@ class FakeSession : public nKV_DLL300::CBusSystem {
     bool destroyed = false;
   };
   FakeSession(nKV_DLL300::HostConnection* owner, Calls& calls,
-              uint32_t kind = nKV_DLL300::kBusTypeCan)
+              driver::BusKind kind = driver::BusKind::kCan)
       : CBusSystem(owner, kind), calls_(calls) {}
   ~FakeSession() override { calls_.destroyed = true; }
   int32_t pollOnce() override { return 0; }

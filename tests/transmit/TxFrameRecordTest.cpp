@@ -58,7 +58,7 @@ TEST_P(TxFrameRecordTest, CarriesIdentifierTypeLengthAndZeroPaddedPayload) {
   EXPECT_EQ(record.header.flags, 0);
   EXPECT_EQ(record.header.info, 0);
   EXPECT_EQ(record.header.length, c.expectedPayload.size());
-  const Bytes written(record.payload, record.payload + size - nKV_DLL300::kRawFrameHeaderSize);
+  const Bytes written(record.payload, record.payload + size - driver::kRawFrameHeaderSize);
   Bytes expected = c.expectedPayload;
   expected.resize(written.size(), 0);  // the padding is zeros
   EXPECT_EQ(written, expected);

@@ -51,10 +51,10 @@ class VoraLogTest : public LogSessionTest {
     const auto bytes = static_cast<uint32_t>(batch.size());
     const auto frames = static_cast<uint32_t>(batch.size());  // the walk ends the batch first
     switch (session().busType) {
-      case kBusTypeLin:
+      case driver::BusKind::kLin:
         WriteLinLog(log(), batch.data(), bytes, frames);
         break;
-      case kBusTypeFlexRay:
+      case driver::BusKind::kFlexRay:
         WriteFlexRayLog(log(), batch.data(), bytes, frames);
         break;
       default:
@@ -70,7 +70,7 @@ class VoraLogTest : public LogSessionTest {
 
 struct LayoutCase {
   const char* what;
-  uint32_t bus;
+  driver::BusKind bus;
   uint32_t canIoMode;
   std::vector<FrameSpec> frames;
   std::vector<uint32_t> recordSizes;
@@ -98,7 +98,8 @@ TEST_P(VoraLayoutTest, ChannelHoldsTheBinaryLogRecordsAndTheThreeProperties) {
   size_t at = 0;
   for (uint32_t size : c.recordSizes) {
     expected.insert(expected.end(), batch.begin() + at, batch.begin() + at + size);
-    at += RawFrameSize(FirstView(std::vector<uint8_t>(batch.begin() + at, batch.end())).header);
+    at += driver::RawFrameSize(
+        FirstView(std::vector<uint8_t>(batch.begin() + at, batch.end())).header);
   }
   expected.insert(expected.end(), expected.begin(), expected.end());
 
@@ -115,7 +116,7 @@ INSTANTIATE_TEST_SUITE_P(
     Buses, VoraLayoutTest,
     ::testing::Values(
         LayoutCase{"ClassicCan",
-                   kBusTypeCan,
+                   driver::BusKind::kCan,
                    0,
                    {{.identifier = 0x100, .type = kCanData, .payload = Counting(8, 1)},
                     {.identifier = 0x1A0, .type = kCanData, .payload = Counting(3, 0xAA)},
@@ -123,7 +124,7 @@ INSTANTIATE_TEST_SUITE_P(
                    {24, 24, 24},
                    0},
         LayoutCase{"CanFd",
-                   kBusTypeCan,
+                   driver::BusKind::kCan,
                    1,
                    {{.identifier = 0x200, .type = kCanFdData, .payload = Counting(64)},
                     {.identifier = 0x201, .type = kCanFdData, .payload = Counting(12, 0xA0)},
@@ -131,7 +132,7 @@ INSTANTIATE_TEST_SUITE_P(
                    {80, 32, 24},
                    0},
         LayoutCase{"Lin",
-                   kBusTypeLin,
+                   driver::BusKind::kLin,
                    0,
                    {{.identifier = 0x11, .type = kLinData, .payload = Counting(8)},
                     {.identifier = 0x10, .type = kLinData, .payload = {0x12, 0x34}},
@@ -140,7 +141,7 @@ INSTANTIATE_TEST_SUITE_P(
                    2},
         LayoutCase{
             "FlexRay",
-            kBusTypeFlexRay,
+            driver::BusKind::kFlexRay,
             0,
             {{.identifier = 40, .type = kFlexRayData, .flags = 0x20, .payload = Counting(32)},
              {.identifier = 1, .type = kFlexRayData, .flags = 0x13, .payload = Counting(16)},

@@ -57,7 +57,7 @@ struct BusCase {
   std::vector<std::string> properties;  // the port and its settings
   uint8_t recordType;
   BinaryRecordLayout layout;
-  RecordBus bus;
+  driver::BusKind bus;
   std::map<uint32_t, uint32_t> recordSizes;  // identifier -> bytes of its record
   int64_t protocol;
   std::vector<uint32_t> rare{};  // identifiers that a short run may miss (bus errors once a second)
@@ -90,11 +90,11 @@ TEST_P(VoraBusTest, LogHoldsTheBusRecordsReadableByEveryReader) {
   EXPECT_TRUE(RecordsAreConsistent(bytes.data(), bytes.size(), c.layout, c.bus));
 
   size_t remaining = 1;
-  const std::vector<RawFrameView> frames =
+  const std::vector<driver::RawFrameView> frames =
       ReadRecords(bytes.data(), bytes.size(), c.layout, &remaining);
   const size_t records = frames.size();
   std::map<uint32_t, int> counted;
-  for (const RawFrameView& frame : frames) {
+  for (const driver::RawFrameView& frame : frames) {
     const auto size = c.recordSizes.find(frame.header.identifier);
     ASSERT_NE(size, c.recordSizes.end()) << std::hex << frame.header.identifier;
     EXPECT_EQ(BinaryRecordSize(c.layout, frame.header), size->second)
@@ -142,7 +142,7 @@ INSTANTIATE_TEST_SUITE_P(
                 {"SET_PROP_SESSION_PORTNAME=CAN1"},
                 kvhost::kCanRecords,
                 BinaryRecordLayout::kFixed24,
-                RecordBus::kCan,
+                driver::BusKind::kCan,
                 {{0x100, 24}, {0x1A0, 24}, {0x321, 24}, {kExtended | 0x18FEF100, 24}, {0, 24}},
                 0,
                 {0}},
@@ -150,7 +150,7 @@ INSTANTIATE_TEST_SUITE_P(
                 {"SET_PROP_SESSION_PORTNAME=CAN5"},
                 kvhost::kCanRecords,
                 BinaryRecordLayout::kCanVariable,
-                RecordBus::kCan,
+                driver::BusKind::kCan,
                 {{0x200, 80}, {0x201, 32}, {kExtended | 0x1ABCDE00, 32}, {0x080, 24}},
                 0},
         BusCase{"Lin",
@@ -158,14 +158,14 @@ INSTANTIATE_TEST_SUITE_P(
                  "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"},
                 kvhost::kLinRecords,
                 BinaryRecordLayout::kFixed24,
-                RecordBus::kLin,
+                driver::BusKind::kLin,
                 {{0x10, 24}, {0x11, 24}, {0x12, 24}, {0x13, 24}},
                 2},
         BusCase{"FlexRay",
                 {"SET_PROP_SESSION_PORTNAME=FlexRay1"},
                 kvhost::kFlexRayRecords,
                 BinaryRecordLayout::kFlexRayVariable,
-                RecordBus::kFlexRay,
+                driver::BusKind::kFlexRay,
                 {{1, 32}, {2, 32}, {3, 24}, {40, 48}},
                 1}),
     [](const ::testing::TestParamInfo<BusCase>& info) { return std::string(info.param.what); });
@@ -204,8 +204,8 @@ TEST_F(VoraOverTcpTest, TwoSessionsLogAtOnceEachToItsOwnFile) {
   Terminate(lin);
   EXPECT_TRUE(errors.empty());
   for (const auto& [file, name, protocol, bus] :
-       {std::tuple{"can.vora", "CAN1", 0, RecordBus::kCan},
-        std::tuple{"lin.vora", "LIN1", 2, RecordBus::kLin}}) {
+       {std::tuple{"can.vora", "CAN1", 0, driver::BusKind::kCan},
+        std::tuple{"lin.vora", "LIN1", 2, driver::BusKind::kLin}}) {
     const auto channel = OnlyChannel(LogPath(file));
     ASSERT_TRUE(channel) << file;
     EXPECT_EQ(channel->channel.name, name);

@@ -1,13 +1,18 @@
-// The driver's frame layout in read buffers, and the walk over a batch of frames.
+// The driver's raw frame: the layout kxReadFrame hands over and kxWriteFrame takes, the one
+// description the module, the simulated driver and the host tools share, and the walk over a
+// batch of frames.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 
-namespace nKV_DLL300 {
+#include "driver/FrameTypes.h"
 
-// One frame as kxReadFrame delivers it; frames follow each other without gaps.
+namespace driver {
+
+// One frame as kxReadFrame delivers it; frames follow each other without gaps. Type codes and
+// flag bits are named in driver/FrameTypes.h.
 //
 //   offset size field
 //   0      8    timestamp: 100 ns units since 1601-01-01 UTC, the moment the frame ended
@@ -31,15 +36,15 @@ struct RawFrameHeader {
 static_assert(sizeof(RawFrameHeader) == 16);
 static_assert(offsetof(RawFrameHeader, identifier) == 8);
 static_assert(offsetof(RawFrameHeader, type) == 12);
+static_assert(offsetof(RawFrameHeader, flags) == 13);
+static_assert(offsetof(RawFrameHeader, info) == 14);
 static_assert(offsetof(RawFrameHeader, length) == 15);
 
 inline constexpr uint32_t kRawFrameHeaderSize = 16;
-inline constexpr uint8_t kFrameTypeJ1939 = 0xC0;
-inline constexpr uint8_t kFrameFlagEcho = 0x80;
 
 // Payload length: byte 15, widened by info bits 0-2 for J1939 frames (up to 2047 bytes).
 inline constexpr uint32_t RawPayloadLength(const RawFrameHeader& h) {
-  return h.type == kFrameTypeJ1939 ? h.length + 256u * (h.info & 7u) : h.length;
+  return h.type == kFrameJ1939 ? h.length + 256u * (h.info & 7u) : h.length;
 }
 
 // Size of the padded payload area: 8 when empty, else the length rounded up to a multiple of 8.
@@ -87,4 +92,4 @@ class RawFrameWalker {
   uint32_t offset_ = 0;
 };
 
-}  // namespace nKV_DLL300
+}  // namespace driver
