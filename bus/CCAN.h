@@ -12,6 +12,8 @@
 
 namespace nKV_DLL300 {
 
+class OpenSequence;
+
 inline constexpr uint32_t kCanReadBufferSize = 100000;
 // The address claim ran out of reads before the driver reported a claimed address.
 inline constexpr int32_t kAddressNotClaimed = static_cast<int32_t>(0xBFF6320A);
@@ -57,16 +59,16 @@ class CCAN : public CTableSession<CanIdentifierRules, CanBusStatistics, kCanRead
   void countFrame(const driver::RawFrameView& frame, bool inWindow) override;
 
  private:
-  int32_t openSubordinate(const std::string& interfaceName);
-  int32_t openDatabase(const std::string& interfaceName);
-  int32_t openBuiltIn(const std::string& interfaceName, uint64_t baudRate);
-  int32_t setInterfaceProperties(uint32_t termination);
-  int32_t setReceiveProperties();
+  // The steps of openCanSession (see OpenSequence for the failure rule).
+  void openSubordinate(OpenSequence& open, const std::string& interfaceName);
+  void openDatabase(OpenSequence& open, const std::string& interfaceName);
+  void openBuiltIn(OpenSequence& open, const std::string& interfaceName, uint64_t baudRate);
+  void setInterfaceProperties(OpenSequence& open, uint32_t termination);
+  // The result of the open: its status, or the address claim's.
+  int32_t setReceiveProperties(OpenSequence& open);
   // Reads the interface's CAN I/O mode through a temporary subordinate session into the settings.
   void readInterfaceIoMode(const std::string& interfaceName);
   int32_t claimJ1939Address();
-  // A failing step: kept as lastStatus and returned.
-  int32_t fail(int32_t status);
 
   CanFrameTimes frameTimes;   // poll thread; tables and bus time of the current window
   bool classicFrames = true;  // poll thread: every frame of this loop is 24 bytes

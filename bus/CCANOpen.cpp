@@ -2,6 +2,7 @@
 #include <string>
 
 #include "bus/CCAN.h"
+#include "bus/OpenSequence.h"
 #include "driver/Properties.h"
 #include "driver/Sessions.h"
 #include "driver/tarvix.h"
@@ -43,107 +44,73 @@ int32_t SetProperty(uint32_t reference, uint32_t id, T value) {
 
 }  // namespace
 
-int32_t CCAN::fail(int32_t status) {
-  recordStatus(status);
-  return status;
-}
-
 int32_t CCAN::openCanSession(const std::string& interfaceName, uint64_t baudRate,
                              uint32_t termination) {
   const SessionSettings& settings = connection->settings;
-  int32_t status;
+  OpenSequence open(*this);
   if (settings.runMode.Contains("SUBORDINATE")) {
-    status = openSubordinate(interfaceName);
+    openSubordinate(open, interfaceName);
   } else if (!settings.alias.Empty() && !settings.cluster.Empty()) {
-    status = openDatabase(interfaceName);
-    if (status >= 0) status = setInterfaceProperties(termination);
+    openDatabase(open, interfaceName);
+    setInterfaceProperties(open, termination);
   } else {
-    status = openBuiltIn(interfaceName, baudRate);
-    if (status >= 0) status = setInterfaceProperties(termination);
+    openBuiltIn(open, interfaceName, baudRate);
+    setInterfaceProperties(open, termination);
   }
-  if (status < 0) return status;
-  return setReceiveProperties();
+  return setReceiveProperties(open);
 }
 
-int32_t CCAN::openSubordinate(const std::string& interfaceName) {
+void CCAN::openSubordinate(OpenSequence& open, const std::string& interfaceName) {
   readInterfaceIoMode(interfaceName);
-  const int32_t status =
-      kxCreateSession(SubordinateDatabase(connection->settings), "", "", interfaceName.c_str(),
-                      driver::kModeReceiveStream, &driverSession);
-  return status < 0 ? fail(status) : status;
+  open.create(SubordinateDatabase(connection->settings), "", interfaceName);
 }
 
-int32_t CCAN::openDatabase(const std::string& interfaceName) {
+void CCAN::openDatabase(OpenSequence& open, const std::string& interfaceName) {
   SessionSettings& settings = connection->settings;
   readInterfaceIoMode(interfaceName);
-  const std::string alias = settings.alias.Get();
-  const std::string cluster = settings.cluster.Get();
-  int32_t status = kxCreateSession(alias.c_str(), cluster.c_str(), "", interfaceName.c_str(),
-                                   driver::kModeReceiveStream, &driverSession);
-  if (status < 0) return fail(status);
+  open.create(settings.alias.Get().c_str(), settings.cluster.Get().c_str(), interfaceName);
   // The database's values replace the host's.
   uint64_t baudRate = 0;
-  status = kxGetProperty(driverSession, driver::kPropBaudRate, sizeof baudRate, &baudRate);
-  if (status < 0) return fail(status);
-  settings.baudRate.store(baudRate);
+  if (open.get(driver::kPropBaudRate, baudRate)) settings.baudRate.store(baudRate);
   uint32_t canIoMode = 0;
-  status = kxGetProperty(driverSession, driver::kPropCanIoMode, sizeof canIoMode, &canIoMode);
-  if (status < 0) return fail(status);
-  settings.canIoMode.store(canIoMode);
-  (void)SetProperty(driverSession, driver::kPropIsoFdMode, settings.isoFdMode.load());
-  status = kxStop(driverSession, driver::kScopeInterfaceOnly);
-  return status < 0 ? fail(status) : status;
+  if (open.get(driver::kPropCanIoMode, canIoMode)) settings.canIoMode.store(canIoMode);
+  open.setIgnoringStatus(driver::kPropIsoFdMode, settings.isoFdMode.load());
+  open.stopInterface();
 }
 
-int32_t CCAN::openBuiltIn(const std::string& interfaceName, uint64_t baudRate) {
+void CCAN::openBuiltIn(OpenSequence& open, const std::string& interfaceName, uint64_t baudRate) {
   const SessionSettings& settings = connection->settings;
-  int32_t status = kxCreateSession(BuiltInDatabase(settings), "", "", interfaceName.c_str(),
-                                   driver::kModeReceiveStream, &driverSession);
-  if (status < 0) return fail(status);
-  status = kxStop(driverSession, driver::kScopeInterfaceOnly);
-  if (status < 0) return fail(status);
-  status = SetProperty(driverSession, driver::kPropBaudRate, baudRate);
-  if (status < 0) return fail(status);
+  open.create(BuiltInDatabase(settings), "", interfaceName);
+  open.stopInterface();
+  open.set(driver::kPropBaudRate, baudRate);
   if (settings.canIoMode.load() != 0) {
-    status = SetProperty(driverSession, driver::kPropCanFdBaudRate, settings.canFdBaudRate.load());
-    if (status < 0) return fail(status);
-    (void)SetProperty(driverSession, driver::kPropIsoFdMode, settings.isoFdMode.load());
+    open.set(driver::kPropCanFdBaudRate, settings.canFdBaudRate.load());
+    open.setIgnoringStatus(driver::kPropIsoFdMode, settings.isoFdMode.load());
   }
-  return status;
 }
 
-int32_t CCAN::setInterfaceProperties(uint32_t termination) {
+void CCAN::setInterfaceProperties(OpenSequence& open, uint32_t termination) {
   const SessionSettings& settings = connection->settings;
-  int32_t status = SetProperty(driverSession, driver::kPropTermination, termination);
-  if (status < 0) return fail(status);
-  status = SetProperty(driverSession, driver::kPropListenOnly, settings.listenOnly.load());
-  if (status < 0) return fail(status);
+  open.set(driver::kPropTermination, termination);
+  open.set(driver::kPropListenOnly, settings.listenOnly.load());
   // An interface whose transceiver is of type 1 keeps it, whatever the host asked for.
   uint32_t transceiver = 0;
-  (void)kxGetProperty(driverSession, driver::kPropTransceiverType, sizeof transceiver,
-                      &transceiver);
+  open.getIgnoringStatus(driver::kPropTransceiverType, transceiver);
   if (transceiver != kTransceiverKeptType) transceiver = settings.transceiverType.load();
-  status = SetProperty(driverSession, driver::kPropTransceiverType, transceiver);
-  if (status < 0) return fail(status);
-  status = kxStart(driverSession, driver::kScopeNormal);
-  return status < 0 ? fail(status) : status;
+  open.set(driver::kPropTransceiverType, transceiver);
+  open.start();
 }
 
-int32_t CCAN::setReceiveProperties() {
+int32_t CCAN::setReceiveProperties(OpenSequence& open) {
   const SessionSettings& settings = connection->settings;
-  int32_t status = 0;
-  if (!J1939(settings)) {
-    status = SetProperty(driverSession, driver::kPropEcho, settings.logTransmittedFrames.load());
-    if (status < 0) return fail(status);
-  }
+  if (!J1939(settings)) open.set(driver::kPropEcho, settings.logTransmittedFrames.load());
   const uint8_t busErrorFrames[2] = {settings.logBusErrorFrames.load(), settings.listenOnly.load()};
-  status = kxSetProperty(driverSession, driver::kPropBusErrorFrames, sizeof busErrorFrames,
-                         busErrorFrames);
-  if (status < 0) return fail(status);
-  if (J1939(settings) && settings.nodeAddress.load() < driver::kJ1939NullAddress) {
+  open.set(driver::kPropBusErrorFrames, busErrorFrames);
+  if (!open.failed() && J1939(settings) &&
+      settings.nodeAddress.load() < driver::kJ1939NullAddress) {
     return claimJ1939Address();
   }
-  return status;
+  return open.status();
 }
 
 void CCAN::readInterfaceIoMode(const std::string& interfaceName) {

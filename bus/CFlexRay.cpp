@@ -6,6 +6,7 @@
 
 #include "bus/CPollFlexRayDataThread.h"
 #include "bus/FlexRayStatistics.h"
+#include "bus/OpenSequence.h"
 #include "driver/Properties.h"
 #include "driver/Sessions.h"
 #include "driver/States.h"
@@ -13,15 +14,6 @@
 #include "hostlink/HostConnection.h"
 
 namespace nKV_DLL300 {
-
-namespace {
-
-template <class T>
-int32_t SetProperty(uint32_t reference, uint32_t id, T value) {
-  return kxSetProperty(reference, id, sizeof value, &value);
-}
-
-}  // namespace
 
 CFlexRay::CFlexRay(HostConnection* owner)
     : CTableSession(owner, driver::BusKind::kFlexRay, ReadPacing::kNearlyFullRule) {}
@@ -32,52 +24,34 @@ void CFlexRay::startPollThread() {
   startPollThreadWith(std::make_unique<CPollFlexRayDataThread>(this));
 }
 
-int32_t CFlexRay::fail(int32_t status) {
-  recordStatus(status);
-  return status;
-}
-
 int32_t CFlexRay::openFlexRaySession(const std::string& interfaceName, uint32_t termination) {
   const SessionSettings& settings = connection->settings;
-  int32_t status;
+  OpenSequence open(*this);
   if (settings.runMode.Contains("SUBORDINATE")) {
-    status = kxCreateSession(driver::kDatabaseSubordinate, "", "", interfaceName.c_str(),
-                             driver::kModeReceiveStream, &driverSession);
+    open.create(driver::kDatabaseSubordinate, "", interfaceName);
   } else {
-    status = openDatabase(interfaceName, termination);
+    openDatabase(open, interfaceName, termination);
   }
-  if (status < 0) return fail(status);
-  status = SetProperty(driverSession, driver::kPropEcho, settings.logTransmittedFrames.load());
-  return status < 0 ? fail(status) : status;
+  open.set(driver::kPropEcho, settings.logTransmittedFrames.load());
+  return open.status();
 }
 
-int32_t CFlexRay::openDatabase(const std::string& interfaceName, uint32_t termination) {
+void CFlexRay::openDatabase(OpenSequence& open, const std::string& interfaceName,
+                            uint32_t termination) {
   SessionSettings& settings = connection->settings;
-  const std::string alias = settings.alias.Get();
-  const std::string cluster = settings.cluster.Get();
-  int32_t status = kxCreateSession(alias.c_str(), cluster.c_str(), "", interfaceName.c_str(),
-                                   driver::kModeReceiveStream, &driverSession);
-  if (status < 0) return status;
+  open.create(settings.alias.Get().c_str(), settings.cluster.Get().c_str(), interfaceName);
   uint64_t baudRate = 0;
-  status = kxGetProperty(driverSession, driver::kPropBaudRate, sizeof baudRate, &baudRate);
-  if (status < 0) return status;
-  settings.baudRate.store(baudRate);
-  status = kxStop(driverSession, driver::kScopeInterfaceOnly);
-  if (status < 0) return status;
-  status = SetProperty(driverSession, driver::kPropFlexRayTermination, termination);
-  if (status < 0) return status;
-  status =
-      SetProperty(driverSession, driver::kPropFlexRayNullFrames, settings.showNullFrames.load());
-  if (status < 0) return status;
+  if (open.get(driver::kPropBaudRate, baudRate)) settings.baudRate.store(baudRate);
+  open.stopInterface();
+  open.set(driver::kPropFlexRayTermination, termination);
+  open.set(driver::kPropFlexRayNullFrames, settings.showNullFrames.load());
   const uint32_t keySlot = settings.keySlot.load();
-  if (keySlot != kNoKeySlot) {
-    status = SetProperty(driverSession, driver::kPropKeySlot, keySlot);
-    if (status < 0) return status;
-  }
-  status = kxStart(driverSession, driver::kScopeNormal);
-  if (status < 0) return status;
-  return kxWait(driverSession, driver::kWaitInterfaceCommunicating, 0,
-                kFlexRayCommunicatingWaitSeconds, nullptr);
+  if (keySlot != kNoKeySlot) open.set(driver::kPropKeySlot, keySlot);
+  open.start();
+  open.step([&] {
+    return kxWait(driverSession, driver::kWaitInterfaceCommunicating, 0,
+                  kFlexRayCommunicatingWaitSeconds, nullptr);
+  });
 }
 
 const char* CFlexRay::logHeaderLine() const {

@@ -10,6 +10,8 @@
 
 namespace nKV_DLL300 {
 
+class OpenSequence;
+
 inline constexpr uint32_t kFlexRayReadBufferSize = 100000;
 // The start waits this long for the interface to communicate.
 inline constexpr double kFlexRayCommunicatingWaitSeconds = 3.0;
@@ -44,11 +46,10 @@ class CFlexRay
   void countFrame(const driver::RawFrameView& frame, bool inWindow) override;
 
  private:
-  int32_t openDatabase(const std::string& interfaceName, uint32_t termination);
+  // The database branch of openFlexRaySession (see OpenSequence for the failure rule).
+  void openDatabase(OpenSequence& open, const std::string& interfaceName, uint32_t termination);
   // The three state reads, in order, until one fails (its status goes to lastStatus).
   void readStates();
-  // A failing step: kept as lastStatus and returned.
-  int32_t fail(int32_t status);
 };
 
 }  // namespace nKV_DLL300

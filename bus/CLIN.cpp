@@ -6,6 +6,7 @@
 
 #include "bus/CPollLINDataThread.h"
 #include "bus/LinStatistics.h"
+#include "bus/OpenSequence.h"
 #include "driver/Properties.h"
 #include "driver/Sessions.h"
 #include "driver/States.h"
@@ -18,11 +19,6 @@ namespace {
 
 constexpr uint32_t kLinFrameBytes = 24;
 
-template <class T>
-int32_t SetProperty(uint32_t reference, uint32_t id, T value) {
-  return kxSetProperty(reference, id, sizeof value, &value);
-}
-
 }  // namespace
 
 CLIN::CLIN(HostConnection* owner)
@@ -32,76 +28,44 @@ CLIN::~CLIN() { endForDestruction(); }
 
 void CLIN::startPollThread() { startPollThreadWith(std::make_unique<CPollLINDataThread>(this)); }
 
-int32_t CLIN::fail(int32_t status) {
-  recordStatus(status);
-  return status;
-}
-
 int32_t CLIN::openLinSession(const std::string& interfaceName, uint64_t baudRate) {
   const SessionSettings& settings = connection->settings;
-  int32_t status;
+  OpenSequence open(*this);
   if (settings.runMode.Contains("SUBORDINATE")) {
-    status = openSubordinate(interfaceName);
+    open.create(driver::kDatabaseSubordinate, "", interfaceName);
   } else if (!settings.alias.Empty() && !settings.cluster.Empty()) {
-    status = openDatabase(interfaceName);
+    openDatabase(open, interfaceName);
   } else {
-    status = openBuiltIn(interfaceName, baudRate);
+    openBuiltIn(open, interfaceName, baudRate);
   }
-  if (status < 0) return status;
-  return setReceiveProperties();
+  setReceiveProperties(open);
+  return open.status();
 }
 
-int32_t CLIN::openSubordinate(const std::string& interfaceName) {
-  const int32_t status =
-      kxCreateSession(driver::kDatabaseSubordinate, "", "", interfaceName.c_str(),
-                      driver::kModeReceiveStream, &driverSession);
-  return status < 0 ? fail(status) : status;
-}
-
-int32_t CLIN::openDatabase(const std::string& interfaceName) {
+void CLIN::openDatabase(OpenSequence& open, const std::string& interfaceName) {
   SessionSettings& settings = connection->settings;
-  const std::string alias = settings.alias.Get();
-  const std::string cluster = settings.cluster.Get();
-  int32_t status = kxCreateSession(alias.c_str(), cluster.c_str(), "", interfaceName.c_str(),
-                                   driver::kModeReceiveStream, &driverSession);
-  if (status < 0) return fail(status);
+  open.create(settings.alias.Get().c_str(), settings.cluster.Get().c_str(), interfaceName);
   // The database's baud rate replaces the host's.
   uint64_t baudRate = 0;
-  status = kxGetProperty(driverSession, driver::kPropBaudRate, sizeof baudRate, &baudRate);
-  if (status < 0) return fail(status);
-  settings.baudRate.store(baudRate);
-  status = kxStop(driverSession, driver::kScopeInterfaceOnly);
-  if (status < 0) return fail(status);
-  status = kxStart(driverSession, driver::kScopeNormal);
-  return status < 0 ? fail(status) : status;
+  if (open.get(driver::kPropBaudRate, baudRate)) settings.baudRate.store(baudRate);
+  open.stopInterface();
+  open.start();
 }
 
-int32_t CLIN::openBuiltIn(const std::string& interfaceName, uint64_t baudRate) {
-  int32_t status = kxCreateSession(driver::kDatabaseMemory, "", "", interfaceName.c_str(),
-                                   driver::kModeReceiveStream, &driverSession);
-  if (status < 0) return fail(status);
-  status = kxStop(driverSession, driver::kScopeInterfaceOnly);
-  if (status < 0) return fail(status);
-  status = SetProperty(driverSession, driver::kPropBaudRate, baudRate);
-  if (status < 0) return fail(status);
-  status = kxStart(driverSession, driver::kScopeNormal);
-  return status < 0 ? fail(status) : status;
+void CLIN::openBuiltIn(OpenSequence& open, const std::string& interfaceName, uint64_t baudRate) {
+  open.create(driver::kDatabaseMemory, "", interfaceName);
+  open.stopInterface();
+  open.set(driver::kPropBaudRate, baudRate);
+  open.start();
 }
 
-int32_t CLIN::setReceiveProperties() {
+void CLIN::setReceiveProperties(OpenSequence& open) {
   const SessionSettings& settings = connection->settings;
-  int32_t status =
-      SetProperty(driverSession, driver::kPropEcho, settings.logTransmittedFrames.load());
-  if (status < 0) return fail(status);
+  open.set(driver::kPropEcho, settings.logTransmittedFrames.load());
   const uint8_t busErrorFrames[2] = {settings.logBusErrorFrames.load(), settings.listenOnly.load()};
-  status = kxSetProperty(driverSession, driver::kPropBusErrorFrames, sizeof busErrorFrames,
-                         busErrorFrames);
-  if (status < 0) return fail(status);
-  status = SetProperty(driverSession, driver::kPropLinNoResponseFrames,
-                       settings.noResponseFrames.load());
-  if (status < 0) return fail(status);
-  status = SetProperty(driverSession, driver::kPropLinChecksumFlag, settings.logChecksum.load());
-  return status < 0 ? fail(status) : status;
+  open.set(driver::kPropBusErrorFrames, busErrorFrames);
+  open.set(driver::kPropLinNoResponseFrames, settings.noResponseFrames.load());
+  open.set(driver::kPropLinChecksumFlag, settings.logChecksum.load());
 }
 
 const char* CLIN::logHeaderLine() const {

@@ -10,6 +10,8 @@
 
 namespace nKV_DLL300 {
 
+class OpenSequence;
+
 // Room for 200 LIN frames of 24 bytes.
 inline constexpr uint32_t kLinReadBufferSize = 4800;
 
@@ -41,12 +43,10 @@ class CLIN : public CTableSession<LinIdentifierRules, LinBusStatistics, kLinRead
   void countFrame(const driver::RawFrameView& frame, bool inWindow) override;
 
  private:
-  int32_t openSubordinate(const std::string& interfaceName);
-  int32_t openDatabase(const std::string& interfaceName);
-  int32_t openBuiltIn(const std::string& interfaceName, uint64_t baudRate);
-  int32_t setReceiveProperties();
-  // A failing step: kept as lastStatus and returned.
-  int32_t fail(int32_t status);
+  // The steps of openLinSession (see OpenSequence for the failure rule).
+  void openDatabase(OpenSequence& open, const std::string& interfaceName);
+  void openBuiltIn(OpenSequence& open, const std::string& interfaceName, uint64_t baudRate);
+  void setReceiveProperties(OpenSequence& open);
 };
 
 }  // namespace nKV_DLL300
