@@ -52,17 +52,17 @@ void CCAN::countFrame(const driver::RawFrameView& frame, bool inWindow) {
 
 void CCAN::reportBusState(uint64_t elapsedMilliseconds) {
   beginReport();
-  prepareToSend(statistics, frameTimes, elapsedMilliseconds);
+  PrepareToSend(statistics, frameTimes, elapsedMilliseconds);
   uint32_t state = 0;
   uint32_t faultCode = 0;
   const int32_t status = kxReadState(driverSession, kCanStateId, sizeof state, &state, &faultCode);
   if (status == 0) {
-    decodeState(statistics, state, faultCode);
+    DecodeState(statistics, state, faultCode);
   } else {
     recordStatus(status);  // the state fields keep their values
   }
   sendStatistics();
-  if (closeWindowIfDue()) endWindow(statistics, frameTimes);
+  if (closeWindowIfDue()) EndWindow(statistics, frameTimes);
 }
 
 }  // namespace nKV_DLL300

@@ -38,7 +38,7 @@ class CCAN : public CTableSession<CanIdentifierRules, CanBusStatistics, kCanRead
   // Stops the host's transmission first, whenever the session ends (terminate, heartbeat
   // loss, closed host), then the session itself.
   int32_t stop() override {
-    transmit.StopIfActive();
+    transmit.stopIfActive();
     return CBusSystem::stop();
   }
   void startPollThread() override;

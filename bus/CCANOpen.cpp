@@ -48,9 +48,9 @@ int32_t CCAN::openCanSession(const std::string& interfaceName, uint64_t baudRate
                              uint32_t termination) {
   const SessionSettings& settings = connection->settings;
   OpenSequence open(*this);
-  if (settings.runMode.Contains("SUBORDINATE")) {
+  if (settings.runMode.contains("SUBORDINATE")) {
     openSubordinate(open, interfaceName);
-  } else if (!settings.alias.Empty() && !settings.cluster.Empty()) {
+  } else if (!settings.alias.empty() && !settings.cluster.empty()) {
     openDatabase(open, interfaceName);
     setInterfaceProperties(open, termination);
   } else {
@@ -68,7 +68,7 @@ void CCAN::openSubordinate(OpenSequence& open, const std::string& interfaceName)
 void CCAN::openDatabase(OpenSequence& open, const std::string& interfaceName) {
   SessionSettings& settings = connection->settings;
   readInterfaceIoMode(interfaceName);
-  open.create(settings.alias.Get().c_str(), settings.cluster.Get().c_str(), interfaceName);
+  open.create(settings.alias.get().c_str(), settings.cluster.get().c_str(), interfaceName);
   // The database's values replace the host's.
   uint64_t baudRate = 0;
   if (open.get(driver::kPropBaudRate, baudRate)) settings.baudRate.store(baudRate);

@@ -27,7 +27,7 @@ void CFlexRay::startPollThread() {
 int32_t CFlexRay::openFlexRaySession(const std::string& interfaceName, uint32_t termination) {
   const SessionSettings& settings = connection->settings;
   OpenSequence open(*this);
-  if (settings.runMode.Contains("SUBORDINATE")) {
+  if (settings.runMode.contains("SUBORDINATE")) {
     open.create(driver::kDatabaseSubordinate, "", interfaceName);
   } else {
     openDatabase(open, interfaceName, termination);
@@ -39,7 +39,7 @@ int32_t CFlexRay::openFlexRaySession(const std::string& interfaceName, uint32_t 
 void CFlexRay::openDatabase(OpenSequence& open, const std::string& interfaceName,
                             uint32_t termination) {
   SessionSettings& settings = connection->settings;
-  open.create(settings.alias.Get().c_str(), settings.cluster.Get().c_str(), interfaceName);
+  open.create(settings.alias.get().c_str(), settings.cluster.get().c_str(), interfaceName);
   uint64_t baudRate = 0;
   if (open.get(driver::kPropBaudRate, baudRate)) settings.baudRate.store(baudRate);
   open.stopInterface();
@@ -77,25 +77,25 @@ void CFlexRay::readStates() {
   int32_t status =
       kxReadState(driverSession, driver::kStateFlexRay, sizeof state, &state, &faultCode);
   if (status != 0) return recordStatus(status);
-  decodeState(statistics, state, faultCode);
+  DecodeState(statistics, state, faultCode);
   uint32_t words[6] = {};
   status =
       kxReadState(driverSession, driver::kStateFlexRayCounters, sizeof words, words, &faultCode);
   if (status != 0) return recordStatus(status);
-  storeStatisticsWords(statistics, words, faultCode);
+  StoreStatisticsWords(statistics, words, faultCode);
   uint32_t channels = 0;
   status = kxReadState(driverSession, driver::kStateFlexRayChannels, sizeof channels, &channels,
                        &faultCode);
   if (status != 0) return recordStatus(status);
-  storeLastStateWord(statistics, channels, faultCode);
+  StoreLastStateWord(statistics, channels, faultCode);
 }
 
 void CFlexRay::reportBusState(uint64_t elapsedMilliseconds) {
   beginReport();
-  prepareToSend(statistics, elapsedMilliseconds);
+  PrepareToSend(statistics, elapsedMilliseconds);
   readStates();  // a failed read leaves its fields and those of the reads after it unchanged
   sendStatistics();
-  if (closeWindowIfDue()) endWindow(statistics);
+  if (closeWindowIfDue()) EndWindow(statistics);
 }
 
 static_assert(driver::kStateFlexRayCountersSize == sizeof(uint32_t[6]));

@@ -31,9 +31,9 @@ void CLIN::startPollThread() { startPollThreadWith(std::make_unique<CPollLINData
 int32_t CLIN::openLinSession(const std::string& interfaceName, uint64_t baudRate) {
   const SessionSettings& settings = connection->settings;
   OpenSequence open(*this);
-  if (settings.runMode.Contains("SUBORDINATE")) {
+  if (settings.runMode.contains("SUBORDINATE")) {
     open.create(driver::kDatabaseSubordinate, "", interfaceName);
-  } else if (!settings.alias.Empty() && !settings.cluster.Empty()) {
+  } else if (!settings.alias.empty() && !settings.cluster.empty()) {
     openDatabase(open, interfaceName);
   } else {
     openBuiltIn(open, interfaceName, baudRate);
@@ -44,7 +44,7 @@ int32_t CLIN::openLinSession(const std::string& interfaceName, uint64_t baudRate
 
 void CLIN::openDatabase(OpenSequence& open, const std::string& interfaceName) {
   SessionSettings& settings = connection->settings;
-  open.create(settings.alias.Get().c_str(), settings.cluster.Get().c_str(), interfaceName);
+  open.create(settings.alias.get().c_str(), settings.cluster.get().c_str(), interfaceName);
   // The database's baud rate replaces the host's.
   uint64_t baudRate = 0;
   if (open.get(driver::kPropBaudRate, baudRate)) settings.baudRate.store(baudRate);
@@ -83,18 +83,18 @@ void CLIN::countFrame(const driver::RawFrameView& frame, bool inWindow) {
 
 void CLIN::reportBusState(uint64_t elapsedMilliseconds) {
   beginReport();
-  prepareToSend(statistics, elapsedMilliseconds);
+  PrepareToSend(statistics, elapsedMilliseconds);
   uint64_t state = 0;
   uint32_t faultCode = 0;
   const int32_t status =
       kxReadState(driverSession, driver::kStateLin, driver::kStateLinSize, &state, &faultCode);
   if (status == 0) {
-    decodeState(statistics, state, faultCode);
+    DecodeState(statistics, state, faultCode);
   } else {
     recordStatus(status);  // the state fields keep their values
   }
   sendStatistics();
-  if (closeWindowIfDue()) endWindow(statistics);
+  if (closeWindowIfDue()) EndWindow(statistics);
 }
 
 static_assert(driver::kStateLinSize == sizeof(uint64_t));

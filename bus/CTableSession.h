@@ -107,7 +107,7 @@ class CTableSession : public CBusSystem {
   static constexpr uint32_t kMaxBurst = 9;
 
   bool beginLoop() {
-    table = Table::Create(connection->settings.dataLogIdsMax.load(), tableResource);
+    table = Table::create(connection->settings.dataLogIdsMax.load(), tableResource);
     if (!table) return false;
     idCount.store(0);
     statistics = Statistics{};

@@ -38,7 +38,7 @@ void countFrame(CanBusStatistics& s, CanFrameTimes& times, const driver::RawFram
   times.addFrame(extended, frame.length);
 }
 
-void prepareToSend(CanBusStatistics& s, const CanFrameTimes& times, uint64_t elapsedMs) {
+void PrepareToSend(CanBusStatistics& s, const CanFrameTimes& times, uint64_t elapsedMs) {
   s.busLoad = times.busLoad(elapsedMs);
   if (s.busLoad > s.peakBusLoad) s.peakBusLoad = s.busLoad;
   s.standardFramesPerSecond = FramesPerSecond(s.standardFramesPerSecond, elapsedMs);
@@ -47,7 +47,7 @@ void prepareToSend(CanBusStatistics& s, const CanFrameTimes& times, uint64_t ela
   s.remoteFramesPerSecond = FramesPerSecond(s.remoteFramesPerSecond, elapsedMs);
 }
 
-void decodeState(CanBusStatistics& s, uint32_t state, uint32_t faultCode) {
+void DecodeState(CanBusStatistics& s, uint32_t state, uint32_t faultCode) {
   s.faultCode = faultCode;
   s.stateBits0to3 = state & 0xF;
   s.stateBits8to11 = (state >> 8) & 0xF;
@@ -57,7 +57,7 @@ void decodeState(CanBusStatistics& s, uint32_t state, uint32_t faultCode) {
   s.stateBit5 = (state >> 5) & 1;
 }
 
-void endWindow(CanBusStatistics& s, CanFrameTimes& times) {
+void EndWindow(CanBusStatistics& s, CanFrameTimes& times) {
   times.clearBusTime();
   s.standardFramesPerSecond = s.extendedFramesPerSecond = 0;
   s.remoteFramesPerSecond = s.errorFramesPerSecond = 0;

@@ -21,12 +21,12 @@ void countFrame(CanBusStatistics& statistics, CanFrameTimes& times,
 
 // Before a send, over the elapsed milliseconds since the last one: busLoad (and peakBusLoad when it
 // is exceeded) from the bus time, and the four window counts turned into frames per second.
-void prepareToSend(CanBusStatistics& statistics, const CanFrameTimes& times, uint64_t elapsedMs);
+void PrepareToSend(CanBusStatistics& statistics, const CanFrameTimes& times, uint64_t elapsedMs);
 
 // The driver's CAN state word (read with kCanStateId) and its fault code.
-void decodeState(CanBusStatistics& statistics, uint32_t state, uint32_t faultCode);
+void DecodeState(CanBusStatistics& statistics, uint32_t state, uint32_t faultCode);
 
 // When the window has passed: bus time, busLoad and the four PerSecond fields start from 0.
-void endWindow(CanBusStatistics& statistics, CanFrameTimes& times);
+void EndWindow(CanBusStatistics& statistics, CanFrameTimes& times);
 
 }  // namespace nKV_DLL300

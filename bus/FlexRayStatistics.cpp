@@ -18,12 +18,12 @@ void countFrame(FlexRayBusStatistics& s, uint8_t type, bool inWindow) {
   }
 }
 
-void prepareToSend(FlexRayBusStatistics& s, uint64_t elapsedMs) {
+void PrepareToSend(FlexRayBusStatistics& s, uint64_t elapsedMs) {
   s.dataFramesPerSecond = FramesPerSecond(s.dataFramesPerSecond, elapsedMs);
   s.nullFramesPerSecond = FramesPerSecond(s.nullFramesPerSecond, elapsedMs);
 }
 
-void decodeState(FlexRayBusStatistics& s, uint32_t state, uint32_t faultCode) {
+void DecodeState(FlexRayBusStatistics& s, uint32_t state, uint32_t faultCode) {
   s.faultCode = faultCode;
   s.stateBits0to3 = state & 0xF;
   s.stateBits4to7 = (state >> 4) & 0xF;
@@ -32,16 +32,16 @@ void decodeState(FlexRayBusStatistics& s, uint32_t state, uint32_t faultCode) {
   s.stateBit14 = (state >> 14) & 1;
 }
 
-void storeStatisticsWords(FlexRayBusStatistics& s, const uint32_t (&words)[6], uint32_t faultCode) {
+void StoreStatisticsWords(FlexRayBusStatistics& s, const uint32_t (&words)[6], uint32_t faultCode) {
   s.faultCode = faultCode;
   std::copy(std::begin(words), std::end(words), s.statisticsWords);
 }
 
-void storeLastStateWord(FlexRayBusStatistics& s, uint32_t word, uint32_t faultCode) {
+void StoreLastStateWord(FlexRayBusStatistics& s, uint32_t word, uint32_t faultCode) {
   s.faultCode = faultCode;
   s.lastStateWord = word;
 }
 
-void endWindow(FlexRayBusStatistics& s) { s.dataFramesPerSecond = s.nullFramesPerSecond = 0; }
+void EndWindow(FlexRayBusStatistics& s) { s.dataFramesPerSecond = s.nullFramesPerSecond = 0; }
 
 }  // namespace nKV_DLL300

@@ -16,14 +16,14 @@ inline constexpr uint32_t kFlexRayLastStateId = 0x00130004;        // one 32-bit
 void countFrame(FlexRayBusStatistics& statistics, uint8_t type, bool inWindow);
 
 // The two window counts turned into frames per second over elapsedMs.
-void prepareToSend(FlexRayBusStatistics& statistics, uint64_t elapsedMs);
+void PrepareToSend(FlexRayBusStatistics& statistics, uint64_t elapsedMs);
 
 // The three state reads, each with its fault code.
-void decodeState(FlexRayBusStatistics& statistics, uint32_t state, uint32_t faultCode);
-void storeStatisticsWords(FlexRayBusStatistics& statistics, const uint32_t (&words)[6],
+void DecodeState(FlexRayBusStatistics& statistics, uint32_t state, uint32_t faultCode);
+void StoreStatisticsWords(FlexRayBusStatistics& statistics, const uint32_t (&words)[6],
                           uint32_t faultCode);
-void storeLastStateWord(FlexRayBusStatistics& statistics, uint32_t word, uint32_t faultCode);
+void StoreLastStateWord(FlexRayBusStatistics& statistics, uint32_t word, uint32_t faultCode);
 
-void endWindow(FlexRayBusStatistics& statistics);
+void EndWindow(FlexRayBusStatistics& statistics);
 
 }  // namespace nKV_DLL300

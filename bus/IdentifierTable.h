@@ -40,7 +40,7 @@ struct TableSettings {
 // Rules is CanIdentifierRules, LinIdentifierRules or FlexRayIdentifierRules.
 //
 // A poll loop uses it like this (CAN shown):
-//   auto table = CanIdentifierTable::Create(settings.dataLogIdsMax, tableResource);
+//   auto table = CanIdentifierTable::create(settings.dataLogIdsMax, tableResource);
 //   if (!table) { recordStatus(kStatusPayloadNotStored); idle until stopped; }
 //   per batch:  recordStatus(table->updateIdentifierTable(buffer, bytesRead, {logTx, logErr},
 //                   [&](const driver::RawFrameView& f) { if (txTimeStatistic > 0) countFrame(...);
@@ -59,7 +59,7 @@ class IdentifierTable {
   // A table for min(dataLogIdsMax, 65535) entries, all zero. Returns null when its storage cannot
   // be obtained; the poll loop then stores kStatusPayloadNotStored and must not run without it.
   // sendBufferSize is the largest message payload of CAN and FlexRay (at least one whole record).
-  static std::unique_ptr<IdentifierTable> Create(
+  static std::unique_ptr<IdentifierTable> create(
       uint32_t dataLogIdsMax,
       std::pmr::memory_resource* resource = std::pmr::get_default_resource(),
       uint32_t sendBufferSize = kSendBufferSize) {

@@ -25,13 +25,13 @@ void countFrame(LinBusStatistics& s, uint8_t type, bool inWindow) {
   if (inWindow) ++*perSecond;
 }
 
-void prepareToSend(LinBusStatistics& s, uint64_t elapsedMs) {
+void PrepareToSend(LinBusStatistics& s, uint64_t elapsedMs) {
   s.dataFramesPerSecond = FramesPerSecond(s.dataFramesPerSecond, elapsedMs);
   s.errorFramesPerSecond = FramesPerSecond(s.errorFramesPerSecond, elapsedMs);
   s.noResponseFramesPerSecond = FramesPerSecond(s.noResponseFramesPerSecond, elapsedMs);
 }
 
-void decodeState(LinBusStatistics& s, uint64_t state, uint32_t faultCode) {
+void DecodeState(LinBusStatistics& s, uint64_t state, uint32_t faultCode) {
   const uint32_t w = static_cast<uint32_t>(state);
   s.faultCode = faultCode;
   s.stateBit1 = (w >> 1) & 1;
@@ -44,7 +44,7 @@ void decodeState(LinBusStatistics& s, uint64_t state, uint32_t faultCode) {
   s.stateBits0to7 = w & 0xFF;
 }
 
-void endWindow(LinBusStatistics& s) {
+void EndWindow(LinBusStatistics& s) {
   s.dataFramesPerSecond = s.errorFramesPerSecond = s.noResponseFramesPerSecond = 0;
 }
 

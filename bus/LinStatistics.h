@@ -14,11 +14,11 @@ inline constexpr uint32_t kLinStateId = 0x00130030;  // 8-byte state, the low 32
 void countFrame(LinBusStatistics& statistics, uint8_t type, bool inWindow);
 
 // The three window counts turned into frames per second over elapsedMs.
-void prepareToSend(LinBusStatistics& statistics, uint64_t elapsedMs);
+void PrepareToSend(LinBusStatistics& statistics, uint64_t elapsedMs);
 
 // The driver's LIN state (read with kLinStateId) and its fault code; the high 32 bits are unused.
-void decodeState(LinBusStatistics& statistics, uint64_t state, uint32_t faultCode);
+void DecodeState(LinBusStatistics& statistics, uint64_t state, uint32_t faultCode);
 
-void endWindow(LinBusStatistics& statistics);
+void EndWindow(LinBusStatistics& statistics);
 
 }  // namespace nKV_DLL300

@@ -15,19 +15,19 @@ class GuardedText {
   GuardedText(const GuardedText&) = delete;
   GuardedText& operator=(const GuardedText&) = delete;
 
-  void Set(std::string_view text) {
+  void set(std::string_view text) {
     std::lock_guard<std::mutex> lock(mutex_);
     text_.assign(text.data(), text.size());
   }
-  std::string Get() const {
+  std::string get() const {
     std::lock_guard<std::mutex> lock(mutex_);
     return text_;
   }
-  bool Empty() const {
+  bool empty() const {
     std::lock_guard<std::mutex> lock(mutex_);
     return text_.empty();
   }
-  bool Contains(std::string_view part) const {
+  bool contains(std::string_view part) const {
     std::lock_guard<std::mutex> lock(mutex_);
     return text_.find(part) != std::string::npos;
   }

@@ -59,7 +59,7 @@ void RestartHeartbeat(HostConnection& connection) { connection.heartbeatWatch.Re
 
 void EndSession(HostConnection& connection) {
   if (!connection.session) return;
-  (void)connection.session.get_deleter().Stop(connection.session.get());
+  (void)connection.session.get_deleter().stop(connection.session.get());
   connection.session.reset();
 }
 

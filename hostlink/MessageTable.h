@@ -77,11 +77,11 @@ class MessageTable {
   }
 
   // The identifier of `name`, 0 when the table does not hold it.
-  int32_t Find(std::string_view name) const {
+  int32_t find(std::string_view name) const {
     auto found = names_.find(name);
     return found == names_.end() ? 0 : found->second;
   }
-  size_t Size() const { return names_.size(); }
+  size_t size() const { return names_.size(); }
 
  private:
   std::map<std::string, int32_t, std::less<>> names_;

@@ -20,7 +20,7 @@ class SessionDeleter {
         delete_([](CBusSystem* session) { delete static_cast<Session*>(session); }) {}
 
   // CBusSystem::stop of `session`; its status.
-  int32_t Stop(CBusSystem* session) const { return stop_(session); }
+  int32_t stop(CBusSystem* session) const { return stop_(session); }
   void operator()(CBusSystem* session) const { delete_(session); }
 
  private:

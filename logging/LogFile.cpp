@@ -16,7 +16,7 @@ namespace {
 // The path of the file, or "" after a reported naming or directory failure.
 std::string NameLogFile(SessionLog& log, uint8_t logType) {
   try {
-    return LogFilePath(log.session().connection->settings.logFileName.Get(), logType);
+    return LogFilePath(log.session().connection->settings.logFileName.get(), logType);
   } catch (const std::exception&) {
     log.fail(kLogOpenFailed);
     return {};

@@ -67,7 +67,7 @@ MeasurementLibrary::~MeasurementLibrary() {
   if (module_ != nullptr) (void)platform::FreeLibrary(module_);
 }
 
-void MeasurementLibrary::Locate() {
+void MeasurementLibrary::locate() {
   std::lock_guard<std::mutex> guard(lock_);
   if (platformCode_ < 0) platformCode_ = DetectPlatform();
   if (platformCode_ == kVorPlatformRealTime) {
@@ -79,7 +79,7 @@ void MeasurementLibrary::Locate() {
   path_ += kLibraryFile;
 }
 
-void MeasurementLibrary::Load() {
+void MeasurementLibrary::load() {
   std::lock_guard<std::mutex> guard(lock_);
   if (module_ != nullptr) return;
   // Not located (a program that never ran the module's start-up): nothing to load.
@@ -87,7 +87,7 @@ void MeasurementLibrary::Load() {
   module_ = platform::LoadLibraryA(path_.c_str());
   if (module_ == nullptr) throw vorException{kVorLibraryNotLoaded};
   try {
-    ResolveEntryPoints();
+    resolveEntryPoints();
   } catch (const vorException&) {
     (void)platform::FreeLibrary(module_);
     module_ = nullptr;
@@ -96,7 +96,7 @@ void MeasurementLibrary::Load() {
   loaded_.store(true, std::memory_order_release);
 }
 
-void MeasurementLibrary::Unload() {
+void MeasurementLibrary::unload() {
   std::lock_guard<std::mutex> guard(lock_);
   if (module_ == nullptr) return;
   if (!platform::FreeLibrary(module_)) throw vorException{kVorLibraryNotUnloaded};
@@ -115,7 +115,7 @@ int32_t MeasurementLibrary::platformCode() const {
 }
 
 template <typename Fn>
-Fn MeasurementLibrary::Resolve(const char* name) const {
+Fn MeasurementLibrary::resolve(const char* name) const {
   const platform::FARPROC address = platform::GetProcAddress(module_, name);
   if (address == nullptr) throw vorException{kVorLibraryNotLoaded};
   return reinterpret_cast<Fn>(address);
@@ -123,48 +123,48 @@ Fn MeasurementLibrary::Resolve(const char* name) const {
 
 // Only the entry points the logging calls are resolved; the library is told the platform as
 // soon as it can be.
-void MeasurementLibrary::ResolveEntryPoints() {
-  table_.setOS = Resolve<VorSetOSFn>("VorSetOS");
+void MeasurementLibrary::resolveEntryPoints() {
+  table_.setOS = resolve<VorSetOSFn>("VorSetOS");
   (void)table_.setOS(platformCode_);
-  table_.fileOpenExA = Resolve<VorFileOpenExAFn>("VorFileOpenExA");
-  table_.objCreateA = Resolve<VorObjCreateAFn>("VorObjCreateA");
-  table_.propSetA = Resolve<VorPropSetAFn>("VorPropSetA");
-  table_.objRawSet = Resolve<VorObjRawSetFn>("VorObjRawSet");
-  table_.fileBufFlush = Resolve<VorFileBufFlushFn>("VorFileBufFlush");
-  table_.fileClose = Resolve<VorFileCloseFn>("VorFileClose");
+  table_.fileOpenExA = resolve<VorFileOpenExAFn>("VorFileOpenExA");
+  table_.objCreateA = resolve<VorObjCreateAFn>("VorObjCreateA");
+  table_.propSetA = resolve<VorPropSetAFn>("VorPropSetA");
+  table_.objRawSet = resolve<VorObjRawSetFn>("VorObjRawSet");
+  table_.fileBufFlush = resolve<VorFileBufFlushFn>("VorFileBufFlush");
+  table_.fileClose = resolve<VorFileCloseFn>("VorFileClose");
 }
 
-const MeasurementLibrary::EntryPoints& MeasurementLibrary::Table() const {
+const MeasurementLibrary::EntryPoints& MeasurementLibrary::table() const {
   if (!loaded_.load(std::memory_order_acquire)) throw vorException{kVorLibraryNotLoaded};
   return table_;
 }
 
 int32_t MeasurementLibrary::FileOpenExA(const char* path, int32_t openMode, int32_t access,
                                         int32_t revision, int32_t* fileHandle) const {
-  return Table().fileOpenExA(path, openMode, access, revision, fileHandle);
+  return table().fileOpenExA(path, openMode, access, revision, fileHandle);
 }
 
 int32_t MeasurementLibrary::ObjCreateA(const char* objectPath, int32_t fileHandle,
                                        int32_t* objectHandle) const {
-  return Table().objCreateA(objectPath, fileHandle, objectHandle);
+  return table().objCreateA(objectPath, fileHandle, objectHandle);
 }
 
 int32_t MeasurementLibrary::PropSetA(const char* name, int32_t dataType, const void* value,
                                      int32_t fileHandle, int32_t objectHandle) const {
-  return Table().propSetA(name, dataType, value, fileHandle, objectHandle);
+  return table().propSetA(name, dataType, value, fileHandle, objectHandle);
 }
 
 int32_t MeasurementLibrary::ObjRawSet(int32_t dataType, uint32_t byteCount, const void* bytes,
                                       int32_t fileHandle, int32_t objectHandle) const {
-  return Table().objRawSet(dataType, byteCount, bytes, fileHandle, objectHandle);
+  return table().objRawSet(dataType, byteCount, bytes, fileHandle, objectHandle);
 }
 
 int32_t MeasurementLibrary::FileBufFlush(int32_t scope, int32_t fileHandle) const {
-  return Table().fileBufFlush(scope, fileHandle);
+  return table().fileBufFlush(scope, fileHandle);
 }
 
 int32_t MeasurementLibrary::FileClose(int32_t fileHandle) const {
-  return Table().fileClose(fileHandle);
+  return table().fileClose(fileHandle);
 }
 
 // Never destroyed: the module unloads the library explicitly after its service has stopped, and
@@ -174,8 +174,8 @@ MeasurementLibrary& TheMeasurementLibrary() {
   return *library;
 }
 
-void LocateMeasurementLibrary() { TheMeasurementLibrary().Locate(); }
-void LoadMeasurementLibrary() { TheMeasurementLibrary().Load(); }
-void UnloadMeasurementLibrary() { TheMeasurementLibrary().Unload(); }
+void LocateMeasurementLibrary() { TheMeasurementLibrary().locate(); }
+void LoadMeasurementLibrary() { TheMeasurementLibrary().load(); }
+void UnloadMeasurementLibrary() { TheMeasurementLibrary().unload(); }
 
 }  // namespace nKV_DLL300

@@ -12,15 +12,15 @@
 
 namespace nKV_DLL300 {
 
-// The library is not linked: Locate names the file once, Load opens it on the first use and
-// resolves the entry points the logging calls, Unload frees it. Every entry-point wrapper throws
+// The library is not linked: locate names the file once, load opens it on the first use and
+// resolves the entry points the logging calls, unload frees it. Every entry-point wrapper throws
 // vorException{kVorLibraryNotLoaded} while the library is not loaded; otherwise it returns the
 // entry point's own result, which the logging does not examine.
 //
-// Threads: Locate, Load and Unload take the library lock, so sessions opening their first
+// Threads: locate, load and unload take the library lock, so sessions opening their first
 // measurement-data logs at once load the library once. The entry points are called without the
 // lock from any session's poll thread (the library accepts concurrent calls on different files);
-// Unload must not run while a session still calls them, which the module ensures by unloading only
+// unload must not run while a session still calls them, which the module ensures by unloading only
 // after its service has stopped every session.
 class MeasurementLibrary {
  public:
@@ -36,15 +36,15 @@ class MeasurementLibrary {
   // followed by "\vora\vora.dll", or "C:\Program Files\Quovera\Shared\vora\vora.dll" when the key
   // or value is missing or cannot be read. A library already loaded stays loaded; the new path
   // is used by the next load after an unload.
-  void Locate();
+  void locate();
   // Loads the library and resolves its entry points, then calls VorSetOS with the platform code;
   // does nothing when it is loaded already. Throws vorException{kVorLibraryNotLoaded} when the
   // file cannot be loaded or an entry point is missing; the library is then unloaded again, so
   // the next call tries anew.
-  void Load();
+  void load();
   // Frees a loaded library; throws vorException{kVorLibraryNotUnloaded} when that fails. Nothing
   // to do when it is not loaded.
-  void Unload();
+  void unload();
 
   std::string path() const;
   int32_t platformCode() const;
@@ -73,11 +73,11 @@ class MeasurementLibrary {
     VorFileCloseFn fileClose = nullptr;
   };
 
-  void ResolveEntryPoints();  // lock_ held
+  void resolveEntryPoints();  // lock_ held
   template <typename Fn>
-  Fn Resolve(const char* name) const;  // lock_ held
+  Fn resolve(const char* name) const;  // lock_ held
   // Throws unless loaded; the table then holds every entry point.
-  const EntryPoints& Table() const;
+  const EntryPoints& table() const;
 
   mutable std::mutex lock_;    // the library lock: guards loading, unloading and locating
   std::string path_;           // lock_

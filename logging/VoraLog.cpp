@@ -28,7 +28,7 @@ static_assert(kPropertyType == 3 && kRawType == 5 && kFlushScope == 3);
 void CreateChannel(SessionLog& log, const MeasurementLibrary& library) {
   const SessionSettings& settings = log.session().connection->settings;
   const std::string channelPath =
-      VoraChannelPath(settings.voraGroupName.Get(), settings.voraChannelName.Get());
+      VoraChannelPath(settings.voraGroupName.get(), settings.voraChannelName.get());
   log.voraChannel = kVorNoHandle;
   (void)library.ObjCreateA(channelPath.c_str(), log.voraFile, &log.voraChannel);
   // The protocol follows the bus the session reads, which is what the records are.
@@ -43,7 +43,7 @@ void CreateChannel(SessionLog& log, const MeasurementLibrary& library) {
 
 void OpenFileAndChannel(SessionLog& log, const std::string& path) {
   MeasurementLibrary& library = TheMeasurementLibrary();
-  library.Load();
+  library.load();
   log.voraFile = kVorNoHandle;
   (void)library.FileOpenExA(path.c_str(), kOpenMode, kOpenAccess, kVorApiRevision, &log.voraFile);
   if (log.voraFile == kVorNoHandle) return;

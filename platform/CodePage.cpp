@@ -17,10 +17,10 @@ constexpr char16_t kHighControls[32] = {
     kUnassigned, 0x2018,      0x2019, 0x201C, 0x201D, 0x2022,      0x2013, 0x2014,
     0x02DC,      0x2122,      0x0161, 0x203A, 0x0153, kUnassigned, 0x017E, 0x0178};
 
-bool isHighSurrogate(char16_t unit) { return unit >= 0xD800 && unit <= 0xDBFF; }
-bool isLowSurrogate(char16_t unit) { return unit >= 0xDC00 && unit <= 0xDFFF; }
+bool IsHighSurrogate(char16_t unit) { return unit >= 0xD800 && unit <= 0xDBFF; }
+bool IsLowSurrogate(char16_t unit) { return unit >= 0xDC00 && unit <= 0xDFFF; }
 
-char encodeUnit(char16_t unit) {
+char EncodeUnit(char16_t unit) {
   if (unit < 0x80 || (unit >= 0xA0 && unit <= 0xFF)) return static_cast<char>(unit);
   // The five unassigned bytes decode (leniently) to the controls of their value; keep them so.
   if (unit <= 0x9F && kHighControls[unit - 0x80] == kUnassigned) return static_cast<char>(unit);
@@ -56,12 +56,12 @@ void Utf16ToCodePage(std::u16string_view text, std::string& out) {
   out.reserve(text.size());
   for (size_t index = 0; index < text.size(); ++index) {
     const char16_t unit = text[index];
-    if (isHighSurrogate(unit) && index + 1 < text.size() && isLowSurrogate(text[index + 1])) {
+    if (IsHighSurrogate(unit) && index + 1 < text.size() && IsLowSurrogate(text[index + 1])) {
       ++index;  // a character above 0xFFFF: never in this code page
       out.push_back(kDefaultCharacter);
       continue;
     }
-    out.push_back(encodeUnit(unit));
+    out.push_back(EncodeUnit(unit));
   }
 }
 

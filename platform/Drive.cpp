@@ -9,19 +9,19 @@ namespace platform {
 
 namespace {
 
-bool isSeparator(char c) { return c == '\\' || c == '/'; }
+bool IsSeparator(char c) { return c == '\\' || c == '/'; }
 
-bool hasDriveLetter(std::string_view path) {
+bool HasDriveLetter(std::string_view path) {
   return path.size() >= 2 && path[1] == ':' &&
          ((path[0] >= 'A' && path[0] <= 'Z') || (path[0] >= 'a' && path[0] <= 'z'));
 }
 
 // Splits on separators and resolves "." and ".."; false when ".." climbs above the root.
-bool resolveComponents(std::string_view rest, std::vector<std::string_view>& parts) {
+bool ResolveComponents(std::string_view rest, std::vector<std::string_view>& parts) {
   size_t begin = 0;
   while (begin <= rest.size()) {
     size_t end = begin;
-    while (end < rest.size() && !isSeparator(rest[end])) ++end;
+    while (end < rest.size() && !IsSeparator(rest[end])) ++end;
     const std::string_view part = rest.substr(begin, end - begin);
     if (part == "..") {
       if (parts.empty()) return false;
@@ -48,12 +48,12 @@ std::string DriveDirectory() {
 std::optional<std::string> MapRuntimePath(std::string_view runtimePath) {
   if (runtimePath.find('\0') != std::string_view::npos) return std::nullopt;
   std::string_view rest = runtimePath;
-  if (hasDriveLetter(rest)) {
+  if (HasDriveLetter(rest)) {
     if (rest[0] != 'C' && rest[0] != 'c') return std::nullopt;
     rest.remove_prefix(2);
   }
   std::vector<std::string_view> parts;
-  if (!resolveComponents(rest, parts)) return std::nullopt;
+  if (!ResolveComponents(rest, parts)) return std::nullopt;
   std::string native = DriveDirectory();
   while (native.size() > 1 && native.back() == '/') native.pop_back();
   for (std::string_view part : parts) {

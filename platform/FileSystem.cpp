@@ -17,7 +17,7 @@ namespace {
 constexpr mode_t kDirectoryMode = 0777;  // narrowed by the process umask
 
 // Creates the drive directory and its missing parents (mkdir -p).
-void ensureDrive() {
+void EnsureDrive() {
   std::string drive = DriveDirectory();
   struct stat info {};
   if (stat(drive.c_str(), &info) == 0) return;
@@ -33,7 +33,7 @@ void ensureDrive() {
 int MakeDirectory(const std::string& runtimePath) {
   const std::optional<std::string> native = MapRuntimePath(runtimePath);
   if (!native) return ENOENT;
-  ensureDrive();
+  EnsureDrive();
   if (mkdir(native->c_str(), kDirectoryMode) == 0) return 0;
   // A file where a parent directory should be is "path not found" on the controller.
   return errno == ENOTDIR ? ENOENT : errno;

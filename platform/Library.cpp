@@ -13,7 +13,7 @@ namespace platform {
 
 namespace {
 
-bool isRuntimePath(const char* name) {
+bool IsRuntimePath(const char* name) {
   return std::strchr(name, '\\') != nullptr || (name[0] != '\0' && name[1] == ':');
 }
 
@@ -22,7 +22,7 @@ bool isRuntimePath(const char* name) {
 HMODULE LoadLibraryA(const char* name) {
   if (name == nullptr || *name == '\0') return nullptr;
   std::string target = name;
-  if (isRuntimePath(name)) {
+  if (IsRuntimePath(name)) {
     const std::optional<std::string> native = MapRuntimePath(name);
     if (!native) return nullptr;
     target = *native;

@@ -37,7 +37,7 @@ std::atomic<uint32_t> nextThreadId{1};
 
 class PosixThreads final : public ThreadSystem {
  public:
-  bool Create(ThreadStartRoutine routine, void* argument, ThreadHandle& handle,
+  bool create(ThreadStartRoutine routine, void* argument, ThreadHandle& handle,
               uint32_t& threadId) override {
     auto* record = new (std::nothrow) ThreadRecord;
     auto* launch = new (std::nothrow) Launch{routine, argument};
@@ -53,20 +53,20 @@ class PosixThreads final : public ThreadSystem {
   }
 
   // Threads run in the default scheduling class, which is the normal priority.
-  int32_t GetPriority(ThreadHandle) override { return kNormalThreadPriority; }
+  int32_t getPriority(ThreadHandle) override { return kNormalThreadPriority; }
 
-  bool SetPriority(ThreadHandle handle, int32_t priority) override {
+  bool setPriority(ThreadHandle handle, int32_t priority) override {
     return handle && priority == kNormalThreadPriority;
   }
 
-  bool SetName(ThreadHandle handle, const char* name) override {
+  bool setName(ThreadHandle handle, const char* name) override {
     if (!handle || name == nullptr) return false;
     char shortName[16] = {};
     std::strncpy(shortName, name, sizeof shortName - 1);
     return pthread_setname_np(handle.record->thread, shortName) == 0;
   }
 
-  void Wait(ThreadHandle handle) override {
+  void wait(ThreadHandle handle) override {
     if (!handle) return;
     std::lock_guard<std::mutex> lock(handle.record->waitMutex);
     if (handle.record->joined) return;
@@ -74,7 +74,7 @@ class PosixThreads final : public ThreadSystem {
     handle.record->joined = true;
   }
 
-  void Close(ThreadHandle& handle) override {
+  void close(ThreadHandle& handle) override {
     if (!handle) return;
     {
       std::lock_guard<std::mutex> lock(handle.record->waitMutex);

@@ -26,16 +26,16 @@ class ThreadSystem {
  public:
   virtual ~ThreadSystem() = default;
   // Starts routine(argument) on a new thread; false when the system refuses.
-  virtual bool Create(ThreadStartRoutine routine, void* argument, ThreadHandle& handle,
+  virtual bool create(ThreadStartRoutine routine, void* argument, ThreadHandle& handle,
                       uint32_t& threadId) = 0;
-  virtual int32_t GetPriority(ThreadHandle handle) = 0;
-  virtual bool SetPriority(ThreadHandle handle, int32_t priority) = 0;
+  virtual int32_t getPriority(ThreadHandle handle) = 0;
+  virtual bool setPriority(ThreadHandle handle, int32_t priority) = 0;
   // Debug name shown by the system tools; at most 15 characters are kept.
-  virtual bool SetName(ThreadHandle handle, const char* name) = 0;
+  virtual bool setName(ThreadHandle handle, const char* name) = 0;
   // Waits without limit until the thread has ended; returns at once if it was waited for before.
-  virtual void Wait(ThreadHandle handle) = 0;
+  virtual void wait(ThreadHandle handle) = 0;
   // Releases the handle; a thread still running goes on running on its own.
-  virtual void Close(ThreadHandle& handle) = 0;
+  virtual void close(ThreadHandle& handle) = 0;
 };
 
 // The pthread implementation, shared by the whole process.

@@ -23,7 +23,7 @@ constexpr char kUnknownPropertyText[] = "<ERROR: unknown SETPROP command>\n";
 int32_t HandleProperty(HostConnection& connection, std::string_view text) {
   size_t equals = text.find('=');
   if (equals == std::string_view::npos) return 0;  // not an assignment: dropped silently
-  int32_t id = connection.propertyTable.Find(text.substr(0, equals));
+  int32_t id = connection.propertyTable.find(text.substr(0, equals));
   if (id == kPropertyUnknown) {
     SendText(connection, kUnknownPropertyText, nullptr, kMessageErrorText);
     return 0;
@@ -33,7 +33,7 @@ int32_t HandleProperty(HostConnection& connection, std::string_view text) {
 }
 
 int32_t HandleCommand(HostConnection& connection, std::string_view text) {
-  int32_t id = connection.commandTable.Find(text);
+  int32_t id = connection.commandTable.find(text);
   if (id == kCommandUnknown) {
     SendText(connection, kUnknownCommandText, connection.session.get(), kMessageErrorText);
     return 0;

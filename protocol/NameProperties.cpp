@@ -20,15 +20,15 @@ void PortName(HostConnection& connection, std::string_view value) {
   const driver::BusKind bus = BusOfPort(value);
   // A name of another bus while a session runs is taken for the next session: the live session
   // keeps its own kind (CBusSystem::busType), and its commands, refusals and transmit follow that.
-  connection.settings.portName.Set(value);
-  connection.settings.interfaceName.Set(std::string(value).append(kInterfaceSuffix));
+  connection.settings.portName.set(value);
+  connection.settings.interfaceName.set(std::string(value).append(kInterfaceSuffix));
   if (value.empty()) {
     SendPropertyReply(connection, "<ERROR: SET_PROP_SESSION_PORTNAME: empty paramter>\n", kNone);
   } else if (bus == driver::BusKind::kNone) {
     SendPropertyReply(connection, "<ERROR: WRONG PORT NAME>\n", kNone);
   } else {
     connection.busType.store(bus);
-    std::string stored = connection.settings.portName.Get();
+    std::string stored = connection.settings.portName.get();
     SendPropertyReply(connection, FillReply("<ACK: SET_PROP_SESSION_PORTNAME %s>", stored), kNone);
   }
 }
@@ -47,25 +47,25 @@ void LogFileName(HostConnection& connection, std::string_view value) {
     return;
   }
   if (IsValidLogFileName(value)) {
-    connection.settings.logFileName.Set(value);
+    connection.settings.logFileName.set(value);
   } else {
     SendPropertyReply(connection,
                       "<ERROR: no valid file name, file name KelvaneLog will be used>\n", kNone);
-    connection.settings.logFileName.Set(kDefaultLogFileName);
+    connection.settings.logFileName.set(kDefaultLogFileName);
   }
-  std::string stored = connection.settings.logFileName.Get();
+  std::string stored = connection.settings.logFileName.get();
   SendPropertyReply(connection, FillReply("<ACK: SET_PROP_LOGFILE_NAME %s> \n", stored), kNone);
 }
 
 // Stores the text; answers the empty-text error or the acknowledgement without a line end.
 void StoreName(HostConnection& connection, GuardedText& field, std::string_view value,
                std::string_view emptyError, std::string_view acknowledgement) {
-  field.Set(value);
+  field.set(value);
   if (value.empty()) {
     SendPropertyReply(connection, std::string(emptyError), kNone);
     return;
   }
-  SendPropertyReply(connection, FillReply(acknowledgement, field.Get()), kNone);
+  SendPropertyReply(connection, FillReply(acknowledgement, field.get()), kNone);
 }
 
 void VoraGroupName(HostConnection& connection, std::string_view value) {

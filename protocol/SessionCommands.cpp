@@ -66,7 +66,7 @@ int32_t StartCan(HostConnection& connection) {
   const SessionSettings& settings = connection.settings;
   auto session = std::make_unique<CCAN>(&connection);
   const int32_t result = session->openCanSession(
-      settings.interfaceName.Get(), settings.baudRate.load(), settings.termination.load());
+      settings.interfaceName.get(), settings.baudRate.load(), settings.termination.load());
   return Launch(connection, std::move(session), result);
 }
 
@@ -74,7 +74,7 @@ int32_t StartLin(HostConnection& connection) {
   const SessionSettings& settings = connection.settings;
   auto session = std::make_unique<CLIN>(&connection);
   const int32_t result =
-      session->openLinSession(settings.interfaceName.Get(), settings.baudRate.load());
+      session->openLinSession(settings.interfaceName.get(), settings.baudRate.load());
   return Launch(connection, std::move(session), result);
 }
 
@@ -82,7 +82,7 @@ int32_t StartFlexRay(HostConnection& connection) {
   const SessionSettings& settings = connection.settings;
   auto session = std::make_unique<CFlexRay>(&connection);
   const int32_t result =
-      session->openFlexRaySession(settings.interfaceName.Get(), settings.termination.load());
+      session->openFlexRaySession(settings.interfaceName.get(), settings.termination.load());
   return Launch(connection, std::move(session), result);
 }
 
@@ -103,8 +103,8 @@ const char* AlreadyStartedText(const CBusSystem& session) {
 int32_t StartSession(HostConnection& connection) {
   const driver::BusKind busType = connection.busType.load();
   const SessionSettings& settings = connection.settings;
-  if (busType == driver::BusKind::kFlexRay && settings.runMode.Contains("NORMAL") &&
-      settings.alias.Empty() && settings.cluster.Empty()) {
+  if (busType == driver::BusKind::kFlexRay && settings.runMode.contains("NORMAL") &&
+      settings.alias.empty() && settings.cluster.empty()) {
     SendText(connection, kNoAliasAndCluster, nullptr, kMessageErrorText);
     return 0;
   }

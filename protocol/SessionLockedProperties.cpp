@@ -90,8 +90,8 @@ bool NamesRunMode(std::string_view text) {
 template <auto Field, bool (*Accepts)(std::string_view), const LockedRule& Rule>
 void LockedText(HostConnection& connection, std::string_view value) {
   GuardedText& field = connection.settings.*Field;
-  field.Set(value);
-  std::string stored = field.Get();
+  field.set(value);
+  std::string stored = field.get();
   Answer(connection, Rule, Accepts(stored), stored);
 }
 

@@ -28,15 +28,15 @@ struct Cursor {
     while (at < text.size() && IsBlank(text[at])) ++at;
     if (at < text.size() && (text[at] == '+' || text[at] == '-')) negative = text[at++] == '-';
   }
-  bool More() const { return at < text.size(); }
-  char Peek(size_t ahead = 0) const { return at + ahead < text.size() ? text[at + ahead] : '\0'; }
+  bool more() const { return at < text.size(); }
+  char peek(size_t ahead = 0) const { return at + ahead < text.size() ? text[at + ahead] : '\0'; }
 };
 
 // Digits in `base` from the cursor, saturating at `limit`; false when there was no digit.
 bool ReadMagnitude(Cursor& cursor, int base, uint64_t limit, uint64_t& magnitude) {
   bool any = false;
   magnitude = 0;
-  for (int digit; (digit = DigitValue(cursor.Peek(), base)) >= 0 && cursor.More(); ++cursor.at) {
+  for (int digit; (digit = DigitValue(cursor.peek(), base)) >= 0 && cursor.more(); ++cursor.at) {
     any = true;
     if (magnitude > (limit - digit) / base) {
       magnitude = limit;
@@ -72,9 +72,9 @@ uint64_t ReadUnsigned64(std::string_view value, uint64_t previous) {
 uint32_t ReadKey(std::string_view value) {
   Cursor cursor(value);
   int base = 10;
-  if (cursor.Peek() == '0') {
+  if (cursor.peek() == '0') {
     bool hex =
-        (cursor.Peek(1) == 'x' || cursor.Peek(1) == 'X') && DigitValue(cursor.Peek(2), 16) >= 0;
+        (cursor.peek(1) == 'x' || cursor.peek(1) == 'X') && DigitValue(cursor.peek(2), 16) >= 0;
     base = hex ? 16 : 8;
     if (hex) cursor.at += 2;
   }

@@ -43,7 +43,7 @@ tThreadController::~tThreadController() { releaseHandle(); }
 
 void tThreadController::releaseHandle() {
   if (!ownsHandle) return;
-  threads.Close(handle);
+  threads.close(handle);
   handle = {};
   threadId = 0;
   ownsHandle = false;
@@ -63,7 +63,7 @@ void tThreadController::start(iThread* threadBody, StatusBlock& status) {
   entry = runBody;
   auto* launch = new (std::nothrow) Launch{entry, body};
   platform::ThreadHandle created;
-  if (launch == nullptr || !threads.Create(threadStart, launch, created, threadId)) {
+  if (launch == nullptr || !threads.create(threadStart, launch, created, threadId)) {
     delete launch;
     setStatus(status, qvapalerr_osFault, kThreadSource, kLineCreateFailed);
     return;
@@ -71,7 +71,7 @@ void tThreadController::start(iThread* threadBody, StatusBlock& status) {
   handle = created;
   ownsHandle = true;
   forceNormalPriority(status);
-  threads.SetName(handle, kDebugName);  // a missing debug name is harmless
+  threads.setName(handle, kDebugName);  // a missing debug name is harmless
 
   const bool healthy = status.code >= 0;
   if (!healthy) {
@@ -83,17 +83,17 @@ void tThreadController::start(iThread* threadBody, StatusBlock& status) {
 }
 
 void tThreadController::forceNormalPriority(StatusBlock& status) {
-  if (threads.GetPriority(handle) == platform::kNormalThreadPriority || status.isError()) return;
+  if (threads.getPriority(handle) == platform::kNormalThreadPriority || status.isError()) return;
   if (!ownsHandle) {
     setStatus(status, qvapalerr_handleNotOwned, kThreadSource, kLineHandleNotOwned);
-  } else if (!threads.SetPriority(handle, platform::kNormalThreadPriority)) {
+  } else if (!threads.setPriority(handle, platform::kNormalThreadPriority)) {
     setStatus(status, qvapalerr_osFault, kThreadSource, kLinePriorityRefused);
   }
 }
 
 void tThreadController::join() {
   if (!ownsHandle) return;
-  threads.Wait(handle);
+  threads.wait(handle);
   running.store(false);
 }
 

@@ -23,7 +23,7 @@ struct ReadSet {
   bool readable[1 + kConnectionSlots] = {};
   size_t count = 0;
 
-  void Add(net::SocketHandle socket, size_t slot) {
+  void add(net::SocketHandle socket, size_t slot) {
     sockets[count] = socket;
     slotOf[count++] = slot;
   }
@@ -94,7 +94,7 @@ int32_t ConnectionPass(ServiceContext& context) {
   net::SocketHandle listener = context.listenSocket.load();
   if (listener == net::kInvalidSocket) return RunHeartbeatChecks(context);
   ReadSet set;
-  set.Add(listener, kNoSlot);
+  set.add(listener, kNoSlot);
   for (size_t i = 0; i < kConnectionSlots; ++i) {
     ConnectionSlot& slot = context.connections[i];
     if (!slot.connection) continue;
@@ -103,7 +103,7 @@ int32_t ConnectionPass(ServiceContext& context) {
       continue;
     }
     FlushPendingOutput(*slot.connection);
-    set.Add(slot.socket, i);
+    set.add(slot.socket, i);
   }
   int32_t ready = net::WaitReadable(set.sockets, set.count, set.readable, kPassWaitMs);
   if (ready <= 0) return RunHeartbeatChecks(context);

@@ -11,9 +11,9 @@ namespace {
 // of kelvanert.ini, the linked driver library.
 class ModuleService {
  public:
-  ModuleService() : context_(new ServiceContext(ModuleOptions())) {}
+  ModuleService() : context_(new ServiceContext(moduleOptions())) {}
   ~ModuleService() {
-    context_->Shutdown();
+    context_->shutdown();
     delete context_;
     // Every session has stopped and closed its measurement-data file, so the library can go. A
     // failure to free it at process shutdown has nobody to be reported to.
@@ -26,7 +26,7 @@ class ModuleService {
   ModuleService& operator=(const ModuleService&) = delete;
 
  private:
-  static ServiceOptions ModuleOptions() {
+  static ServiceOptions moduleOptions() {
     ServiceOptions options;
     options.startDelayMs = kModuleStartDelayMs;
     options.driver = &TarvixDriverSystem();

@@ -68,9 +68,9 @@ ServiceContext::ServiceContext(ServiceOptions serviceOptions) : options(std::mov
   threadController->start(serviceThread.get(), status);  // the status is not examined
 }
 
-ServiceContext::~ServiceContext() { Shutdown(); }
+ServiceContext::~ServiceContext() { shutdown(); }
 
-void ServiceContext::Shutdown() {
+void ServiceContext::shutdown() {
   if (shutDown_.exchange(true)) return;
   running.store(false);
   // A pass waits on the listener; shutting it down wakes the wait at once.

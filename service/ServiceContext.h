@@ -45,7 +45,7 @@ struct ConnectionSlot {
 class ServiceContext {
  public:
   explicit ServiceContext(ServiceOptions options);
-  // Shuts down in order (see Shutdown).
+  // Shuts down in order (see shutdown).
   ~ServiceContext();
   ServiceContext(const ServiceContext&) = delete;
   ServiceContext& operator=(const ServiceContext&) = delete;
@@ -53,7 +53,7 @@ class ServiceContext {
   // Ends the service for unloading: stops the loop, waits for the service thread, stops every
   // session, closes the connections and the listener. Idempotent; any thread but the service
   // thread.
-  void Shutdown();
+  void shutdown();
 
   // The port the listener is bound to, or -1 before it listens (or after a failed set-up).
   // Any thread.
@@ -75,7 +75,7 @@ class ServiceContext {
   ServiceStatistics stats;                 // atomics, any thread
   std::atomic<int32_t> boundPort{-1};      // any thread
   std::atomic<bool> setUpComplete{false};  // any thread: configuration and listener done
-  std::atomic<bool> shutDown_{false};      // any thread: Shutdown ran
+  std::atomic<bool> shutDown_{false};      // any thread: shutdown ran
 };
 
 // The start-up and loop of the service thread: wait, configuration, listener, version values,

@@ -11,10 +11,10 @@ constexpr uint64_t kPicosecondsPerSecond = 1000000000000ULL;
 
 class PlatformCounter final : public iClockSource {
  public:
-  uint64_t ReadCounter() override {
+  uint64_t readCounter() override {
     return static_cast<uint64_t>(platform::ReadPerformanceCounter());
   }
-  uint64_t CounterFrequency() override {
+  uint64_t counterFrequency() override {
     return static_cast<uint64_t>(platform::PerformanceCounterFrequency());
   }
 };
@@ -27,7 +27,7 @@ std::atomic<bool> clockInitialised{false};
 std::atomic<uint64_t> picosecondsPerTick{0};
 
 void InitialiseClock(iClockSource& source) {
-  uint64_t frequency = source.CounterFrequency();
+  uint64_t frequency = source.counterFrequency();
   if (frequency == 0) frequency = 1;  // a broken source must not divide by zero
   picosecondsPerTick.store(kPicosecondsPerSecond / frequency, std::memory_order_relaxed);
   clockInitialised.store(true, std::memory_order_release);
@@ -43,7 +43,7 @@ void InstallClockSource(iClockSource* source) {
 uint64_t ReadClockPicoseconds() {
   iClockSource& source = *installedSource.load();
   if (!clockInitialised.load(std::memory_order_acquire)) InitialiseClock(source);
-  const uint64_t ticks = source.ReadCounter();
+  const uint64_t ticks = source.readCounter();
   if (!clockInitialised.load(std::memory_order_acquire)) InitialiseClock(source);
   return ticks * picosecondsPerTick.load(std::memory_order_relaxed);
 }

@@ -7,8 +7,8 @@
 class iClockSource {
  public:
   virtual ~iClockSource() = default;
-  virtual uint64_t ReadCounter() = 0;
-  virtual uint64_t CounterFrequency() = 0;  // ticks per second, at least 1
+  virtual uint64_t readCounter() = 0;
+  virtual uint64_t counterFrequency() = 0;  // ticks per second, at least 1
 };
 
 // Makes `source` the clock of the whole process (nullptr restores the platform counter) and

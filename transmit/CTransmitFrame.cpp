@@ -20,7 +20,7 @@ constexpr uint8_t kRemoteFrameType = 1;
 CTransmitFrame::CTransmitFrame(const SessionSettings& settings, int32_t& status)
     : settings_(settings), status_(status) {}
 
-CTransmitFrame::~CTransmitFrame() { StopIfActive(); }
+CTransmitFrame::~CTransmitFrame() { stopIfActive(); }
 
 void CTransmitFrame::SetTxPayload(std::string_view text) {
   txPayload.clear();
@@ -78,7 +78,7 @@ void CTransmitFrame::releaseOutput() {
     (void)kxClear(txSession);
   }
   status_ = txDatabase != 0 ? kxdbCloseDatabase(txDatabase, driver::kCloseThisReference) : 0;
-  TransmitDatabaseName::Release(txDatabaseNumber_);
+  TransmitDatabaseName::release(txDatabaseNumber_);
   txDatabaseNumber_ = -1;
   txSession = txDatabase = txCluster = txFrameObject = 0;
 }

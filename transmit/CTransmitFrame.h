@@ -44,7 +44,7 @@ class CTransmitFrame {
   // session, closes the database, empties the payload. The other fields stay for the next start.
   void StopTransmit();
   // StopTransmit when a transmission is active.
-  void StopIfActive() {
+  void stopIfActive() {
     if (txActive) StopTransmit();
   }
   // Builds the in-memory database and the output session; the first failing call's status stays

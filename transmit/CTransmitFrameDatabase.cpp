@@ -36,9 +36,9 @@ bool FdClusterMode(uint32_t canIoMode) {
 }  // namespace
 
 void CTransmitFrame::CreateTransmitSession() {
-  TransmitDatabaseName::Release(txDatabaseNumber_);
-  txDatabaseNumber_ = TransmitDatabaseName::Acquire();
-  const std::string name = TransmitDatabaseName::Format(txDatabaseNumber_);
+  TransmitDatabaseName::release(txDatabaseNumber_);
+  txDatabaseNumber_ = TransmitDatabaseName::acquire();
+  const std::string name = TransmitDatabaseName::format(txDatabaseNumber_);
   if ((status_ = kxdbOpenDatabase(name.c_str(), &txDatabase)) != 0) return;
   if ((status_ = kxdbCreateObject(txDatabase, driver::kClassCluster, kClusterName, &txCluster)) !=
       0) {
@@ -54,7 +54,7 @@ void CTransmitFrame::CreateTransmitSession() {
   // suffix.
   const uint32_t mode = txTimingType == driver::kTimingEventData ? driver::kModeOutputQueued
                                                                  : driver::kModeOutputSinglePoint;
-  const std::string port = settings_.portName.Get();
+  const std::string port = settings_.portName.get();
   if ((status_ = kxCreateSession(name.c_str(), kClusterName, kFrameName, port.c_str(), mode,
                                  &txSession)) != 0) {
     return;

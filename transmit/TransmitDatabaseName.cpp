@@ -25,14 +25,14 @@ NumbersInUse& InUse() {
 
 }  // namespace
 
-int TransmitDatabaseName::Draw(uint32_t seed) {
+int TransmitDatabaseName::draw(uint32_t seed) {
   // The classic linear congruential generator; its first number after seeding.
   const uint32_t state = seed * 214013u + 2531011u;
   return static_cast<int>((state >> 16) & 0x7FFFu);
 }
 
-int TransmitDatabaseName::Acquire() {
-  const int drawn = Draw(static_cast<uint32_t>(std::time(nullptr)));
+int TransmitDatabaseName::acquire() {
+  const int drawn = draw(static_cast<uint32_t>(std::time(nullptr)));
   NumbersInUse& numbers = InUse();
   std::lock_guard lock(numbers.mutex);
   for (int step = 0; step < kNumberRange; ++step) {
@@ -45,14 +45,14 @@ int TransmitDatabaseName::Acquire() {
   return drawn;  // unreachable: at most a few hosts per service transmit at once
 }
 
-void TransmitDatabaseName::Release(int number) {
+void TransmitDatabaseName::release(int number) {
   if (number < 0 || number >= kNumberRange) return;
   NumbersInUse& numbers = InUse();
   std::lock_guard lock(numbers.mutex);
   numbers.used.reset(number);
 }
 
-std::string TransmitDatabaseName::Format(int number) {
+std::string TransmitDatabaseName::format(int number) {
   char name[128];
   std::snprintf(name, sizeof name, ":memory%d", number);
   return name;

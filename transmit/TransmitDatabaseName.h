@@ -14,12 +14,12 @@ namespace nKV_DLL300 {
 // Thread-safe: each service thread of the process uses it.
 class TransmitDatabaseName {
  public:
-  // Reserves a number (seeded from the clock) and returns it; Release gives it back.
-  static int Acquire();
+  // Reserves a number (seeded from the clock) and returns it; release gives it back.
+  static int acquire();
   // The number drawn from a generator seeded with `seed`.
-  static int Draw(uint32_t seed);
-  static void Release(int number);
-  static std::string Format(int number);
+  static int draw(uint32_t seed);
+  static void release(int number);
+  static std::string format(int number);
 };
 
 }  // namespace nKV_DLL300

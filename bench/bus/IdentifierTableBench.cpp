@@ -38,7 +38,7 @@ std::vector<FrameBatch> ShuffledBatches(uint32_t n, uint32_t frames, uint32_t se
   return batches;
 }
 
-std::unique_ptr<Indexed> Make(Indexed*, uint32_t n) { return Indexed::Create(n); }
+std::unique_ptr<Indexed> Make(Indexed*, uint32_t n) { return Indexed::create(n); }
 std::unique_ptr<Literal> Make(Literal*, uint32_t n) { return std::make_unique<Literal>(n); }
 
 template <class Table>
@@ -95,7 +95,7 @@ void BM_SendIdentifierRecords(benchmark::State& state) {
 // A later send with no new identifier since the last one.
 void BM_SendIdentifierRecordsAgain(benchmark::State& state) {
   const auto n = static_cast<uint32_t>(state.range(0));
-  auto table = Indexed::Create(n);
+  auto table = Indexed::create(n);
   Fill(*table, ShuffledBatches(n, n, 3));
   table->sendIdentifierRecords(false, NullSink());
   for (auto _ : state) table->sendIdentifierRecords(false, NullSink());

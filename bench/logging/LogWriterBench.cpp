@@ -103,7 +103,7 @@ struct BenchDrive {
 void RunWriter(benchmark::State& state, Bus bus, uint8_t logType) {
   static const BenchDrive drive;
   HostConnection connection(platform::net::kInvalidSocket, ConnectionSetup{});
-  connection.settings.logFileName.Set("bench");
+  connection.settings.logFileName.set("bench");
   connection.settings.logFileType.store(logType);
   connection.settings.canIoMode.store(bus == Bus::kCanFd ? 2 : 0);
   BenchSession session(&connection);

@@ -67,16 +67,16 @@ TEST(CanStatistics, SendTurnsWindowCountsIntoRatesAndKeepsThePeakLoad) {
   CanFrameTimes times;
   times.buildFrameTimeTables({0, 0, 500000, 0});
   for (int i = 0; i < 100; ++i) countFrame(s, times, CanFrame(0x100, 0, 8), kInWindow);
-  prepareToSend(s, times, 1000);
+  PrepareToSend(s, times, 1000);
   EXPECT_EQ(s.standardFramesPerSecond, 100u);
   EXPECT_EQ(s.busLoad, 240u);
   EXPECT_EQ(s.peakBusLoad, 240u);
-  endWindow(s, times);
+  EndWindow(s, times);
   EXPECT_EQ(s.busLoad, 0u);
   EXPECT_EQ(s.standardFramesPerSecond, 0u);
   EXPECT_EQ(s.standardFrames, 100u);
   countFrame(s, times, CanFrame(0x100, 0, 8), kInWindow);
-  prepareToSend(s, times, 1000);
+  PrepareToSend(s, times, 1000);
   EXPECT_EQ(s.busLoad, 0u);  // 0.241 per mille truncates to 0
   EXPECT_EQ(s.peakBusLoad, 240u);
 }
@@ -92,7 +92,7 @@ TEST(FramesPerSecond, RoundsAndSurvivesLongWindowsAndZeroTime) {
 
 TEST(CanStatistics, StateWordFillsItsBitFields) {
   CanBusStatistics s{};
-  decodeState(s, 0xA5C3F6E7u, 0x1234);
+  DecodeState(s, 0xA5C3F6E7u, 0x1234);
   EXPECT_EQ(s.faultCode, 0x1234u);
   EXPECT_EQ(s.stateBits0to3, 0x7u);
   EXPECT_EQ(s.stateBit4, 0u);
@@ -109,16 +109,16 @@ TEST(LinStatistics, CountsByTypeAndConvertsRates) {
   EXPECT_EQ(s.dataFrames, 3u);
   EXPECT_EQ(s.errorFrames, 1u);
   EXPECT_EQ(s.noResponseFrames, 1u);
-  prepareToSend(s, 500);
+  PrepareToSend(s, 500);
   EXPECT_EQ(s.dataFramesPerSecond, 5u);  // 2 frames in half a second, rounded: 4.5 -> 5
   EXPECT_EQ(s.errorFramesPerSecond, 3u);
-  endWindow(s);
+  EndWindow(s);
   EXPECT_EQ(s.dataFramesPerSecond + s.errorFramesPerSecond + s.noResponseFramesPerSecond, 0u);
 }
 
 TEST(LinStatistics, StateUsesTheLow32BitsOnly) {
   LinBusStatistics s{};
-  decodeState(s, 0xFFFFFFFF'BF5A3C96ull, 9);
+  DecodeState(s, 0xFFFFFFFF'BF5A3C96ull, 9);
   EXPECT_EQ(s.faultCode, 9u);
   EXPECT_EQ(s.stateBits0to7, 0x96u);
   EXPECT_EQ(s.stateBit1, 1u);
@@ -135,16 +135,16 @@ TEST(FlexRayStatistics, CountsDataAndNullFramesAndStoresTheThreeStates) {
   for (uint8_t type : {0x20, 0x21, 0x21, 0x22}) countFrame(s, type, kInWindow);
   EXPECT_EQ(s.dataFrames, 1u);
   EXPECT_EQ(s.nullFrames, 2u);
-  prepareToSend(s, 2000);
+  PrepareToSend(s, 2000);
   EXPECT_EQ(s.nullFramesPerSecond, 1u);
-  decodeState(s, 0x7ABCu, 1);
+  DecodeState(s, 0x7ABCu, 1);
   EXPECT_EQ(s.stateBits0to3, 0xCu);
   EXPECT_EQ(s.stateBits4to7, 0xBu);
   EXPECT_EQ(s.stateBits8to12, 0x1Au);
   EXPECT_EQ(s.stateBit13, 1u);
   EXPECT_EQ(s.stateBit14, 1u);
-  storeStatisticsWords(s, {1, 2, 3, 4, 5, 6}, 2);
-  storeLastStateWord(s, 77, 3);
+  StoreStatisticsWords(s, {1, 2, 3, 4, 5, 6}, 2);
+  StoreLastStateWord(s, 77, 3);
   EXPECT_EQ(s.statisticsWords[5], 6u);
   EXPECT_EQ(s.lastStateWord, 77u);
   EXPECT_EQ(s.faultCode, 3u);

@@ -53,7 +53,7 @@ void CompareOnRandomTraffic(const Traffic& traffic, uint32_t seed) {
   const uint32_t capacity = std::uniform_int_distribution<uint32_t>(0, 80)(random);
   const uint32_t sendBuffer = std::uniform_int_distribution<uint32_t>(100, 6000)(random);
   auto table =
-      IdentifierTable<Rules>::Create(capacity, std::pmr::get_default_resource(), sendBuffer);
+      IdentifierTable<Rules>::create(capacity, std::pmr::get_default_resource(), sendBuffer);
   LiteralIdentifierTable<Rules> reference(capacity, sendBuffer);
   uint64_t clock = 0;
   for (int step = 0; step < 300; ++step) {

@@ -27,7 +27,7 @@ std::vector<test::Message> Send(Table& table, bool reset = false) {
 }
 
 TEST(CanIdentifierTable, RepeatedIdentifierCountsAndListsSortedWithBothTimestamps) {
-  auto table = CanIdentifierTable::Create(1000);
+  auto table = CanIdentifierTable::create(1000);
   FrameBatch batch;
   batch.can(10, 0x200, {1}).can(20, 0x100, {2, 2}).can(30, 0x200, {3, 3, 3});
   EXPECT_EQ(table->updateIdentifierTable(batch.data(), batch.size(), kDefaults), 0);
@@ -49,7 +49,7 @@ TEST(CanIdentifierTable, RepeatedIdentifierCountsAndListsSortedWithBothTimestamp
 }
 
 TEST(CanIdentifierTable, TypeIsPartOfTheKeyAndTiesKeepTheirFirstSeenOrder) {
-  auto table = CanIdentifierTable::Create(1000);
+  auto table = CanIdentifierTable::create(1000);
   FrameBatch batch;
   batch.can(1, 0x321, {}, kCanRemote)
       .can(2, 0x321, {1, 2})
@@ -73,7 +73,7 @@ TEST(IdentifierTable, EchoesAndBusErrorsEnterOnlyWhenTheirSettingAllowsIt) {
                  {kCanBusError, 0, kDefaults, false},  {kCanBusError, 0, {0, 1}, true},
                  {kCanBusError, kEcho, {0, 1}, false}, {kCanRemote, 0, kDefaults, true}};
   for (const auto& row : canRows) {
-    auto table = CanIdentifierTable::Create(10);
+    auto table = CanIdentifierTable::create(10);
     FrameBatch batch;
     batch.can(1, 0x10, {}, row.type, row.flags);
     int taken = 0;
@@ -85,7 +85,7 @@ TEST(IdentifierTable, EchoesAndBusErrorsEnterOnlyWhenTheirSettingAllowsIt) {
       EXPECT_EQ(table->entry(0).echo, row.flags & kEcho);
     }
   }
-  auto lin = LinIdentifierTable::Create(10);
+  auto lin = LinIdentifierTable::create(10);
   FrameBatch batch;
   batch.add(1, 0x12, kLinBusError, 0, 0, {}).add(2, 0x13, kLinNoResponse, 0, 0, {});
   lin->updateIdentifierTable(batch.data(), batch.size(), kDefaults);
@@ -94,7 +94,7 @@ TEST(IdentifierTable, EchoesAndBusErrorsEnterOnlyWhenTheirSettingAllowsIt) {
 }
 
 TEST(IdentifierTable, FullTableIgnoresNewIdentifiersAndKeepsUpdatingKnownOnes) {
-  auto table = CanIdentifierTable::Create(2);
+  auto table = CanIdentifierTable::create(2);
   FrameBatch batch;
   batch.can(1, 0x1, {}).can(2, 0x2, {}).can(3, 0x3, {}).can(4, 0x1, {});
   int taken = 0;
@@ -107,8 +107,8 @@ TEST(IdentifierTable, FullTableIgnoresNewIdentifiersAndKeepsUpdatingKnownOnes) {
 }
 
 TEST(IdentifierTable, CapacityIsCappedAtTheIdCountRange) {
-  EXPECT_EQ(CanIdentifierTable::Create(0xFFFFFFFF)->capacity(), kIdentifierTableLimit);
-  auto empty = LinIdentifierTable::Create(0);
+  EXPECT_EQ(CanIdentifierTable::create(0xFFFFFFFF)->capacity(), kIdentifierTableLimit);
+  auto empty = LinIdentifierTable::create(0);
   FrameBatch batch;
   batch.add(1, 0x10, kLinData, 0, 0, {1});
   empty->updateIdentifierTable(batch.data(), batch.size(), kDefaults);
@@ -117,7 +117,7 @@ TEST(IdentifierTable, CapacityIsCappedAtTheIdCountRange) {
 }
 
 TEST(IdentifierTable, ResetTakesEffectAtTheNextSendWhichSendsNothing) {
-  auto table = CanIdentifierTable::Create(100);
+  auto table = CanIdentifierTable::create(100);
   FrameBatch batch;
   batch.can(1, 0x100, {1, 2, 3}).can(2, 0x100, {1, 2, 3});
   table->updateIdentifierTable(batch.data(), batch.size(), kDefaults);
@@ -137,7 +137,7 @@ TEST(IdentifierTable, ResetTakesEffectAtTheNextSendWhichSendsNothing) {
 }
 
 TEST(CanIdentifierTable, PayloadCopyFollowsEveryLengthChange) {
-  auto table = CanIdentifierTable::Create(10);
+  auto table = CanIdentifierTable::create(10);
   std::vector<uint8_t> j1939(2047);
   for (size_t i = 0; i < j1939.size(); ++i) j1939[i] = static_cast<uint8_t>(i * 7);
   std::vector<uint8_t> fd(64, 0xAB);
@@ -159,7 +159,7 @@ TEST(CanIdentifierTable, PayloadCopyFollowsEveryLengthChange) {
 
 TEST(CanIdentifierTable, RefusedPayloadCopyIsReportedAndSentWithoutPayload) {
   CountingResource resource;
-  auto table = CanIdentifierTable::Create(10, &resource);
+  auto table = CanIdentifierTable::create(10, &resource);
   resource.refuseFrom = resource.allocations;
   FrameBatch batch;
   batch.can(1, 0x100, {1, 2, 3}).can(2, 0x101, {});
@@ -179,13 +179,13 @@ TEST(CanIdentifierTable, RefusedPayloadCopyIsReportedAndSentWithoutPayload) {
 TEST(IdentifierTable, TableThatCannotBeAllocatedIsNotMade) {
   CountingResource resource;
   resource.refuseFrom = 2;
-  EXPECT_EQ(FlexRayIdentifierTable::Create(1000, &resource), nullptr);
+  EXPECT_EQ(FlexRayIdentifierTable::create(1000, &resource), nullptr);
   EXPECT_EQ(resource.outstanding, 0u);
 }
 
 TEST(IdentifierTable, KnownIdentifiersCostNoAllocation) {
   CountingResource resource;
-  auto table = CanIdentifierTable::Create(100, &resource);
+  auto table = CanIdentifierTable::create(100, &resource);
   FrameBatch batch;
   for (uint32_t id = 0; id < 50; ++id) batch.can(id, id, std::vector<uint8_t>(id % 9, 1));
   table->updateIdentifierTable(batch.data(), batch.size(), kDefaults);
@@ -199,7 +199,7 @@ TEST(IdentifierTable, KnownIdentifiersCostNoAllocation) {
 }
 
 TEST(LinIdentifierTable, OneEntryPerIdentifierShowsItsLastFrame) {
-  auto table = LinIdentifierTable::Create(10);
+  auto table = LinIdentifierTable::create(10);
   FrameBatch batch;
   batch.add(1, 0x11, kLinData, 0x01, 0x5A, {1, 2, 3, 4, 5, 6, 7, 8})
       .add(2, 0x10, kLinData, 0, 0x33, {0x12, 0x34})
@@ -227,7 +227,7 @@ TEST(LinIdentifierTable, OneEntryPerIdentifierShowsItsLastFrame) {
 }
 
 TEST(FlexRayIdentifierTable, ChannelKeyFollowsFlagsOrTheFrameBeforeIt) {
-  auto table = FlexRayIdentifierTable::Create(100);
+  auto table = FlexRayIdentifierTable::create(100);
   FrameBatch batch;
   batch.add(1, 5, kFrData, kChannelA | 0x03, 7, {1, 2})
       .add(2, 5, kFrData, kChannelB, 7, {3})
@@ -264,7 +264,7 @@ TEST(FlexRayIdentifierTable, ChannelKeyFollowsFlagsOrTheFrameBeforeIt) {
 
 TEST(IdentifierTable, RecordsBeyondTheSendBufferGoOutInFurtherMessages) {
   constexpr uint32_t kIdentifiers = 4000;
-  auto table = CanIdentifierTable::Create(kIdentifiers);
+  auto table = CanIdentifierTable::create(kIdentifiers);
   FrameBatch batch;
   for (uint32_t id = 0; id < kIdentifiers; ++id)
     batch.can(id, kIdentifiers - id, std::vector<uint8_t>(64, 1), kCanFdBrs);
@@ -284,7 +284,7 @@ TEST(IdentifierTable, RecordsBeyondTheSendBufferGoOutInFurtherMessages) {
 
 TEST(IdentifierTable, FailedSendEndsTheSendWithItsStatus) {
   constexpr int32_t kSendFailed = -3;
-  auto table = FlexRayIdentifierTable::Create(100, std::pmr::get_default_resource(), 100);
+  auto table = FlexRayIdentifierTable::create(100, std::pmr::get_default_resource(), 100);
   FrameBatch batch;
   for (uint32_t slot = 1; slot <= 20; ++slot) batch.add(slot, slot, kFrData, kChannelA, 0, {1});
   table->updateIdentifierTable(batch.data(), batch.size(), kDefaults);
@@ -295,7 +295,7 @@ TEST(IdentifierTable, FailedSendEndsTheSendWithItsStatus) {
 }
 
 TEST(IdentifierTable, TruncatedBatchEndsAtTheLastWholeFrame) {
-  auto table = CanIdentifierTable::Create(10);
+  auto table = CanIdentifierTable::create(10);
   FrameBatch batch;
   batch.can(1, 0x1, {1}).can(2, 0x2, std::vector<uint8_t>(64, 2), kCanFdBrs);
   table->updateIdentifierTable(batch.data(), batch.size() - 8, kDefaults);

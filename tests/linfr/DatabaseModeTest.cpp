@@ -39,9 +39,9 @@ TEST(DatabaseModeTest, ClusterBaudRateReplacesTheHostsValue) {
       // Without a socket every send fails quietly; only the settings are watched here.
       HostConnection connection{platform::net::kInvalidSocket, ConnectionSetup{}};
       SessionSettings& settings = connection.settings;
-      settings.runMode.Set("NORMAL");
-      settings.alias.Set("SimDB");
-      settings.cluster.Set(c.cluster);
+      settings.runMode.set("NORMAL");
+      settings.alias.set("SimDB");
+      settings.cluster.set(c.cluster);
       settings.baudRate.store(kHostBaudRate);
       EXPECT_EQ(c.open(connection), 0);
       EXPECT_EQ(settings.baudRate.load(), c.clusterBaudRate);

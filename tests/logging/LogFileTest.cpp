@@ -63,7 +63,7 @@ TEST_F(LogFileTest, EmptyRunLeavesTheHeaderOfItsType) {
 TEST_F(LogFileTest, SecondRunWithTheSameNameKeepsOnlyItsOwnFrames) {
   for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
     settings().logFileType.store(type);
-    settings().logFileName.Set("again");
+    settings().logFileName.set("again");
     const std::string file = "again" + LogFileExtension(type);
     for (uint8_t run : {1, 2}) {
       UseBus(driver::BusKind::kCan);
@@ -87,7 +87,7 @@ TEST_F(LogFileTest, SecondRunWithTheSameNameKeepsOnlyItsOwnFrames) {
 TEST_F(LogFileTest, UnsafeNamesCreateNothingAndReportTwice) {
   // The directory exists before, so that only the log's own file could appear.
   settings().logFileType.store(kLogTypeText);
-  settings().logFileName.Set("ok");
+  settings().logFileName.set("ok");
   OpenLogFile(log(), kHeader);
   CloseLogFile(log());
   fs::remove(ServiceDirectory() / "ok.txt");
@@ -96,7 +96,7 @@ TEST_F(LogFileTest, UnsafeNamesCreateNothingAndReportTwice) {
        std::vector<std::string>{"..\\..\\..\\escaped", "../../../escaped", "sub/escaped", ".", "..",
                                 "\\escaped", std::string("cut\0..\\x", 8)}) {
     for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
-      settings().logFileName.Set(name);
+      settings().logFileName.set(name);
       settings().logFileType.store(type);
       OpenLogFile(log(), kHeader);
       CloseLogFile(log());
@@ -142,7 +142,7 @@ TEST_F(LogFileTest, OpenFailuresReportAndSkipTheRun) {
   for (const Case& c : cases) {
     UseBus(driver::BusKind::kCan);
     settings().logFileType.store(c.type);
-    settings().logFileName.Set(c.name);
+    settings().logFileName.set(c.name);
     c.arrange();
     OpenLogFile(log(), kHeader);
     const std::vector<uint8_t> batch = OneCanFrame(0);
@@ -163,7 +163,7 @@ TEST_F(LogFileTest, CloseWithoutAnOpenSendsNothing) {
 }
 
 TEST_F(LogFileTest, TypeChangedDuringTheRunKeepsTheFileItsFormat) {
-  settings().logFileName.Set("steady");
+  settings().logFileName.set("steady");
   OpenLogFile(log(), kHeader);
   settings().logFileType.store(kLogTypeBinary);
   const std::vector<uint8_t> batch = OneCanFrame(7);
@@ -202,7 +202,7 @@ class FullDiskTest : public LogSessionTest {
 TEST_F(FullDiskTest, WritesBeyondTheLimitReportIncompleteLinesAndTheRunGoesOn) {
   for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
     settings().logFileType.store(type);
-    settings().logFileName.Set("full");
+    settings().logFileName.set("full");
     OpenLogFile(log(), kHeader);
     LimitFileSize();
     constexpr int kBatches = 4000;  // far more than the limit holds in either format

@@ -30,7 +30,7 @@ class LogWritersTest : public LogSessionTest {
                     uint32_t frames) {
     UseBus(bus.bus);
     settings().logFileType.store(type);
-    settings().logFileName.Set("w");
+    settings().logFileName.set("w");
     OpenLogFile(log(), bus.header);
     bus.writer(log(), batch.data(), static_cast<uint32_t>(batch.size()), frames);
     CloseLogFile(log());

@@ -60,8 +60,8 @@ std::vector<Row> PortNameRows() {
       One("PortNameCanSetsBusTypeAndInterfaceName", kSetPort + "CAN3",
           {"<ACK: SET_PROP_SESSION_PORTNAME CAN3>"},
           [](auto& c) {
-            return c.busType == driver::BusKind::kCan && S(c).portName.Get() == "CAN3" &&
-                   S(c).interfaceName.Get() == "CAN3@qv_corle_tarvix";
+            return c.busType == driver::BusKind::kCan && S(c).portName.get() == "CAN3" &&
+                   S(c).interfaceName.get() == "CAN3@qv_corle_tarvix";
           }),
       One("PortNameLinSetsBusTypeTwo", kSetPort + "LIN1", {"<ACK: SET_PROP_SESSION_PORTNAME LIN1>"},
           [](auto& c) { return c.busType == driver::BusKind::kLin; }),
@@ -74,18 +74,18 @@ std::vector<Row> PortNameRows() {
        {{kSetPort + "CAN1", {"<ACK: SET_PROP_SESSION_PORTNAME CAN1>"}},
         {kSetPort + "ETH1", {"<ERROR: WRONG PORT NAME>\n"}}},
        [](auto& c) {
-         return c.busType == driver::BusKind::kCan && S(c).portName.Get() == "ETH1" &&
-                S(c).interfaceName.Get() == "ETH1@qv_corle_tarvix";
+         return c.busType == driver::BusKind::kCan && S(c).portName.get() == "ETH1" &&
+                S(c).interfaceName.get() == "ETH1@qv_corle_tarvix";
        }},
       One("PortNameEmptyIsAnErrorAndStoresTheSuffixAlone", kSetPort,
           {"<ERROR: SET_PROP_SESSION_PORTNAME: empty paramter>\n"},
           [](auto& c) {
             return c.busType == driver::BusKind::kNone &&
-                   S(c).interfaceName.Get() == "@qv_corle_tarvix";
+                   S(c).interfaceName.get() == "@qv_corle_tarvix";
           }),
       One("PortNameKeepsAHostLineEndInTheValue", kSetPort + "CAN1\n",
           {"<ACK: SET_PROP_SESSION_PORTNAME CAN1\n>"},
-          STORED(interfaceName.Get() == "CAN1\n@qv_corle_tarvix")),
+          STORED(interfaceName.get() == "CAN1\n@qv_corle_tarvix")),
       One("PortNameLongerThan200CharactersIsAnsweredInFull", kSetPort + "CAN" + kLongTail,
           {"<ACK: SET_PROP_SESSION_PORTNAME CAN" + kLongTail + ">"}),
   };
@@ -205,34 +205,34 @@ std::vector<Row> SessionLockedRows() {
           {"<ERROR: SET_PROP_SESSION_TERMINATION: Value range error>\n"},
           STORED(termination == 0xFFFFFFFFu)),
       One("RunModeNormal", "SET_PROP_SESSION_RUNMODE=NORMAL",
-          {"<ACK: SET_PROP_SESSION_RUNMODE NORMAL> \n"}, STORED(runMode.Get() == "NORMAL")),
+          {"<ACK: SET_PROP_SESSION_RUNMODE NORMAL> \n"}, STORED(runMode.get() == "NORMAL")),
       One("RunModeWordAnywhereInTheText", "SET_PROP_SESSION_RUNMODE=XNORMALX",
           {"<ACK: SET_PROP_SESSION_RUNMODE XNORMALX> \n"}),
       One("RunModeWithoutAKnownWordIsARangeErrorAndStaysStored", "SET_PROP_SESSION_RUNMODE=MASTER",
           {"<ERROR: SET_PROP_SESSION_RUNMODE: Value range error>\n"},
-          STORED(runMode.Get() == "MASTER")),
+          STORED(runMode.get() == "MASTER")),
       Switch("ListenOnlyTakesOnlyZeroOrOne", "SET_PROP_SESSION_LISTEN_ONLY",
              STORED(listenOnly == 1)),
       Switch("LogBusErrorFramesTakesOnlyZeroOrOne", "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES",
              STORED(logBusErrorFrames == 1)),
       One("AliasKeepsEverythingAfterTheFirstEquals", "SET_PROP_SESSION_ALIAS=a=b",
-          {"<ACK: SET_PROP_SESSION_ALIAS a=b> \n"}, STORED(alias.Get() == "a=b")),
+          {"<ACK: SET_PROP_SESSION_ALIAS a=b> \n"}, STORED(alias.get() == "a=b")),
       One("AliasEmptyIsAcknowledged",
           "SET_PROP_SESSION_ALIAS=", {"<ACK: SET_PROP_SESSION_ALIAS > \n"}),
       One("AliasLongerThan200CharactersIsAnsweredInFull", "SET_PROP_SESSION_ALIAS=" + kLongTail,
           {"<ACK: SET_PROP_SESSION_ALIAS " + kLongTail + "> \n"}),
       One("Cluster", "SET_PROP_SESSION_CLUSTER=Body", {"<ACK: SET_PROP_SESSION_CLUSTER Body> \n"},
-          STORED(cluster.Get() == "Body")),
+          STORED(cluster.get() == "Body")),
   };
 }
 
 std::vector<Row> LogNameRows() {
   const std::string name = "SET_PROP_LOGFILE_NAME=";
-  auto isDefault = STORED(logFileName.Get() == "KelvaneLog");
+  auto isDefault = STORED(logFileName.get() == "KelvaneLog");
   return {
       One("LogFileNameIsStored", name + "drive1.run2",
           {"<ACK: SET_PROP_LOGFILE_NAME drive1.run2> \n"},
-          STORED(logFileName.Get() == "drive1.run2")),
+          STORED(logFileName.get() == "drive1.run2")),
       One("LogFileNameEmptyGivesTheErrorThenTheDefaultName", name, {kNoValidName, kKelvaneLogAck},
           isDefault),
       One("LogFileNameWithBackslashIsNoValidName", name + "..\\..\\evil",
@@ -245,12 +245,12 @@ std::vector<Row> LogNameRows() {
           {"<ACK: SET_PROP_LOGFILE_NAME " + kLongTail + "> \n"}),
       One("VoraGroupNameHasNoLineEnd", "SET_PROP_LOGFILE_VORA_GROUP_NAME=Drive",
           {"<ACK: SET_PROP_LOGFILE_VORA_GROUP_NAME Drive>"},
-          STORED(voraGroupName.Get() == "Drive")),
+          STORED(voraGroupName.get() == "Drive")),
       One("VoraGroupNameEmpty", "SET_PROP_LOGFILE_VORA_GROUP_NAME=",
           {"<ERROR: SET_PROP_LOGFILE_VORA_GROUP_NAME: empty paramter>\n"}),
       One("VoraChannelNameHasNoLineEnd", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=Frames",
           {"<ACK: SET_PROP_LOGFILE_VORA_CHANNEL_NAME Frames>"},
-          STORED(voraChannelName.Get() == "Frames")),
+          STORED(voraChannelName.get() == "Frames")),
       One("VoraChannelNameEmpty", "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=",
           {"<ERROR: SET_PROP_LOGFILE_VORA_CHANNEL_NAME: empty paramter>\n"}),
   };

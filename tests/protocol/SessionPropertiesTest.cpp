@@ -102,9 +102,9 @@ TEST_F(SessionPropertiesTest, SessionSettingsAreRefusedNamingTheBusOfTheSession)
   const nKV_DLL300::SessionSettings& stored = connection_->settings;
   EXPECT_EQ(stored.logTransmittedFrames.load(), 1);
   EXPECT_EQ(stored.termination.load(), 1u);
-  EXPECT_EQ(stored.runMode.Get(), "NORMAL");
-  EXPECT_EQ(stored.alias.Get(), "SimDB");
-  EXPECT_EQ(stored.cluster.Get(), "Body");
+  EXPECT_EQ(stored.runMode.get(), "NORMAL");
+  EXPECT_EQ(stored.alias.get(), "SimDB");
+  EXPECT_EQ(stored.cluster.get(), "Body");
 }
 
 TEST_F(SessionPropertiesTest, RangeErrorComesBeforeTheRefusalAndShowsNoSession) {
@@ -121,7 +121,7 @@ TEST_F(SessionPropertiesTest, SessionOfNoKnownBusGetsNoReplyButTheValueIsStored)
   StartSession(driver::BusKind::kNone);
   nKV_DLL300::HandleMessageText(*connection_, "SET_PROP_SESSION_CLUSTER=Body");
   ExpectNothingMore();
-  EXPECT_EQ(connection_->settings.cluster.Get(), "Body");
+  EXPECT_EQ(connection_->settings.cluster.get(), "Body");
 }
 
 // Replies marked "with session" carry the session's count and status in bytes 12 to 19; all
@@ -169,7 +169,7 @@ TEST_F(SessionPropertiesTest, LogFileNameIsRefusedOnlyWhileASessionLogs) {
                 {"<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n"}, kHidden);
   ExpectReplies("SET_PROP_LOGFILE_NAME=", {"<ERROR: SET_PROP_LOGFILE_NAME, logging is active>\n"},
                 kHidden);
-  EXPECT_EQ(connection_->settings.logFileName.Get(), "first");
+  EXPECT_EQ(connection_->settings.logFileName.get(), "first");
   ExpectReplies("SET_PROP_LOGFILE=0", {"<ACK: SET_PROP_LOGFILE 0> \n"}, kHidden);
   ExpectReplies("SET_PROP_LOGFILE_NAME=second", {"<ACK: SET_PROP_LOGFILE_NAME second> \n"},
                 kHidden);

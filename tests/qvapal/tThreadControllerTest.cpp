@@ -61,26 +61,26 @@ class GatedBody final : public iThread {
 // The system's threads with switches that make creation or the priority change fail.
 class FaultyThreads final : public platform::ThreadSystem {
  public:
-  bool Create(platform::ThreadStartRoutine routine, void* argument, platform::ThreadHandle& handle,
+  bool create(platform::ThreadStartRoutine routine, void* argument, platform::ThreadHandle& handle,
               uint32_t& threadId) override {
     ++createCalls;
     if (failCreate) return false;
-    return system.Create(routine, argument, handle, threadId);
+    return system.create(routine, argument, handle, threadId);
   }
-  int32_t GetPriority(platform::ThreadHandle handle) override {
-    return abnormalPriority ? 2 : system.GetPriority(handle);
+  int32_t getPriority(platform::ThreadHandle handle) override {
+    return abnormalPriority ? 2 : system.getPriority(handle);
   }
-  bool SetPriority(platform::ThreadHandle handle, int32_t priority) override {
-    return refusePriority ? false : system.SetPriority(handle, priority);
+  bool setPriority(platform::ThreadHandle handle, int32_t priority) override {
+    return refusePriority ? false : system.setPriority(handle, priority);
   }
-  bool SetName(platform::ThreadHandle handle, const char* name) override {
+  bool setName(platform::ThreadHandle handle, const char* name) override {
     lastName = name;
-    return system.SetName(handle, name);
+    return system.setName(handle, name);
   }
-  void Wait(platform::ThreadHandle handle) override { system.Wait(handle); }
-  void Close(platform::ThreadHandle& handle) override {
+  void wait(platform::ThreadHandle handle) override { system.wait(handle); }
+  void close(platform::ThreadHandle& handle) override {
     ++closeCalls;
-    system.Close(handle);
+    system.close(handle);
   }
 
   platform::ThreadSystem& system = platform::SystemThreads();

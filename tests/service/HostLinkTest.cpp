@@ -54,10 +54,10 @@ TEST(HostLinkTest, NewConnectionStartsFromTheDefaults) {
   EXPECT_EQ(connection.busType.load(), driver::BusKind::kNone);
   EXPECT_EQ(connection.settings.txTimeData.load(), 1000u);
   EXPECT_EQ(connection.settings.keySlot.load(), 0xFFFFFFFFu);
-  EXPECT_EQ(connection.settings.runMode.Get(), "SUBORDINATE");
-  EXPECT_EQ(connection.commandTable.Find("CMD_HEARTBEAT"), 6);
-  EXPECT_EQ(connection.propertyTable.Find("SET_PROP_SESSION_NODE_NAME"), 35);
-  EXPECT_EQ(connection.propertyTable.Find("SET_PROP_SESSION_NODE_NAMEX"), 0);
+  EXPECT_EQ(connection.settings.runMode.get(), "SUBORDINATE");
+  EXPECT_EQ(connection.commandTable.find("CMD_HEARTBEAT"), 6);
+  EXPECT_EQ(connection.propertyTable.find("SET_PROP_SESSION_NODE_NAME"), 35);
+  EXPECT_EQ(connection.propertyTable.find("SET_PROP_SESSION_NODE_NAMEX"), 0);
   EXPECT_TRUE(connection.heartbeatWatch.isRunning);
 }
 

@@ -29,8 +29,8 @@ nKV_DLL300::HostConnection& CanSessionTest::ConnectionAt(size_t slot) {
 }
 
 void CanSessionTest::UsePort(nKV_DLL300::HostConnection& connection, const std::string& port) {
-  connection.settings.portName.Set(port);
-  connection.settings.interfaceName.Set(port + "@qv_corle_tarvix");
+  connection.settings.portName.set(port);
+  connection.settings.interfaceName.set(port + "@qv_corle_tarvix");
   connection.busType.store(driver::BusKind::kCan);
 }
 

@@ -135,7 +135,7 @@ TEST_F(CanSessionTest, StatisticsShowFrameRatesAndTheBusLoadOfTheDefaultTraffic)
 TEST_F(CanSessionTest, FdSessionOnCan5SeesFdFramesAtTheDataRate) {
   tarvix::StartRecording();
   kvhost::HostClient host = StartedHost(0, "CAN5", [](SessionSettings& s) {
-    s.runMode.Set("NORMAL");
+    s.runMode.set("NORMAL");
     s.canIoMode = 2;
     s.baudRate = 500000;
     s.canFdBaudRate = 2000000;
@@ -174,9 +174,9 @@ TEST_F(CanSessionTest, FdSessionOnCan5SeesFdFramesAtTheDataRate) {
 
 TEST_F(CanSessionTest, DatabaseModeTakesBaudRateAndIoModeFromTheDatabase) {
   kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) {
-    s.runMode.Set("NORMAL");
-    s.alias.Set("SimDB");
-    s.cluster.Set("Body");
+    s.runMode.set("NORMAL");
+    s.alias.set("SimDB");
+    s.cluster.set("Body");
     s.baudRate = 125000;
     s.canIoMode = 1;
   });
@@ -216,7 +216,7 @@ TEST_F(CanSessionTest, J1939SessionClaimsItsAddressAndSeesExtendedFramesAsJ1939)
 
 TEST_F(CanSessionTest, WrongBaudRateSeesOnlyBusErrorFrames) {
   kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) {
-    s.runMode.Set("NORMAL");
+    s.runMode.set("NORMAL");
     s.baudRate = 250000;
     s.logBusErrorFrames = 1;
   });

@@ -82,7 +82,7 @@ TEST_F(CanSessionTest, CommandsOnARunningSessionAnswerWithTheirTexts) {
          0);
   EXPECT_EQ(ConnectionAt(0).busType.load(), driver::BusKind::kLin)
       << "the port is kept for the next session";
-  EXPECT_EQ(ConnectionAt(0).settings.interfaceName.Get(), "LIN1@qv_corle_tarvix");
+  EXPECT_EQ(ConnectionAt(0).settings.interfaceName.get(), "LIN1@qv_corle_tarvix");
   expect("SET_PROP_SESSION_LISTEN_ONLY=1", canRefusal, kvhost::kErrorText, 4);
   expect("CMD_SESSION_START", started, kvhost::kErrorText, 4);
   expect("CMD_TX_START", "<ACK: CMD_TX_START>\n", kvhost::kText, 4);
@@ -171,7 +171,7 @@ TEST_F(CanSessionTest, DriverFailureAtStartIsReportedAndEndsTheConnection) {
 TEST_F(CanSessionTest, RejectedBaudRateFailsTheStart) {
   kvhost::HostClient host = ConnectHost();
   UsePort(ConnectionAt(0), "CAN1");
-  ConnectionAt(0).settings.runMode.Set("NORMAL");  // built-in database at the host's rate: 0
+  ConnectionAt(0).settings.runMode.set("NORMAL");  // built-in database at the host's rate: 0
   ExpectStartFails(host, Formatted("<ERROR: %d>\n", driver::kInvalidPropertyValue));
 }
 

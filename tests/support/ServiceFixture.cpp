@@ -84,7 +84,7 @@ void ServiceFixture::StartService(bool requireListening) {
 }
 
 void ServiceFixture::StopService() {
-  if (service_) service_->Shutdown();
+  if (service_) service_->shutdown();
   service_.reset();
 }
 

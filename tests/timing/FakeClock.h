@@ -9,8 +9,8 @@ class FakeClock final : public iClockSource {
     InstallClockSource(this);
   }
   ~FakeClock() override { InstallClockSource(nullptr); }
-  uint64_t ReadCounter() override { return ticks; }
-  uint64_t CounterFrequency() override { return frequency; }
+  uint64_t readCounter() override { return ticks; }
+  uint64_t counterFrequency() override { return frequency; }
 
   uint64_t ticks = 0;
   uint64_t frequency;

@@ -84,8 +84,8 @@ class TransmitDriverCallsTest : public ::testing::Test {
  protected:
   void SetUp() override {
     tarvix::ResetToDefaults();
-    settings.portName.Set("CAN3");
-    settings.interfaceName.Set("CAN3@qv_corle_tarvix");
+    settings.portName.set("CAN3");
+    settings.interfaceName.set("CAN3@qv_corle_tarvix");
     settings.baudRate.store(kBaudRate);
     settings.canFdBaudRate.store(kDataBaudRate);
     frame.txIdentifier = 0x123;
@@ -93,7 +93,7 @@ class TransmitDriverCallsTest : public ::testing::Test {
     frame.SetTxPayload("1,2,3");
   }
   void TearDown() override {
-    frame.StopIfActive();
+    frame.stopIfActive();
     tarvix::ResetToDefaults();
   }
 

@@ -43,7 +43,7 @@ class TransmitTest : public CanSessionTest {
   // Slot 0: a CAN session on CAN3 at the test bus's rates, classic unless `canIoMode` says FD.
   kvhost::HostClient Transmitter(uint32_t canIoMode = 0, uint8_t logTransmitted = 0) {
     return StartedHost(0, "CAN3", [&](SessionSettings& s) {
-      s.runMode.Set("NORMAL");
+      s.runMode.set("NORMAL");
       s.baudRate.store(500000);
       s.canFdBaudRate.store(2000000);
       s.canIoMode.store(canIoMode);

@@ -118,17 +118,17 @@ INSTANTIATE_TEST_SUITE_P(Lists, SetTxPayloadTest,
 
 TEST(TransmitDatabaseNameTest, SameSecondDrawsSameNumberButOpenNamesStayDistinct) {
   using nKV_DLL300::TransmitDatabaseName;
-  EXPECT_EQ(TransmitDatabaseName::Draw(1234), TransmitDatabaseName::Draw(1234));
-  EXPECT_GE(TransmitDatabaseName::Draw(0xFFFFFFFF), 0);
-  EXPECT_LE(TransmitDatabaseName::Draw(0xFFFFFFFF), 32767);
+  EXPECT_EQ(TransmitDatabaseName::draw(1234), TransmitDatabaseName::draw(1234));
+  EXPECT_GE(TransmitDatabaseName::draw(0xFFFFFFFF), 0);
+  EXPECT_LE(TransmitDatabaseName::draw(0xFFFFFFFF), 32767);
 
-  const int first = TransmitDatabaseName::Acquire();
-  const int second = TransmitDatabaseName::Acquire();
+  const int first = TransmitDatabaseName::acquire();
+  const int second = TransmitDatabaseName::acquire();
   EXPECT_NE(first, second);
-  EXPECT_EQ(TransmitDatabaseName::Format(first), ":memory" + std::to_string(first));
-  TransmitDatabaseName::Release(first);
-  TransmitDatabaseName::Release(second);
-  TransmitDatabaseName::Release(-1);  // nothing held: no effect
+  EXPECT_EQ(TransmitDatabaseName::format(first), ":memory" + std::to_string(first));
+  TransmitDatabaseName::release(first);
+  TransmitDatabaseName::release(second);
+  TransmitDatabaseName::release(-1);  // nothing held: no effect
 }
 
 }  // namespace

@@ -70,10 +70,10 @@ TEST_P(LocateTest, NamesTheLibraryFileAndLoadsOnlyFromThere) {
   if (c.os != nullptr) setenv("OS", c.os, 1);
   if (c.registry != nullptr) WriteRegistry(c.registry);
   if (c.installed != nullptr) Install(c.installed);
-  library_.Locate();
+  library_.locate();
   EXPECT_EQ(library_.path(), c.path);
   EXPECT_EQ(library_.platformCode(), c.platformCode);
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), c.loads ? 0 : kVorLibraryNotLoaded);
+  EXPECT_EQ(ThrownCode([&] { library_.load(); }), c.loads ? 0 : kVorLibraryNotLoaded);
   EXPECT_EQ(library_.loaded(), c.loads);
 }
 
@@ -122,9 +122,9 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_F(MeasurementLibraryTest, PlatformIsDetectedOnceAndKept) {
   setenv("OS", "PHARLAP", 1);
-  library_.Locate();
+  library_.locate();
   unsetenv("OS");
-  library_.Locate();
+  library_.locate();
   EXPECT_EQ(library_.platformCode(), 1);
   EXPECT_EQ(library_.path(), "vora.dll");
 }
@@ -135,14 +135,14 @@ TEST_F(MeasurementLibraryTest, RefusedLibraryIsLoadedByALaterCallOnceInstalled) 
   for (const char* first : {static_cast<const char*>(nullptr), TARVIX_PATH}) {
     MeasurementLibrary library;
     if (first != nullptr) Install(kvtest::kVoraBelowDrive, first);
-    library.Locate();
-    EXPECT_EQ(ThrownCode([&] { library.Load(); }), kVorLibraryNotLoaded);
-    EXPECT_EQ(ThrownCode([&] { library.Load(); }), kVorLibraryNotLoaded);
+    library.locate();
+    EXPECT_EQ(ThrownCode([&] { library.load(); }), kVorLibraryNotLoaded);
+    EXPECT_EQ(ThrownCode([&] { library.load(); }), kVorLibraryNotLoaded);
     EXPECT_FALSE(library.loaded());
     Install();
-    EXPECT_EQ(ThrownCode([&] { library.Load(); }), 0);
+    EXPECT_EQ(ThrownCode([&] { library.load(); }), 0);
     EXPECT_TRUE(library.loaded());
-    library.Unload();
+    library.unload();
     fs::remove(drive_.Native(kvtest::kVoraBelowDrive));
   }
 }
@@ -150,8 +150,8 @@ TEST_F(MeasurementLibraryTest, RefusedLibraryIsLoadedByALaterCallOnceInstalled) 
 // Unlocated, not loaded or unloaded, every entry point refuses; loaded, they write a file.
 TEST_F(MeasurementLibraryTest, EntryPointsWorkOnlyWhileLoaded) {
   Install();
-  EXPECT_EQ(ThrownCode([&] { library_.Load(); }), kVorLibraryNotLoaded);
-  library_.Locate();
+  EXPECT_EQ(ThrownCode([&] { library_.load(); }), kVorLibraryNotLoaded);
+  library_.locate();
   int32_t handle = -1;
   const std::vector<std::function<void()>> calls = {
       [&] { library_.FileOpenExA("C:\\x.vora", 2, 2, 4713, &handle); },
@@ -162,13 +162,13 @@ TEST_F(MeasurementLibraryTest, EntryPointsWorkOnlyWhileLoaded) {
       [&] { library_.FileClose(0); }};
   for (const auto& call : calls) EXPECT_EQ(ThrownCode(call), kVorLibraryNotLoaded);
   EXPECT_EQ(handle, -1);
-  library_.Load();
+  library_.load();
   int32_t file = -1;
   EXPECT_EQ(library_.FileOpenExA("C:\\run.vora", 2, 2, 4713, &file), 0);
   ASSERT_NE(file, -1);
   EXPECT_EQ(library_.FileClose(file), 0);
   EXPECT_TRUE(fs::exists(drive_.Native("run.vora")));
-  library_.Unload();
+  library_.unload();
   EXPECT_FALSE(library_.loaded());
   handle = -1;
   for (const auto& call : calls) EXPECT_EQ(ThrownCode(call), kVorLibraryNotLoaded);
@@ -179,17 +179,17 @@ TEST_F(MeasurementLibraryTest, EntryPointsWorkOnlyWhileLoaded) {
 // dynamic loader no longer holds it.
 TEST_F(MeasurementLibraryTest, ConcurrentFirstLoadsLoadTheLibraryOnce) {
   Install();
-  library_.Locate();
+  library_.locate();
   constexpr int kThreads = 8;
   std::vector<std::thread> threads;
   std::vector<int32_t> codes(kThreads, -1);
   for (int i = 0; i < kThreads; ++i) {
-    threads.emplace_back([&, i] { codes[i] = ThrownCode([&] { library_.Load(); }); });
+    threads.emplace_back([&, i] { codes[i] = ThrownCode([&] { library_.load(); }); });
   }
   for (std::thread& t : threads) t.join();
   EXPECT_EQ(codes, std::vector<int32_t>(kThreads, 0));
-  library_.Load();
-  EXPECT_EQ(ThrownCode([&] { library_.Unload(); }), 0);
+  library_.load();
+  EXPECT_EQ(ThrownCode([&] { library_.unload(); }), 0);
   const std::string native = drive_.Native(kvtest::kVoraBelowDrive).string();
   void* still = dlopen(native.c_str(), RTLD_NOW | RTLD_NOLOAD);
   EXPECT_EQ(still, nullptr) << "the library was opened more than once";

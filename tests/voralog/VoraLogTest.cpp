@@ -87,9 +87,9 @@ TEST_P(VoraLayoutTest, ChannelHoldsTheBinaryLogRecordsAndTheThreeProperties) {
   const LayoutCase& c = GetParam();
   UseBus(c.bus);
   settings().canIoMode.store(c.canIoMode);
-  settings().logFileName.Set("layout");
-  settings().voraGroupName.Set("Bus");
-  settings().voraChannelName.Set("Frames");
+  settings().logFileName.set("layout");
+  settings().voraGroupName.set("Bus");
+  settings().voraChannelName.set("Frames");
   std::vector<uint8_t> batch;
   for (const FrameSpec& f : c.frames) AppendFrame(batch, f, 0xEE);
   RunWith({batch, batch});
@@ -161,8 +161,8 @@ TEST_F(VoraLogTest, NamesEchoFramesAndRepeatedRuns) {
                                                                   {"Body bus", "CAN1 @ 500k", 1},
                                                                   {"a/b", "50%", 0},
                                                                   {"it's", ".hidden", 1}}) {
-    settings().voraGroupName.Set(group);
-    settings().voraChannelName.Set(channel);
+    settings().voraGroupName.set(group);
+    settings().voraChannelName.set(channel);
     settings().logTransmittedFrames.store(logTransmitted);
     RunWith({batch});
     const std::optional<ChannelContents> contents = Channel(".vora");
@@ -176,7 +176,7 @@ TEST_F(VoraLogTest, NamesEchoFramesAndRepeatedRuns) {
 
 // A file the library cannot create (its directory is a file) is silent: the run logs nothing.
 TEST_F(VoraLogTest, FileTheLibraryCannotOpenIsSilentAndSkipsTheRun) {
-  settings().logFileName.Set("blocked");
+  settings().logFileName.set("blocked");
   fs::create_directories(ServiceDirectory() / "blocked.vora");
   RunWith({Batch({{.identifier = 0x100}})});
   EXPECT_TRUE(SentMessages().empty());
