@@ -39,7 +39,7 @@ class HostConnection {
   SessionSettings settings;  // see SessionSettings for its guards
   const MessageTable commandTable;
   const MessageTable propertyTable;
-  std::atomic<driver::BusKind> busType{driver::BusKind::kNone};
+  std::atomic<driver::BusKind> busType{driver::BusKind::kNone};  // as the port name chose it
   uint32_t driverVersion[kDriverVersionCount] = {};  // set at construction, read-only after
   std::atomic<int32_t> lastTcpError{0};              // result of the last send on this connection
   Stopwatch heartbeatWatch;                          // service thread only

@@ -19,9 +19,9 @@ class LinkedSession {
   LinkedSession(const LinkedSession&) = delete;
   LinkedSession& operator=(const LinkedSession&) = delete;
 
-  // The bus this session was created for. It stays what it was even when the
-  // host names another bus with SET_PROP_SESSION_PORTNAME while the session runs: bus-specific
-  // commands and texts follow this kind, not the connection's busType.
+  // The bus this session was created for. It stays what it was even when the host names another
+  // bus with SET_PROP_SESSION_PORTNAME while the session runs: bus-specific commands and texts
+  // follow this kind, not the connection's busType.
   const driver::BusKind busType;
 
   // Used entries of the identifier table: written by the poll thread, read by SendReply anywhere.

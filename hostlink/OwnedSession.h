@@ -15,7 +15,7 @@ class SessionDeleter {
  public:
   SessionDeleter() = default;
   template <class Session>
-  SessionDeleter(std::default_delete<Session>) noexcept  // NOLINT: converting on purpose
+  SessionDeleter(std::default_delete<Session>) noexcept  // implicit, so that the pointer converts
       : stop_([](CBusSystem* session) { return static_cast<Session*>(session)->stop(); }),
         delete_([](CBusSystem* session) { delete static_cast<Session*>(session); }) {}
 
