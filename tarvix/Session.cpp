@@ -13,6 +13,7 @@
 #include "driver/Status.h"
 #include "tarvix/CanBus.h"
 #include "tarvix/FlexRayBus.h"
+#include "tarvix/FrameRecords.h"
 #include "tarvix/FrameTiming.h"
 #include "tarvix/SimClock.h"
 
@@ -39,7 +40,7 @@ void Nap(int64_t deadlineNs, int64_t nextEventNs) {
 }  // namespace
 
 Session::Session(SessionSetup setup, std::shared_ptr<Bus> bus)
-    : setup_(std::move(setup)), bus_(std::move(bus)) {
+    : DriverSession(std::move(setup)), bus_(std::move(bus)) {
   settings_.baudRate = setup_.cluster.baudRate;
   settings_.dataBaudRate = setup_.cluster.dataBaudRate;
   settings_.transceiver = setup_.transceiver;
@@ -230,46 +231,12 @@ int32_t Session::read(void* buffer, uint32_t size, double timeoutS, uint32_t* by
   }
 }
 
-int32_t Session::parseRecords(const uint8_t* data, uint32_t size,
-                              std::vector<std::pair<SimFrame, const FrameDefinition*>>& out) const {
-  uint32_t offset = 0;
-  while (offset < size) {
-    driver::RawFrameHeader h;
-    if (size - offset < sizeof h) return driver::kInvalidFrame;
-    std::memcpy(&h, data + offset, sizeof h);
-    const uint32_t frameSize = driver::kRawFrameHeaderSize + driver::RawPayloadArea(h.length);
-    if (h.type == driver::kFrameJ1939 || frameSize > size - offset) return driver::kInvalidFrame;
-    const FrameDefinition* def = setup_.frames.size() == 1 ? &setup_.frames.front() : nullptr;
-    for (const FrameDefinition& d : setup_.frames) {
-      if (def == nullptr && d.identifier == (h.identifier & driver::kExtendedIdMask)) def = &d;
-    }
-    if (def == nullptr) return driver::kFrameNotFound;
-    const bool fd = def->canIoMode != driver::kFrameCanIoModeClassic;
-    if (h.length > (fd ? driver::kMaxCanFdPayload : 8u)) return driver::kInvalidFrame;
-    SimFrame f;
-    f.identifier = def->identifier | (def->extended ? driver::kExtendedIdFlag : 0);
-    const bool remote = h.type == driver::kFrameCanRemote ||
-                        def->timingType == driver::kTimingCyclicRemote ||
-                        def->timingType == driver::kTimingEventRemote;
-    f.type = remote                                           ? driver::kFrameCanRemote
-             : def->canIoMode == driver::kFrameCanIoModeFdBrs ? driver::kFrameCanFdBrsData
-             : fd                                             ? driver::kFrameCanFdData
-                                                              : driver::kFrameCanData;
-    f.length = h.length;
-    if (!remote)
-      std::memcpy(f.payload.data(), data + offset + driver::kRawFrameHeaderSize, h.length);
-    f.origin = setup_.interfaceIndex;
-    out.emplace_back(f, def);
-    offset += frameSize;
-  }
-  return out.empty() ? driver::kInvalidFrame : driver::kSuccess;
-}
-
 int32_t Session::write(const void* frames, uint32_t size, double timeoutS) {
   if (frames == nullptr) return driver::kBufferMissing;
   if (!isOutput()) return driver::kWrongSessionMode;
-  std::vector<std::pair<SimFrame, const FrameDefinition*>> records;
-  const int32_t parsed = parseRecords(static_cast<const uint8_t*>(frames), size, records);
+  std::vector<FrameRecord> records;
+  const int32_t parsed =
+      ParseFrameRecords(setup_, static_cast<const uint8_t*>(frames), size, records);
   if (parsed != driver::kSuccess) return parsed;
   const int64_t deadline = DeadlineOf(timeoutS, NowNs());
   size_t done = 0;

@@ -5,8 +5,6 @@
 
 #include "driver/Properties.h"
 #include "driver/Status.h"
-#include "tarvix/CanBus.h"
-#include "tarvix/Session.h"
 
 namespace tarvix {
 namespace {
@@ -30,11 +28,11 @@ T Load(const void* p) {
 }
 
 template <typename T>
-void Store(void* p, T v) {
+void Put(void* p, T v) {
   std::memcpy(p, &v, sizeof v);
 }
 
-using Setter = int32_t (*)(Session&, SessionSettings&, const void*);
+using Setter = int32_t (*)(const SessionSetup&, SessionSettings&, const void*);
 using Getter = void (*)(const SessionSettings&, void*);
 
 struct Rule {
@@ -65,52 +63,52 @@ int32_t SetRange(uint32_t& field, const void* v, uint32_t max) {
   return driver::kSuccess;
 }
 
-}  // namespace
+int32_t SetBaudRate(const SessionSetup& setup, SessionSettings& st, const void* v) {
+  const uint64_t rate = Load<uint64_t>(v);
+  if (!ValidBaudRate(setup.cluster.protocol, rate)) return driver::kInvalidPropertyValue;
+  st.baudRate = rate;
+  return driver::kSuccess;
+}
 
-// Property handlers need the session's setup; they are members of this file's friend class.
-struct PropertyHandlers {
-  static int32_t BaudRate(Session& s, SessionSettings& st, const void* v) {
-    const uint64_t rate = Load<uint64_t>(v);
-    if (!ValidBaudRate(s.setup().cluster.protocol, rate)) return driver::kInvalidPropertyValue;
-    st.baudRate = rate;
-    return driver::kSuccess;
-  }
-  static int32_t DataBaudRate(Session&, SessionSettings& st, const void* v) {
-    const uint64_t rate = Load<uint64_t>(v);
-    // 0 runs the data phase at the nominal rate.
-    if (rate != 0 && (rate < kMinCanRate || rate > kMaxCanDataRate))
-      return driver::kInvalidPropertyValue;
-    st.dataBaudRate = rate;
-    return driver::kSuccess;
-  }
-};
-
-namespace {
+int32_t SetDataBaudRate(const SessionSetup&, SessionSettings& st, const void* v) {
+  const uint64_t rate = Load<uint64_t>(v);
+  // 0 runs the data phase at the nominal rate.
+  if (rate != 0 && (rate < kMinCanRate || rate > kMaxCanDataRate))
+    return driver::kInvalidPropertyValue;
+  st.dataBaudRate = rate;
+  return driver::kSuccess;
+}
 
 const Rule kRules[] = {
-    {driver::kPropBaudRate, 8, kCan | kLin | kFr | kOutput, true, PropertyHandlers::BaudRate,
-     [](const SessionSettings& s, void* v) { Store<uint64_t>(v, s.baudRate); }},
-    {driver::kPropCanFdBaudRate, 8, kCan | kOutput, true, PropertyHandlers::DataBaudRate,
-     [](const SessionSettings& s, void* v) { Store<uint64_t>(v, s.dataBaudRate); }},
+    {driver::kPropBaudRate, 8, kCan | kLin | kFr | kOutput, true, SetBaudRate,
+     [](const SessionSettings& s, void* v) { Put<uint64_t>(v, s.baudRate); }},
+    {driver::kPropCanFdBaudRate, 8, kCan | kOutput, true, SetDataBaudRate,
+     [](const SessionSettings& s, void* v) { Put<uint64_t>(v, s.dataBaudRate); }},
     {driver::kPropTermination, 4, kCan | kOutput, true,
-     [](Session&, SessionSettings& s, const void* v) { return SetRange(s.termination, v, 1); },
-     [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.termination); }},
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
+       return SetRange(s.termination, v, 1);
+     },
+     [](const SessionSettings& s, void* v) { Put<uint32_t>(v, s.termination); }},
     {driver::kPropTransceiverType, 4, kCan | kOutput, true,
-     [](Session&, SessionSettings& s, const void* v) {
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
        return SetRange(s.transceiver, v, kMaxTransceiverType);
      },
-     [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.transceiver); }},
+     [](const SessionSettings& s, void* v) { Put<uint32_t>(v, s.transceiver); }},
     {driver::kPropIsoFdMode, 4, kCan | kOutput, true,
-     [](Session&, SessionSettings& s, const void* v) { return SetRange(s.isoFdMode, v, 1); },
-     [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.isoFdMode); }},
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
+       return SetRange(s.isoFdMode, v, 1);
+     },
+     [](const SessionSettings& s, void* v) { Put<uint32_t>(v, s.isoFdMode); }},
     {driver::kPropListenOnly, 1, kCan | kLin | kOutput, true,
-     [](Session&, SessionSettings& s, const void* v) { return SetBool(s.listenOnly, v); },
-     [](const SessionSettings& s, void* v) { Store<uint8_t>(v, s.listenOnly); }},
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
+       return SetBool(s.listenOnly, v);
+     },
+     [](const SessionSettings& s, void* v) { Put<uint8_t>(v, s.listenOnly); }},
     {driver::kPropEcho, 1, kCan | kLin | kFr, false,
-     [](Session&, SessionSettings& s, const void* v) { return SetBool(s.echo, v); },
-     [](const SessionSettings& s, void* v) { Store<uint8_t>(v, s.echo); }},
+     [](const SessionSetup&, SessionSettings& s, const void* v) { return SetBool(s.echo, v); },
+     [](const SessionSettings& s, void* v) { Put<uint8_t>(v, s.echo); }},
     {driver::kPropBusErrorFrames, 2, kCan | kLin, false,
-     [](Session&, SessionSettings& s, const void* v) {
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
        s.busErrorFrames = static_cast<const uint8_t*>(v)[0] != 0;
        s.busErrorListenOnly = static_cast<const uint8_t*>(v)[1] != 0;
        return driver::kSuccess;
@@ -120,32 +118,38 @@ const Rule kRules[] = {
        static_cast<uint8_t*>(v)[1] = s.busErrorListenOnly;
      }},
     {driver::kPropLinNoResponseFrames, 1, kLin, false,
-     [](Session&, SessionSettings& s, const void* v) { return SetBool(s.linNoResponse, v); },
-     [](const SessionSettings& s, void* v) { Store<uint8_t>(v, s.linNoResponse); }},
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
+       return SetBool(s.linNoResponse, v);
+     },
+     [](const SessionSettings& s, void* v) { Put<uint8_t>(v, s.linNoResponse); }},
     {driver::kPropLinChecksumFlag, 1, kLin, false,
-     [](Session&, SessionSettings& s, const void* v) { return SetBool(s.linChecksum, v); },
-     [](const SessionSettings& s, void* v) { Store<uint8_t>(v, s.linChecksum); }},
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
+       return SetBool(s.linChecksum, v);
+     },
+     [](const SessionSettings& s, void* v) { Put<uint8_t>(v, s.linChecksum); }},
     {driver::kPropFlexRayTermination, 4, kFr, true,
-     [](Session&, SessionSettings& s, const void* v) {
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
        return SetRange(s.flexRayTermination, v, 1);
      },
-     [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.flexRayTermination); }},
+     [](const SessionSettings& s, void* v) { Put<uint32_t>(v, s.flexRayTermination); }},
     {driver::kPropFlexRayNullFrames, 1, kFr, false,
-     [](Session&, SessionSettings& s, const void* v) { return SetBool(s.nullFrames, v); },
-     [](const SessionSettings& s, void* v) { Store<uint8_t>(v, s.nullFrames); }},
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
+       return SetBool(s.nullFrames, v);
+     },
+     [](const SessionSettings& s, void* v) { Put<uint8_t>(v, s.nullFrames); }},
     {driver::kPropKeySlot, 4, kFr, true,
-     [](Session&, SessionSettings& s, const void* v) {
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
        return SetRange(s.keySlot, v, kMaxKeySlot);
      },
-     [](const SessionSettings& s, void* v) { Store<uint32_t>(v, s.keySlot); }},
+     [](const SessionSettings& s, void* v) { Put<uint32_t>(v, s.keySlot); }},
     {driver::kPropJ1939NodeName, 8, kCan | kJ1939, false,
-     [](Session&, SessionSettings& s, const void* v) {
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
        s.nodeName = Load<uint64_t>(v);
        return driver::kSuccess;
      },
-     [](const SessionSettings& s, void* v) { Store<uint64_t>(v, s.nodeName); }},
+     [](const SessionSettings& s, void* v) { Put<uint64_t>(v, s.nodeName); }},
     {driver::kPropJ1939NodeAddress, 4, kCan | kJ1939, false,
-     [](Session&, SessionSettings& s, const void* v) {
+     [](const SessionSetup&, SessionSettings& s, const void* v) {
        return SetRange(s.nodeAddress, v, driver::kJ1939NullAddress);
      },
      nullptr},  // read through the bus's claims (below)
@@ -159,10 +163,10 @@ const Rule* Find(uint32_t id) {
   return nullptr;
 }
 
-bool AppliesTo(const Rule& r, const Session& s) {
-  const SessionSetup& setup = s.setup();
+bool AppliesTo(const Rule& r, const PropertyTarget& t) {
+  const SessionSetup& setup = t.setup;
   if ((r.applies & kJ1939) && !setup.cluster.j1939) return false;
-  if (s.isOutput()) return (r.applies & kOutput) != 0;
+  if (t.output) return (r.applies & kOutput) != 0;
   const uint8_t bit = setup.cluster.protocol == driver::kProtocolLin       ? kLin
                       : setup.cluster.protocol == driver::kProtocolFlexRay ? kFr
                                                                            : kCan;
@@ -170,8 +174,8 @@ bool AppliesTo(const Rule& r, const Session& s) {
 }
 
 // Id, applicability and size checks shared by reads and writes.
-int32_t Check(const Rule* r, const Session& s, uint32_t size, const void* value) {
-  if (r == nullptr || !AppliesTo(*r, s)) return driver::kUnknownProperty;
+int32_t Check(const Rule* r, const PropertyTarget& t, uint32_t size, const void* value) {
+  if (r == nullptr || !AppliesTo(*r, t)) return driver::kUnknownProperty;
   if (size != r->size) return driver::kWrongPropertySize;
   if (value == nullptr) return driver::kBufferMissing;
   return driver::kSuccess;
@@ -179,37 +183,25 @@ int32_t Check(const Rule* r, const Session& s, uint32_t size, const void* value)
 
 }  // namespace
 
-int32_t SessionProperties::Set(Session& s, uint32_t id, uint32_t size, const void* value,
-                               int64_t nowNs) {
+int32_t SessionProperties::Store(const PropertyTarget& t, uint32_t id, uint32_t size,
+                                 const void* value) {
   const Rule* r = Find(id);
-  if (const int32_t st = Check(r, s, size, value); st != driver::kSuccess) return st;
+  if (const int32_t st = Check(r, t, size, value); st != driver::kSuccess) return st;
   if (r->set == nullptr) return driver::kPropertyReadOnly;
-  if (r->interfaceSetting && s.setup_.subordinate) return driver::kSubordinateReadOnly;
-  if (r->interfaceSetting && s.started_) return driver::kPropertyWhileRunning;
-  const int32_t st = r->set(s, s.settings_, value);
-  if (st != driver::kSuccess) return st;
-  if (id == driver::kPropJ1939NodeAddress) {
-    auto& bus = static_cast<CanBus&>(*s.bus_);
-    bus.release(&s);
-    // An address held by another node stays unclaimed: reads give 0xFE.
-    if (s.settings_.nodeAddress < driver::kJ1939NullAddress) {
-      bus.claim(&s, static_cast<uint8_t>(s.settings_.nodeAddress), s.settings_.nodeName,
-                s.setup_.interfaceIndex, nowNs);
-    }
-  }
-  s.updateOutputBlock();
-  return driver::kSuccess;
+  if (r->interfaceSetting && t.setup.subordinate) return driver::kSubordinateReadOnly;
+  if (r->interfaceSetting && t.started) return driver::kPropertyWhileRunning;
+  return r->set(t.setup, t.settings, value);
 }
 
-int32_t SessionProperties::Get(Session& s, uint32_t id, uint32_t size, void* value, int64_t nowNs) {
+int32_t SessionProperties::Load(const PropertyTarget& t, uint32_t id, uint32_t size, void* value) {
   const Rule* r = Find(id);
-  if (const int32_t st = Check(r, s, size, value); st != driver::kSuccess) return st;
+  if (const int32_t st = Check(r, t, size, value); st != driver::kSuccess) return st;
   if (id == driver::kPropJ1939NodeAddress) {
-    Store<uint32_t>(value, static_cast<const CanBus&>(*s.bus_).claimedAddress(&s, nowNs));
+    Put<uint32_t>(value, t.settings.nodeAddress);
   } else if (id == driver::kPropCanIoMode) {
-    Store<uint32_t>(value, s.setup_.cluster.canIoMode);
+    Put<uint32_t>(value, t.setup.cluster.canIoMode);
   } else {
-    r->get(s.settings_, value);
+    r->get(t.settings, value);
   }
   return driver::kSuccess;
 }

@@ -39,4 +39,24 @@ struct SessionSetup {
   uint32_t transmitQueueFrames = 1024;
 };
 
+// The settings a session's properties hold (see SessionProperties.cpp for ids and rules).
+struct SessionSettings {
+  uint64_t baudRate = 0;
+  uint64_t dataBaudRate = 0;
+  uint32_t termination = 0;
+  uint32_t transceiver = 0;
+  uint32_t isoFdMode = 0;
+  bool listenOnly = false;
+  bool echo = false;
+  uint8_t busErrorFrames = 0;      // byte 0 of 0x02100015: bus-error frames in the stream
+  uint8_t busErrorListenOnly = 0;  // byte 1 of 0x02100015: kept, reported back
+  bool linNoResponse = false;
+  bool linChecksum = false;
+  uint32_t flexRayTermination = 0;
+  bool nullFrames = false;
+  uint32_t keySlot = 0;
+  uint64_t nodeName = 0;
+  uint32_t nodeAddress = 0xFE;
+};
+
 }  // namespace tarvix

@@ -7,6 +7,7 @@
 #include "driver/Properties.h"
 #include "driver/States.h"
 #include "driver/Status.h"
+#include "tarvix/CanBus.h"
 #include "tarvix/FlexRayBus.h"
 #include "tarvix/LinBus.h"
 #include "tarvix/Session.h"
@@ -133,18 +134,39 @@ int32_t SessionState::Read(const Session& s, uint32_t stateId, uint32_t size, vo
   return driver::kSuccess;
 }
 
+void Session::claimAddress(int64_t nowNs) {
+  auto& bus = static_cast<CanBus&>(*bus_);
+  bus.release(this);
+  // An address held by another node stays unclaimed: reads give 0xFE.
+  if (settings_.nodeAddress < driver::kJ1939NullAddress) {
+    bus.claim(this, static_cast<uint8_t>(settings_.nodeAddress), settings_.nodeName,
+              setup_.interfaceIndex, nowNs);
+  }
+}
+
 int32_t Session::setProperty(uint32_t id, uint32_t size, const void* value) {
   std::lock_guard lock(bus_->mutex());
   const int64_t now = NowNs();
   bus_->advance(now);
-  return SessionProperties::Set(*this, id, size, value, now);
+  const int32_t status =
+      SessionProperties::Store({setup_, isOutput(), started_, settings_}, id, size, value);
+  if (status != driver::kSuccess) return status;
+  if (id == driver::kPropJ1939NodeAddress) claimAddress(now);
+  updateOutputBlock();
+  return driver::kSuccess;
 }
 
 int32_t Session::getProperty(uint32_t id, uint32_t size, void* value) {
   std::lock_guard lock(bus_->mutex());
   const int64_t now = NowNs();
   bus_->advance(now);
-  return SessionProperties::Get(*this, id, size, value, now);
+  const int32_t status =
+      SessionProperties::Load({setup_, isOutput(), started_, settings_}, id, size, value);
+  if (status == driver::kSuccess && id == driver::kPropJ1939NodeAddress) {
+    const uint32_t claimed = static_cast<const CanBus&>(*bus_).claimedAddress(this, now);
+    std::memcpy(value, &claimed, sizeof claimed);
+  }
+  return status;
 }
 
 int32_t Session::readState(uint32_t stateId, uint32_t size, void* state, uint32_t* faultCode) {

@@ -73,7 +73,7 @@ bool Simulator::installConfig(const HardwareConfig& config, std::string& error) 
 }
 
 void Simulator::install(std::shared_ptr<Hardware> hardware) {
-  std::unordered_map<uint32_t, std::shared_ptr<Session>> old;
+  std::unordered_map<uint32_t, std::shared_ptr<DriverSession>> old;
   {
     std::lock_guard lock(mutex_);
     old.swap(sessions_);
@@ -197,7 +197,7 @@ int32_t Simulator::setProperty(uint32_t ref, uint32_t id, uint32_t size, const v
   return status;
 }
 
-std::shared_ptr<Session> Simulator::session(uint32_t ref) {
+std::shared_ptr<DriverSession> Simulator::session(uint32_t ref) {
   std::lock_guard lock(mutex_);
   auto it = sessions_.find(ref);
   return it == sessions_.end() ? nullptr : it->second;
@@ -216,7 +216,7 @@ int32_t Simulator::notASession(uint32_t ref) {
 
 int32_t Simulator::clear(uint32_t ref) {
   if (RefKind(ref) == kRefSystem) return systemClose(ref);
-  std::shared_ptr<Session> s;
+  std::shared_ptr<DriverSession> s;
   {
     std::lock_guard lock(mutex_);
     auto it = sessions_.find(ref);

@@ -26,7 +26,7 @@ class Simulator {
   int32_t setProperty(uint32_t ref, uint32_t id, uint32_t size, const void* value);
   int32_t createSession(const char* database, const char* cluster, const char* frameList,
                         const char* interfaceName, uint32_t mode, uint32_t& ref);
-  std::shared_ptr<Session> session(uint32_t ref);
+  std::shared_ptr<DriverSession> session(uint32_t ref);
   int32_t clear(uint32_t ref);
   // kxStart and the like on a reference that is no session.
   int32_t notASession(uint32_t ref);
@@ -55,12 +55,12 @@ class Simulator {
                      SessionSetup& setup);
 
   std::mutex mutex_;
-  std::shared_ptr<Hardware> hardware_;                               // guarded by mutex_
-  std::unordered_map<uint32_t, std::shared_ptr<Session>> sessions_;  // guarded by mutex_
-  std::set<uint32_t> systems_;                                       // guarded by mutex_
-  DatabaseStore databases_;                                          // guarded by mutex_
-  uint32_t serial_ = 0;                                              // guarded by mutex_
-  uint32_t generation_ = 0;                                          // guarded by mutex_
+  std::shared_ptr<Hardware> hardware_;                                     // guarded by mutex_
+  std::unordered_map<uint32_t, std::shared_ptr<DriverSession>> sessions_;  // guarded by mutex_
+  std::set<uint32_t> systems_;                                             // guarded by mutex_
+  DatabaseStore databases_;                                                // guarded by mutex_
+  uint32_t serial_ = 0;                                                    // guarded by mutex_
+  uint32_t generation_ = 0;                                                // guarded by mutex_
 };
 
 }  // namespace tarvix

@@ -52,7 +52,7 @@ CallRecord Call(const char* operation, uint32_t ref, uint32_t id = 0, uint32_t s
   return c;
 }
 
-std::shared_ptr<Session> SessionOf(kxRef ref, kxStatus& status) {
+std::shared_ptr<DriverSession> SessionOf(kxRef ref, kxStatus& status) {
   auto s = Simulator::Instance().session(ref);
   if (s == nullptr) status = Simulator::Instance().notASession(ref);
   return s;
