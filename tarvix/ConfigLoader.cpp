@@ -9,6 +9,7 @@
 #include "driver/FrameTypes.h"
 #include "driver/Properties.h"
 #include "tarvix/FrameTiming.h"
+#include "tarvix/socketcan/DeviceBinding.h"
 
 namespace tarvix {
 namespace {
@@ -244,6 +245,14 @@ uint32_t InterfaceProtocol(const std::string& busName, const std::vector<BusConf
   Fail(where + ".bus", "unknown bus \"" + busName + "\"");
 }
 
+// An interface bound to a SocketCAN device: a CAN interface on no simulated bus.
+void BindDevice(const json& i, const std::string& where, InterfaceConfig& c) {
+  std::string why;
+  if (!ValidDeviceName(c.device, why)) Fail(where + ".device", why);
+  if (Member(i, "bus") != nullptr) Fail(where, "an interface has a bus or a device, not both");
+  c.protocol = driver::kProtocolCan;
+}
+
 DeviceConfig Device(const json& j, const std::string& where, const std::vector<BusConfig>& buses) {
   if (!j.is_object()) Fail(where, "expected an object");
   DeviceConfig d;
@@ -255,8 +264,13 @@ DeviceConfig Device(const json& j, const std::string& where, const std::vector<B
     c.name = RequiredText(i, "name", w);
     if (c.name.size() > 15 || c.name.find('@') != std::string::npos)
       Fail(w + ".name", "at most 15 characters, no '@'");
-    c.bus = RequiredText(i, "bus", w);
-    c.protocol = InterfaceProtocol(c.bus, buses, w);
+    c.device = TextOr(i, "device", w, "");
+    if (c.device.empty()) {
+      c.bus = RequiredText(i, "bus", w);
+      c.protocol = InterfaceProtocol(c.bus, buses, w);
+    } else {
+      BindDevice(i, w, c);
+    }
     c.port = static_cast<uint32_t>(UnsignedOr(i, "port", w, 0xFFFFFFFF, n));
     c.canFd = BoolOr(i, "canFd", w, false) ? 1 : 0;
     c.transceiver = static_cast<uint32_t>(UnsignedOr(i, "transceiver", w, 4, 0));

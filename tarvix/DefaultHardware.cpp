@@ -102,7 +102,7 @@ BusConfig FlexRayBus() {
 
 InterfaceConfig Interface(const char* name, const char* bus, uint32_t port, uint32_t protocol,
                           uint32_t canFd) {
-  return InterfaceConfig{name, bus, port, protocol, canFd, 0};
+  return InterfaceConfig{name, bus, port, protocol, canFd, 0, ""};
 }
 
 }  // namespace

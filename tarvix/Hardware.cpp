@@ -74,26 +74,39 @@ bool Hardware::buildDevices(uint32_t generation, std::string& error) {
     SimDevice device{
         d.name, MakeRef(kRefDevice, base + static_cast<uint32_t>(devices_.size()) + 1), {}};
     for (const InterfaceConfig& i : d.interfaces) {
-      const auto bus = std::find_if(buses_.begin(), buses_.end(),
-                                    [&i](const auto& b) { return b->config().name == i.bus; });
-      if (bus == buses_.end()) {
-        error = "interface \"" + i.name + "\": unknown bus \"" + i.bus + "\"";
-        return false;
-      }
-      if (driver::ProtocolOfBus((*bus)->config().protocol) != i.protocol) {
-        error = "interface \"" + i.name + "\": its protocol differs from bus \"" + i.bus + "\"";
-        return false;
-      }
       if (findInterface(i.name) != nullptr) {
         error = "interface \"" + i.name + "\" is listed twice";
         return false;
       }
       const auto index = static_cast<int32_t>(interfaces_.size());
-      interfaces_.push_back(SimInterface{i, index, MakeRef(kRefInterface, base + index + 1), *bus});
+      SimInterface added{i, index, MakeRef(kRefInterface, base + index + 1), nullptr, nullptr};
+      if (!attach(added, error)) return false;
+      interfaces_.push_back(std::move(added));
       device.interfaces.push_back(index);
     }
     devices_.push_back(std::move(device));
   }
+  return true;
+}
+
+// Puts an interface on its simulated bus, or binds it to its device (opened only by sessions).
+bool Hardware::attach(SimInterface& i, std::string& error) const {
+  if (!i.config.device.empty()) {
+    i.port = std::make_shared<DevicePort>(i.config.device);
+    return true;
+  }
+  const InterfaceConfig& c = i.config;
+  const auto bus = std::find_if(buses_.begin(), buses_.end(),
+                                [&c](const auto& b) { return b->config().name == c.bus; });
+  if (bus == buses_.end()) {
+    error = "interface \"" + c.name + "\": unknown bus \"" + c.bus + "\"";
+    return false;
+  }
+  if (driver::ProtocolOfBus((*bus)->config().protocol) != c.protocol) {
+    error = "interface \"" + c.name + "\": its protocol differs from bus \"" + c.bus + "\"";
+    return false;
+  }
+  i.bus = *bus;
   return true;
 }
 

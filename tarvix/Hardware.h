@@ -9,14 +9,17 @@
 
 #include "tarvix/Bus.h"
 #include "tarvix/HardwareConfig.h"
+#include "tarvix/socketcan/DevicePort.h"
 
 namespace tarvix {
 
+// An interface on a simulated bus, or bound to a SocketCAN device (`port` set, no bus).
 struct SimInterface {
   InterfaceConfig config;
   int32_t index = 0;  // position in the hardware's interface list; the origin of its frames
   uint32_t ref = 0;
   std::shared_ptr<Bus> bus;
+  std::shared_ptr<DevicePort> port;
 };
 
 struct SimDevice {
@@ -46,6 +49,7 @@ class Hardware {
  private:
   bool buildBuses(uint32_t generation, std::string& error);
   bool buildDevices(uint32_t generation, std::string& error);
+  bool attach(SimInterface& i, std::string& error) const;
 
   HardwareConfig config_;
   std::vector<std::shared_ptr<Bus>> buses_;

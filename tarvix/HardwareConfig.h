@@ -70,13 +70,16 @@ struct BusConfig {
   std::vector<FlexRaySlot> flexRaySlots;
 };
 
+// An interface on a simulated bus, or (with `device`) bound to a SocketCAN network device, whose
+// CAN FD capability the device's MTU gives while the driver runs.
 struct InterfaceConfig {
   std::string name;
-  std::string bus;
+  std::string bus;  // the simulated bus; empty for a bound interface
   uint32_t port = 1;
   uint32_t protocol = 0;  // driver::kProtocol*
-  uint32_t canFd = 0;     // 1: the interface can do CAN FD
+  uint32_t canFd = 0;     // 1: the interface can do CAN FD (simulated interfaces)
   uint32_t transceiver = 0;
+  std::string device;  // SocketCAN device name ("can0"); empty: simulated
 };
 
 struct DeviceConfig {

@@ -11,6 +11,7 @@
 #include "tarvix/CallLog.h"
 #include "tarvix/ConfigLoader.h"
 #include "tarvix/ObjectRef.h"
+#include "tarvix/socketcan/DeviceBinding.h"
 
 namespace tarvix {
 namespace {
@@ -51,6 +52,13 @@ Simulator::Simulator() {
   if (path != nullptr && path[0] != '\0' && !LoadHardwareConfigFile(path, config, error)) {
     std::fprintf(stderr, "tarvix: %s: %s; the driver offers no hardware\n", path, error.c_str());
     hardware_ = Hardware::Empty(VersionValues{});
+    return;
+  }
+  const char* devices = std::getenv(kSocketCanVariable);
+  if (devices != nullptr && !AddShortFormDevices(devices, config, error)) {
+    std::fprintf(stderr, "tarvix: %s: %s; the driver offers no hardware\n", kSocketCanVariable,
+                 error.c_str());
+    hardware_ = Hardware::Empty(config.versions);
     return;
   }
   if (!installConfig(config, error)) hardware_ = Hardware::Empty(config.versions);
@@ -154,7 +162,7 @@ int32_t Simulator::interfaceProperty(const SimInterface& i, uint32_t id, uint32_
     case driver::kPropInterfaceProtocol:
       return GetWord(i.config.protocol, size, value);
     case driver::kPropInterfaceCanFd:
-      return GetWord(i.config.canFd, size, value);
+      return GetWord(CanFdOf(i), size, value);
     default:
       return driver::kUnknownProperty;
   }

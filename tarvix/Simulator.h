@@ -14,6 +14,9 @@
 
 namespace tarvix {
 
+// The CAN FD capability an interface reports (0x00130007): configured, or the bound device's.
+uint32_t CanFdOf(const SimInterface& i);
+
 // One per process. Thread-safe: mutex_ guards the registry; session operations run on the session
 // (under its bus's lock) after the registry has handed out a shared reference to it.
 class Simulator {

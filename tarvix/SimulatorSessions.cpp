@@ -7,6 +7,7 @@
 #include "driver/Status.h"
 #include "tarvix/ObjectRef.h"
 #include "tarvix/Simulator.h"
+#include "tarvix/socketcan/SocketCanSender.h"
 
 namespace tarvix {
 namespace {
@@ -19,7 +20,17 @@ bool IsOutputMode(uint32_t mode) {
   return mode == driver::kModeOutputQueued || mode == driver::kModeOutputSinglePoint;
 }
 
+// What a session that takes its bus's settings gets: the simulated bus's, or the bound device's
+// as it runs.
+ClusterSettings RunningSettings(const SimInterface& i, bool j1939) {
+  if (i.port) return i.port->runningSettings(j1939);
+  const BusConfig& bus = i.bus->config();
+  return ClusterSettings{i.config.protocol, bus.bitRate, bus.dataBitRate, bus.canIoMode, j1939};
+}
+
 }  // namespace
+
+uint32_t CanFdOf(const SimInterface& i) { return i.port ? i.port->canFd() : i.config.canFd; }
 
 int32_t Simulator::buildSetup(const std::string& database, const std::string& cluster,
                               const std::string& frameList, const SimInterface& i, uint32_t mode,
@@ -28,16 +39,14 @@ int32_t Simulator::buildSetup(const std::string& database, const std::string& cl
   if (const int32_t st = databases_.resolve(database, cluster, frameList, db);
       st != driver::kSuccess)
     return st;
-  const BusConfig& bus = i.bus->config();
   if (db.fromBus) {
     const bool j1939 = db.cluster.j1939;
     if (j1939 && i.config.protocol != driver::kProtocolCan) return driver::kProtocolMismatch;
-    db.cluster =
-        ClusterSettings{i.config.protocol, bus.bitRate, bus.dataBitRate, bus.canIoMode, j1939};
+    db.cluster = RunningSettings(i, j1939);
   }
   if (db.cluster.protocol != i.config.protocol) return driver::kProtocolMismatch;
   if (db.cluster.protocol == driver::kProtocolCan &&
-      db.cluster.canIoMode != driver::kCanIoModeClassic && i.config.canFd == 0 && !db.subordinate) {
+      db.cluster.canIoMode != driver::kCanIoModeClassic && CanFdOf(i) == 0 && !db.subordinate) {
     return driver::kInterfaceNotCapable;
   }
   if (IsOutputMode(mode)) {
@@ -65,6 +74,7 @@ int32_t Simulator::createSession(const char* database, const char* cluster, cons
   if (mode != driver::kModeReceiveStream && !IsOutputMode(mode)) return driver::kInvalidMode;
   SessionSetup setup;
   std::shared_ptr<Bus> bus;
+  std::shared_ptr<DevicePort> port;
   {
     std::lock_guard lock(mutex_);
     const SimInterface* i = hardware_->findInterface(interfaceName);
@@ -74,8 +84,11 @@ int32_t Simulator::createSession(const char* database, const char* cluster, cons
       return st;
     }
     bus = i->bus;
+    port = i->port;
   }
-  auto session = std::make_shared<Session>(std::move(setup), std::move(bus));
+  std::shared_ptr<DriverSession> session =
+      port ? MakeSocketCanSession(std::move(setup), std::move(port))
+           : std::make_shared<Session>(std::move(setup), std::move(bus));
   std::lock_guard lock(mutex_);
   ref = MakeRef(kRefSession, ++serial_);
   sessions_[ref] = std::move(session);
