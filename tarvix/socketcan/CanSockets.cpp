@@ -24,9 +24,10 @@ namespace {
 
 constexpr size_t kClaimBytes = 8;
 
+// Some kernels answer a flag option with its new value instead of 0: only -1 is a failure.
 template <typename T>
 int SetOption(int fd, int level, int name, const T& value) {
-  return setsockopt(fd, level, name, &value, sizeof value) == 0 ? 0 : errno;
+  return setsockopt(fd, level, name, &value, sizeof value) < 0 ? errno : 0;
 }
 
 bool Ioctl(int request, ifreq& request_data) {

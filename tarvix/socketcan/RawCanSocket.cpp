@@ -32,7 +32,7 @@ int64_t Nanoseconds(const timespec& t) {
 
 template <typename T>
 int SetOption(int fd, int level, int name, const T& value) {
-  return setsockopt(fd, level, name, &value, sizeof value) == 0 ? 0 : errno;
+  return setsockopt(fd, level, name, &value, sizeof value) < 0 ? errno : 0;
 }
 
 // Kernel time stamps: the SO_TIMESTAMPING set where the kernel has it, else nanosecond stamps.

@@ -1,0 +1,111 @@
+// Test support inside the user-mode kernel: the controller process bound to vcan0 (CAN7, CAN FD)
+// and vcan1 (CAN8, classic), hosts that talk to it, and the can-utils programs the tests compare
+// against.
+#pragma once
+
+#include <gtest/gtest.h>
+#include <sys/types.h>
+
+#include <chrono>
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "host/HostClient.h"
+#include "host/RecordDecoder.h"
+
+namespace kvtest {
+
+using namespace std::chrono_literals;
+
+// Generous: the user-mode kernel shares a loaded machine.
+constexpr std::chrono::milliseconds kDeadline = 30s;
+
+// Waits until `condition` holds or `timeout` passed; returns its last value.
+bool WaitFor(const std::function<bool()>& condition, std::chrono::milliseconds timeout = kDeadline);
+
+// Runs `command` with /bin/sh; its exit status.
+int Shell(const std::string& command);
+
+// The controller, started once for the whole program with TARVIX_SOCKETCAN=vcan0,vcan1.
+class UmlController : public ::testing::Environment {
+ public:
+  void SetUp() override;
+  void TearDown() override;
+  static uint16_t Port();
+  // Native path of a file in the service directory.
+  static std::string ServiceFile(const std::string& name);
+
+ private:
+  pid_t pid_ = -1;
+};
+
+// One host connection. Records and statistics are collected while replies are awaited; every
+// exchange also sends the heartbeat now and then, so long tests keep the connection.
+class Host {
+ public:
+  Host();
+  // Sends `text` and returns the next text reply (types 3 and 5).
+  std::string Command(const std::string& text);
+  // Sends each property and the start; true when every reply is an acknowledgement.
+  bool Start(const std::vector<std::string>& properties);
+  // Receives until `condition` holds on what was collected, or `timeout` passed.
+  bool WaitFor(const std::function<bool()>& condition,
+               std::chrono::milliseconds timeout = kDeadline);
+  // Ends the connection without a word (a host that vanishes).
+  void Vanish() { client_.Close(); }
+
+  // Identifier records by identifier, the latest of each.
+  std::map<uint32_t, kvhost::IdentifierRecord> records;
+  std::optional<kvhost::CanStatisticsView> statistics;
+
+ private:
+  std::optional<kvhost::HostMessage> receive(std::chrono::milliseconds timeout);
+  void take(const kvhost::HostMessage& message);
+
+  kvhost::HostClient client_;
+  std::chrono::steady_clock::time_point heartbeatDue_;
+};
+
+// A program in the background (candump), ended with SIGINT by Stop() or the destructor.
+class Background {
+ public:
+  explicit Background(const std::string& command);
+  ~Background();
+  void Stop();
+  // Waits for the program to end by itself; false after `timeout`.
+  bool Ended(std::chrono::milliseconds timeout);
+
+ private:
+  pid_t pid_ = -1;
+};
+
+// candump -L of `device` (with candump's filters after it: ",123:7FF"; empty: every frame) into
+// `path`, line by line; the constructor returns once candump takes frames (it has seen a marker
+// frame 0x7FF).
+class Capture {
+ public:
+  Capture(const std::string& device, const std::string& filters, const std::string& path);
+  // Ends candump; its lines.
+  std::string Stop();
+
+ private:
+  std::string path_;
+  Background candump_;
+};
+
+// One frame of a candump -l line, as the tests compare frames.
+struct LoggedFrame {
+  std::string time;   // "SECONDS.MICROS"
+  std::string frame;  // ID#DATA with the CAN FD flags reduced to bit-rate switching
+  uint32_t id = 0;    // with bit 29 for extended identifiers
+};
+
+// The frames of a candump -l text (lines that are no frames are skipped).
+std::vector<LoggedFrame> ReadCandumpText(const std::string& text);
+std::string ReadFile(const std::string& path);
+
+}  // namespace kvtest
