@@ -1,12 +1,14 @@
 # The two commands of the README (make run, make test) and the developer's other targets.
-# Every target first installs the Debian packages the build needs when they are missing.
+# Every target first installs the Debian packages the build needs when they are missing
+# (user-mode-linux, can-utils and kmod: the SocketCAN tests and benchmark boot a kernel with CAN).
 
 JOBS      ?= $(shell nproc)
 CTEST_JOBS ?= $(shell echo $$(( $(JOBS) * 2 )))
 CMAKE_FLAGS ?=
 
 DEBIAN_PACKAGES := cmake g++ make pkg-config libgtest-dev libgmock-dev libbenchmark-dev \
-                   nlohmann-json3-dev libhdf5-dev hdf5-tools clang clang-format libclang-rt-14-dev python3 python3-can tmux
+                   nlohmann-json3-dev libhdf5-dev hdf5-tools clang clang-format libclang-rt-14-dev python3 python3-can tmux \
+                   user-mode-linux can-utils kmod
 
 SUDO := $(shell [ "$$(id -u)" = 0 ] || echo sudo)
 

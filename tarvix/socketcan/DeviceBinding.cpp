@@ -72,7 +72,7 @@ bool ParseItem(std::string_view item, uint32_t& next, InterfaceConfig& out, std:
   const uint32_t number = CanNumber(name);
   out.name = name.empty() ? "CAN" + std::to_string(next) : name;
   out.port = name.empty() ? next : (number != 0 ? number : next);
-  if (name.empty() || number >= next) next = std::max(next, out.port) + 1;
+  if (name.empty() || number == 0 || number >= next) next = std::max(next, out.port) + 1;
   out.protocol = driver::kProtocolCan;
   out.device = std::string(item);
   return true;

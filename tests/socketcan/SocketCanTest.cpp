@@ -71,9 +71,10 @@ TEST(SocketCanTest, CangenFramesReachTheBinaryLogAndTableAsCandumpSawThem) {
   // candump ends by itself 2 s after the last frame, once it has taken every frame queued for it.
   Background candump("exec candump -T 2000 -L -r 67108864 vcan0 > /tmp/cangen.log");
   Host host;
-  ASSERT_TRUE(
+  ASSERT_EQ(
       host.Start({"SET_PROP_SESSION_PORTNAME=CAN7", "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=1",
-                  "SET_PROP_LOGFILE_NAME=cangen", "SET_PROP_TX_TIME_DATA=100"}));
+                  "SET_PROP_LOGFILE_NAME=cangen", "SET_PROP_TX_TIME_DATA=100"}),
+      "");
   // A marker frame, sent until the session sees it: candump, started first, sees it as well.
   ASSERT_TRUE(WaitFor([&] {
     Shell("cansend vcan0 7FF#4B56");
@@ -120,11 +121,11 @@ TEST(SocketCanTest, CangenFramesReachTheBinaryLogAndTableAsCandumpSawThem) {
 TEST(SocketCanTest, HostFramesReachCandumpAndTheCyclicFrameEndsWithItsSession) {
   Capture candump("vcan0", ",123:7FF,1ABCDE02:1FFFFFFF", "/tmp/tx.log");
   Host host;
-  ASSERT_TRUE(
-      host.Start({"SET_PROP_SESSION_PORTNAME=CAN7", "SET_PROP_SESSION_RUNMODE=NORMAL",
-                  "SET_PROP_SESSION_BAUDRATE=500000", "SET_PROP_SESSION_CAN_IOMODE=2",
-                  "SET_PROP_SESSION_CANFD_BAUDRATE=2000000",
-                  "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=1", "SET_PROP_TX_TIME_DATA=100"}));
+  ASSERT_EQ(host.Start({"SET_PROP_SESSION_PORTNAME=CAN7", "SET_PROP_SESSION_RUNMODE=NORMAL",
+                        "SET_PROP_SESSION_BAUDRATE=500000", "SET_PROP_SESSION_CAN_IOMODE=2",
+                        "SET_PROP_SESSION_CANFD_BAUDRATE=2000000",
+                        "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=1", "SET_PROP_TX_TIME_DATA=100"}),
+            "");
   StartTransmit(host, 0x123, false, 0x08, 1, "17,34,51,68", 4);  // once, classic
   EXPECT_TRUE(host.WaitFor([&] { return host.records.count(0x123) > 0; }));
   EXPECT_EQ(host.records[0x123].echo, kEcho) << "its own frame, read back";
@@ -144,8 +145,9 @@ TEST(SocketCanTest, HostFramesReachCandumpAndTheCyclicFrameEndsWithItsSession) {
 
 TEST(SocketCanTest, TheCyclicFrameEndsWhenItsHostVanishes) {
   Host host;
-  ASSERT_TRUE(host.Start({"SET_PROP_SESSION_PORTNAME=CAN7", "SET_PROP_SESSION_RUNMODE=NORMAL",
-                          "SET_PROP_SESSION_BAUDRATE=500000"}));
+  ASSERT_EQ(host.Start({"SET_PROP_SESSION_PORTNAME=CAN7", "SET_PROP_SESSION_RUNMODE=NORMAL",
+                        "SET_PROP_SESSION_BAUDRATE=500000"}),
+            "");
   StartTransmit(host, 0x124, false, 0, 0, "1,2", 2);
   EXPECT_EQ(Shell("candump -T 5000 -n 1 vcan0,124:7FF > /tmp/cyclic.log"), 0);
   EXPECT_FALSE(ReadFile("/tmp/cyclic.log").empty()) << "the cyclic frame never went out";
@@ -163,7 +165,7 @@ TEST(SocketCanTest, J1939SessionClaimsItsAddressAndReadsMultiPacketMessages) {
                                           "SET_PROP_SESSION_NODE_ADDRESS=128",
                                           "SET_PROP_TX_TIME_DATA=100"};
   Host host;
-  ASSERT_TRUE(host.Start(j1939));
+  ASSERT_EQ(host.Start(j1939), "");
   Host rival;  // another session of the interface cannot take the address
   for (size_t i = 0; i + 1 < j1939.size(); ++i) rival.Command(j1939[i]);
   EXPECT_EQ(rival.Command("CMD_SESSION_START"), "<ERROR: -1074384374>\n");
@@ -187,8 +189,9 @@ TEST(SocketCanTest, J1939SessionClaimsItsAddressAndReadsMultiPacketMessages) {
 
 TEST(SocketCanTest, ErrorFramesBecomeBusErrorFramesAndBusState) {
   Host host;
-  ASSERT_TRUE(host.Start({"SET_PROP_SESSION_PORTNAME=CAN7",
-                          "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1", "SET_PROP_TX_TIME_DATA=100"}));
+  ASSERT_EQ(host.Start({"SET_PROP_SESSION_PORTNAME=CAN7", "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1",
+                        "SET_PROP_TX_TIME_DATA=100"}),
+            "");
   ASSERT_EQ(Shell("cansend vcan0 20000004#0004000000000000"), 0);  // controller: receive warning
   EXPECT_TRUE(host.WaitFor([&] { return host.records.count(0x004) > 0; }));
   EXPECT_EQ(host.records[0x004].type, kTypeBusError);
@@ -202,7 +205,7 @@ TEST(SocketCanTest, ErrorFramesBecomeBusErrorFramesAndBusState) {
 
 TEST(SocketCanTest, ADeviceThatGoesAwayIsALostBusUntilItIsBack) {
   Host host;
-  ASSERT_TRUE(host.Start({"SET_PROP_SESSION_PORTNAME=CAN8", "SET_PROP_TX_TIME_DATA=100"}));
+  ASSERT_EQ(host.Start({"SET_PROP_SESSION_PORTNAME=CAN8", "SET_PROP_TX_TIME_DATA=100"}), "");
   const auto resumes = [&](const std::string& data) {
     return WaitFor([&] {
       Shell("cansend vcan1 100#" + data);
@@ -235,8 +238,25 @@ TEST(SocketCanTest, ADeviceThatGoesAwayIsALostBusUntilItIsBack) {
 }  // namespace
 }  // namespace kvtest
 
+namespace {
+
+// One controller for the whole program: it listens only 10 s after its start.
+class ControllerEnvironment : public ::testing::Environment {
+ public:
+  void SetUp() override {
+    std::string error;
+    ASSERT_TRUE(controller_.Start(error)) << error;
+  }
+  void TearDown() override { controller_.Stop(); }
+
+ private:
+  kvtest::UmlController controller_;
+};
+
+}  // namespace
+
 int main(int argc, char** argv) {
   ::testing::InitGoogleTest(&argc, argv);
-  ::testing::AddGlobalTestEnvironment(new kvtest::UmlController);
+  ::testing::AddGlobalTestEnvironment(new ControllerEnvironment);
   return RUN_ALL_TESTS();
 }

@@ -3,7 +3,9 @@
 
 #include <signal.h>
 #include <spawn.h>
+#include <sys/resource.h>
 #include <sys/wait.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
@@ -44,7 +46,7 @@ int Shell(const std::string& command) {
   return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
-void UmlController::SetUp() {
+bool UmlController::Start(std::string& error) {
   std::filesystem::remove_all(kDrive);
   std::filesystem::create_directories(std::string(kDrive) + "/QV-RT/tarvix/kelvane");
   std::ofstream(std::string(kDrive) + "/QV-RT/tarvix/kelvane/kelvanert.ini")
@@ -53,17 +55,22 @@ void UmlController::SetUp() {
   setenv("TARVIX_SOCKETCAN", "vcan0,vcan1", 1);
   char program[] = KV_CONTROLLER_PATH;
   char* arguments[] = {program, nullptr};
-  ASSERT_EQ(posix_spawn(&pid_, program, nullptr, nullptr, arguments, environ), 0);
+  if (posix_spawn(&pid_, program, nullptr, nullptr, arguments, environ) != 0) {
+    error = "cannot start " KV_CONTROLLER_PATH;
+    return false;
+  }
   kvhost::HostClient probe;
-  ASSERT_TRUE(WaitFor([&] { return probe.Connect("127.0.0.1", kPort); }, kControllerStart))
-      << "the controller did not listen";
+  if (WaitFor([&] { return probe.Connect("127.0.0.1", kPort); }, kControllerStart)) return true;
+  error = "the controller did not listen";
+  return false;
 }
 
-void UmlController::TearDown() {
+void UmlController::Stop() {
   if (pid_ <= 0) return;
   kill(pid_, SIGTERM);
   int status = 0;
   waitpid(pid_, &status, 0);
+  pid_ = -1;
 }
 
 uint16_t UmlController::Port() { return kPort; }
@@ -88,6 +95,7 @@ std::optional<kvhost::HostMessage> Host::receive(std::chrono::milliseconds timeo
 }
 
 void Host::take(const kvhost::HostMessage& m) {
+  lastStatus = m.header.lastStatus;
   if (m.header.type == kvhost::kCanRecords) {
     if (auto decoded = kvhost::DecodeCanRecords(m.payload, m.header.idCount)) {
       for (auto& r : *decoded) records[r.identifier] = r;
@@ -108,17 +116,13 @@ std::string Host::Command(const std::string& text) {
   return "(no reply)";
 }
 
-bool Host::Start(const std::vector<std::string>& properties) {
+std::string Host::Start(const std::vector<std::string>& properties) {
   for (const std::string& p : properties) {
     const std::string reply = Command(p);
-    if (reply.rfind("<ACK", 0) != 0) {
-      ADD_FAILURE() << p << " answered " << reply;
-      return false;
-    }
+    if (reply.rfind("<ACK", 0) != 0) return p + " answered " + reply;
   }
   const std::string reply = Command("CMD_SESSION_START");
-  EXPECT_EQ(reply, "<ACK: CMD_SESSION_START>\n");
-  return reply == "<ACK: CMD_SESSION_START>\n";
+  return reply == "<ACK: CMD_SESSION_START>\n" ? "" : "CMD_SESSION_START answered " + reply;
 }
 
 bool Host::WaitFor(const std::function<bool()>& condition, std::chrono::milliseconds timeout) {
@@ -163,10 +167,25 @@ std::string Capture::Stop() {
 
 bool Background::Ended(std::chrono::milliseconds timeout) {
   int status = 0;
+  rusage usage{};
   const bool ended =
-      WaitFor([&] { return pid_ <= 0 || waitpid(pid_, &status, WNOHANG) == pid_; }, timeout);
+      WaitFor([&] { return pid_ <= 0 || wait4(pid_, &status, WNOHANG, &usage) == pid_; }, timeout);
+  if (ended && pid_ > 0) {
+    cpuSeconds_ = static_cast<double>(usage.ru_utime.tv_sec + usage.ru_stime.tv_sec) +
+                  static_cast<double>(usage.ru_utime.tv_usec + usage.ru_stime.tv_usec) / 1e6;
+  }
   if (ended) pid_ = -1;
   return ended;
+}
+
+double CpuSeconds(pid_t pid) {
+  std::istringstream stat(ReadFile("/proc/" + std::to_string(pid) + "/stat"));
+  std::string field;
+  double ticks = 0;
+  for (int i = 1; i <= 15 && stat >> field; ++i) {
+    if (i == 14 || i == 15) ticks += std::stod(field);  // utime, stime (the name has no blank)
+  }
+  return ticks / static_cast<double>(sysconf(_SC_CLK_TCK));
 }
 
 std::vector<LoggedFrame> ReadCandumpText(const std::string& text) {

@@ -1,9 +1,8 @@
-// Test support inside the user-mode kernel: the controller process bound to vcan0 (CAN7, CAN FD)
-// and vcan1 (CAN8, classic), hosts that talk to it, and the can-utils programs the tests compare
-// against.
+// Support inside the user-mode kernel for the SocketCAN tests and benchmark: the controller
+// process bound to vcan0 (CAN7, CAN FD) and vcan1 (CAN8, classic), hosts that talk to it, and the
+// can-utils programs they compare against.
 #pragma once
 
-#include <gtest/gtest.h>
 #include <sys/types.h>
 
 #include <chrono>
@@ -30,11 +29,14 @@ bool WaitFor(const std::function<bool()>& condition, std::chrono::milliseconds t
 // Runs `command` with /bin/sh; its exit status.
 int Shell(const std::string& command);
 
-// The controller, started once for the whole program with TARVIX_SOCKETCAN=vcan0,vcan1.
-class UmlController : public ::testing::Environment {
+// The controller process with TARVIX_SOCKETCAN=vcan0,vcan1 (CAN7, CAN8) on a drive in /tmp.
+class UmlController {
  public:
-  void SetUp() override;
-  void TearDown() override;
+  // Starts it and waits until it listens; false (with `error`) when it does not.
+  bool Start(std::string& error);
+  // Ends it with SIGTERM.
+  void Stop();
+  pid_t pid() const { return pid_; }
   static uint16_t Port();
   // Native path of a file in the service directory.
   static std::string ServiceFile(const std::string& name);
@@ -50,8 +52,9 @@ class Host {
   Host();
   // Sends `text` and returns the next text reply (types 3 and 5).
   std::string Command(const std::string& text);
-  // Sends each property and the start; true when every reply is an acknowledgement.
-  bool Start(const std::vector<std::string>& properties);
+  // Sends each property and the start; "" when every reply is an acknowledgement, else the
+  // message and its reply.
+  std::string Start(const std::vector<std::string>& properties);
   // Receives until `condition` holds on what was collected, or `timeout` passed.
   bool WaitFor(const std::function<bool()>& condition,
                std::chrono::milliseconds timeout = kDeadline);
@@ -61,6 +64,7 @@ class Host {
   // Identifier records by identifier, the latest of each.
   std::map<uint32_t, kvhost::IdentifierRecord> records;
   std::optional<kvhost::CanStatisticsView> statistics;
+  int32_t lastStatus = 0;  // of the latest message
 
  private:
   std::optional<kvhost::HostMessage> receive(std::chrono::milliseconds timeout);
@@ -78,10 +82,17 @@ class Background {
   void Stop();
   // Waits for the program to end by itself; false after `timeout`.
   bool Ended(std::chrono::milliseconds timeout);
+  pid_t pid() const { return pid_; }
+  // CPU seconds (user and system) of the program once it has ended.
+  double cpuSeconds() const { return cpuSeconds_; }
 
  private:
   pid_t pid_ = -1;
+  double cpuSeconds_ = 0;
 };
+
+// CPU seconds (user and system) a running process has used so far, all its threads.
+double CpuSeconds(pid_t pid);
 
 // candump -L of `device` (with candump's filters after it: ",123:7FF"; empty: every frame) into
 // `path`, line by line; the constructor returns once candump takes frames (it has seen a marker

@@ -1,4 +1,5 @@
-// TARVIX_SIM_CONFIG descriptions: errors leave no hardware, replay of candump logs, bus captures.
+// TARVIX_SIM_CONFIG descriptions: errors leave no hardware, replay of candump logs, bus captures;
+// the short form of TARVIX_SOCKETCAN.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -6,6 +7,7 @@
 
 #include "driver/FrameTypes.h"
 #include "driver/Properties.h"
+#include "tarvix/socketcan/DeviceBinding.h"
 #include "tests/tarvix/TarvixTestSupport.h"
 
 namespace tarvix::test {
@@ -41,6 +43,10 @@ TEST_F(ConfigurationTest, BrokenDescriptionsGiveAClearErrorAndNoHardware) {
        "unknown bus"},
       {R"({"buses":[{"name":"b","replay":[{"file":"missing.log"}]}]})", "cannot read candump log"},
       {R"({"faults":[{"operation":"kxStart"}]})", "\"status\" is missing"},
+      {R"({"buses":[{"name":"b"}],"devices":[{"name":"D","interfaces":[{"name":"CAN7","bus":"b","device":"can0"}]}]})",
+       "a bus or a device, not both"},
+      {R"({"devices":[{"name":"D","interfaces":[{"name":"CAN7","device":"../can0"}]}]})",
+       "interfaces[0].device: not a network device name"},
   };
   for (const auto& [json, message] : cases) {
     std::string error;
@@ -111,6 +117,35 @@ TEST_F(ConfigurationTest, CaptureFileHoldsEveryFrameTheBusCarried) {
   }
   EXPECT_TRUE(remote);
   EXPECT_TRUE(data);
+}
+
+// "NAME=DEVICE:PORT" of each interface of a device, blank-separated.
+std::string Describe(const DeviceConfig& device) {
+  std::string text;
+  for (const InterfaceConfig& i : device.interfaces) {
+    text += (text.empty() ? "" : " ") + i.name + "=" + i.device + ":" + std::to_string(i.port);
+  }
+  return text;
+}
+
+TEST(SocketCanShortFormTest, ListedDevicesJoinTheHardwareAsNumberedCanInterfaces) {
+  const std::pair<const char*, const char*> cases[] = {
+      {"vcan0", "CAN7=vcan0:7"},
+      {"can0, can1", "CAN7=can0:7 CAN8=can1:8"},
+      {"CAN20=can0 can1", "CAN20=can0:20 CAN21=can1:21"},
+      {"Bench=can0,can1", "Bench=can0:7 CAN8=can1:8"},
+      {"CAN1=can0", "interface \"CAN1\" is listed twice"},
+      {"can/0", "\"can/0\": not a network device name"},
+      {"=can0", "\"\": an interface name has 1 to 15 characters, no '@'"},
+  };
+  for (const auto& [list, expected] : cases) {
+    HardwareConfig config = DefaultHardware();
+    std::string error;
+    const bool added = AddShortFormDevices(list, config, error);
+    const std::string got = added ? Describe(config.devices.back()) : error;
+    EXPECT_EQ(got, expected) << list;
+    EXPECT_EQ(config.devices.back().name, added ? "SocketCAN" : "SIM-FR") << list;
+  }
 }
 
 }  // namespace
