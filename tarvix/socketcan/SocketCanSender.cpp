@@ -106,7 +106,7 @@ bool SocketCanSender::ensureSocket() {
 
 // Hands one frame to the device. A full device queue is waited out up to the deadline; a frame
 // for a device that is gone is lost (the transmit-complete wait then times out).
-int32_t SocketCanSender::sendOnce(const WireFrame& frame, int64_t deadlineNs) {
+int32_t SocketCanSender::sendOnce(Lock& lock, const WireFrame& frame, int64_t deadlineNs) {
   for (;;) {
     if (!ensureSocket()) {
       lostSinceWrite_ = true;
@@ -124,19 +124,19 @@ int32_t SocketCanSender::sendOnce(const WireFrame& frame, int64_t deadlineNs) {
     }
     if (error != ENOBUFS && error != EAGAIN) return driver::kInvalidFrame;
     if (NowNs() >= deadlineNs) return driver::kWriteTimeout;
-    mutex_.unlock();
+    lock.unlock();
     PauseNs(kRetryNs);
-    mutex_.lock();
+    lock.lock();
     if (closed_) return driver::kInvalidReference;
   }
 }
 
-int32_t SocketCanSender::sendLatest(const FrameRecord& record, int64_t deadlineNs) {
+int32_t SocketCanSender::sendLatest(Lock& lock, const FrameRecord& record, int64_t deadlineNs) {
   const FrameDefinition& def = *record.second;
   const WireFrame frame = ToWireFrame(record.first);
   if (!IsCyclic(def)) {
     endRepetition();
-    return sendOnce(frame, deadlineNs);
+    return sendOnce(lock, frame, deadlineNs);
   }
   const int64_t period = std::max<int64_t>(1000, std::llround(def.cyclicRateS * 1e9));
   if (repeated_ && repeated_->canId != frame.canId) endRepetition();
@@ -168,15 +168,15 @@ int32_t SocketCanSender::write(const void* frames, uint32_t size, double timeout
       ParseFrameRecords(setup_, static_cast<const uint8_t*>(frames), size, records);
   if (parsed != driver::kSuccess) return parsed;
   const int64_t deadline = DeadlineOf(timeoutS, NowNs());
-  std::lock_guard lock(mutex_);
+  Lock lock(mutex_);
   if (closed_) return driver::kInvalidReference;
   if (settings_.listenOnly || port_->listenOnly()) return driver::kListenOnly;
   started_ = true;
   lostSinceWrite_ = false;
   for (const FrameRecord& r : records) {
     const int32_t status = setup_.mode == driver::kModeOutputQueued
-                               ? sendOnce(ToWireFrame(r.first), deadline)
-                               : sendLatest(r, deadline);
+                               ? sendOnce(lock, ToWireFrame(r.first), deadline)
+                               : sendLatest(lock, r, deadline);
     if (status != driver::kSuccess) return status;
   }
   return driver::kSuccess;

@@ -39,9 +39,12 @@ class SocketCanSender final : public DriverSession,
   void restart();
 
  private:
+  using Lock = std::unique_lock<std::mutex>;
+
   bool ensureSocket();
-  int32_t sendOnce(const WireFrame& frame, int64_t deadlineNs);
-  int32_t sendLatest(const FrameRecord& record, int64_t deadlineNs);
+  // Both hold `lock` on mutex_; a full device queue is waited out without it.
+  int32_t sendOnce(Lock& lock, const WireFrame& frame, int64_t deadlineNs);
+  int32_t sendLatest(Lock& lock, const FrameRecord& record, int64_t deadlineNs);
   void endRepetition();
 
   const std::shared_ptr<DevicePort> port_;
