@@ -2,7 +2,6 @@
 #include "tarvix/Session.h"
 
 #include <algorithm>
-#include <cmath>
 #include <cstring>
 
 #include "driver/FrameTypes.h"
@@ -24,12 +23,6 @@ constexpr uint32_t kErrorCounterMax = 255;
 constexpr int64_t kMaxNapNs = 1'000'000;  // waiting callers look at the bus at least every 1 ms
 constexpr int64_t kMinNapNs = 50'000;
 constexpr int kFlexRayIntegrationCycles = 2;
-
-// Deadline of a time-out in seconds; a negative time-out waits without limit.
-int64_t DeadlineOf(double timeoutS, int64_t nowNs) {
-  if (timeoutS < 0 || !std::isfinite(timeoutS) || timeoutS > 1e6) return INT64_MAX;
-  return nowNs + static_cast<int64_t>(timeoutS * 1e9);
-}
 
 void Nap(int64_t deadlineNs, int64_t nextEventNs) {
   const int64_t now = NowNs();

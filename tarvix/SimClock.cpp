@@ -2,6 +2,8 @@
 #include "tarvix/SimClock.h"
 
 #include <chrono>
+#include <cmath>
+#include <cstdint>
 #include <thread>
 
 namespace tarvix {
@@ -44,6 +46,11 @@ void UnixTimeOf(uint64_t timestamp, uint64_t& seconds, uint32_t& microseconds) {
   const uint64_t units = timestamp > kUnixEpochAsFileTime ? timestamp - kUnixEpochAsFileTime : 0;
   seconds = units / 10000000ULL;
   microseconds = static_cast<uint32_t>((units % 10000000ULL) / 10ULL);
+}
+
+int64_t DeadlineOf(double timeoutS, int64_t nowNs) {
+  if (timeoutS < 0 || !std::isfinite(timeoutS) || timeoutS > 1e6) return INT64_MAX;
+  return nowNs + static_cast<int64_t>(timeoutS * 1e9);
 }
 
 void SleepNs(int64_t ns) {

@@ -89,7 +89,6 @@ void ReadCanData(const rtattr* nest, LinkReport& out) {
        a = RTA_NEXT(a, left)) {
     switch (a->rta_type) {
       case IFLA_CAN_BITTIMING:
-        out.canController = true;
         out.bitRate = Value<can_bittiming>(a).bitrate;
         break;
       case IFLA_CAN_DATA_BITTIMING:
@@ -117,6 +116,9 @@ void ReadLinkInfo(const rtattr* nest, LinkReport& out) {
   int left = static_cast<int>(RTA_PAYLOAD(nest));
   for (auto* a = static_cast<const rtattr*>(RTA_DATA(nest)); RTA_OK(a, left);
        a = RTA_NEXT(a, left)) {
+    // CAN controllers (can-dev) are of kind "can"; virtual devices are "vcan", "vxcan".
+    if (a->rta_type == IFLA_INFO_KIND)
+      out.canController = std::strncmp(static_cast<const char*>(RTA_DATA(a)), "can", 4) == 0;
     if (a->rta_type == IFLA_INFO_DATA) ReadCanData(a, out);
   }
 }

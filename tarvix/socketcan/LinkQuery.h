@@ -13,7 +13,7 @@ struct LinkReport {
   bool up = false;       // administratively up
   bool running = false;  // up with its carrier on
   int mtu = 0;
-  bool canController = false;  // a CAN controller with bit timing (not a virtual device)
+  bool canController = false;  // a CAN controller (kind "can") with bit timing, not a virtual one
   uint32_t bitRate = 0;        // nominal rate; 0 unknown or not set
   uint32_t dataBitRate = 0;    // CAN FD data phase; 0 none
   uint32_t controlModes = 0;   // the kernel's CAN_CTRLMODE_* bits that are on

@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
-#include <cmath>
 
 #include "driver/FrameTypes.h"
 #include "driver/Status.h"
@@ -23,11 +22,6 @@ constexpr int64_t kProbeNs = 100'000'000;       // a lost device is looked for t
 constexpr int64_t kBytesPerQueuedFrame = 1024;  // kernel memory a queued frame takes, about
 constexpr int64_t kMinReceiveBuffer = 1 << 18;
 constexpr int64_t kMaxReceiveBuffer = 1 << 26;
-
-int64_t DeadlineOf(double timeoutS, int64_t nowNs) {
-  if (timeoutS < 0 || !std::isfinite(timeoutS) || timeoutS > 1e6) return INT64_MAX;
-  return nowNs + static_cast<int64_t>(timeoutS * 1e9);
-}
 
 int64_t WallNowNs() {
   return std::chrono::duration_cast<std::chrono::nanoseconds>(
@@ -178,8 +172,8 @@ int SocketCanReceiver::takeJ1939() {
   return taken;
 }
 
-// Takes what the sockets hold until `room` bytes of frames wait or the sockets are empty. Frames
-// of the raw and the J1939 socket are merged in time order.
+// Takes what the sockets hold until `room` bytes of frames (or a full session queue) wait, or the
+// sockets are empty. Frames of the raw and the J1939 socket are merged in time order.
 void SocketCanReceiver::takeAvailable(uint32_t room) {
   if (!ensureOpen(NowNs())) return;
   for (;;) {
@@ -192,8 +186,8 @@ void SocketCanReceiver::takeAvailable(uint32_t room) {
           pending_.end(),
           [](const DriverFrame& a, const DriverFrame& b) { return a.timestamp < b.timestamp; });
     }
-    if (sockets_ == nullptr || (raw < kBatch && j1939 < kJ1939Batch) || pendingBytes_ >= room)
-      return;
+    const bool full = pendingBytes_ >= room || pending_.size() >= setup_.receiveQueueFrames;
+    if (sockets_ == nullptr || (raw < kBatch && j1939 < kJ1939Batch) || full) return;
   }
 }
 

@@ -6,7 +6,6 @@
 
 #include <algorithm>
 #include <chrono>
-#include <cmath>
 #include <cstring>
 
 #include "driver/Properties.h"
@@ -24,11 +23,6 @@ namespace {
 constexpr int64_t kWaitSliceNs = 20'000'000;
 constexpr uint32_t kCanControlFd = 0x20;          // CAN_CTRLMODE_FD
 constexpr uint32_t kCanControlListenOnly = 0x02;  // CAN_CTRLMODE_LISTENONLY
-
-int64_t DeadlineOf(double timeoutS, int64_t nowNs) {
-  if (timeoutS < 0 || !std::isfinite(timeoutS) || timeoutS > 1e6) return INT64_MAX;
-  return nowNs + static_cast<int64_t>(timeoutS * 1e9);
-}
 
 // The bit timing a session asks of its device, and whether the device already runs it.
 CanTiming TimingOf(const SessionSetup& setup, const SessionSettings& s) {

@@ -25,11 +25,6 @@ namespace {
 constexpr int64_t kRetryNs = 1'000'000;  // a full device queue is tried again this often
 constexpr int64_t kWaitSliceNs = 5'000'000;
 
-int64_t DeadlineOf(double timeoutS, int64_t nowNs) {
-  if (timeoutS < 0 || !std::isfinite(timeoutS) || timeoutS > 1e6) return INT64_MAX;
-  return nowNs + static_cast<int64_t>(timeoutS * 1e9);
-}
-
 bool IsCyclic(const FrameDefinition& d) {
   const bool cyclicType = d.timingType == driver::kTimingCyclicData ||
                           d.timingType == driver::kTimingCyclicRemote ||

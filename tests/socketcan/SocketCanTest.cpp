@@ -235,6 +235,21 @@ TEST(SocketCanTest, ADeviceThatGoesAwayIsALostBusUntilItIsBack) {
   EXPECT_TRUE(busState(0));
 }
 
+TEST(SocketCanTest, NormalModeSetsTheBitRateOfACanController) {
+  Background adapter(std::string("exec ") + KV_SLCAN_ON_PTY + " /tmp/slcan.tty");
+  ASSERT_TRUE(WaitFor([] { return Shell("ip link show slcan0 > /dev/null 2>&1") == 0; }));
+  Host host;
+  ASSERT_EQ(host.Start({"SET_PROP_SESSION_PORTNAME=CAN9", "SET_PROP_SESSION_RUNMODE=NORMAL",
+                        "SET_PROP_SESSION_BAUDRATE=250000"}),
+            "");
+  Shell("ip -d link show slcan0 > /tmp/slcan.link");
+  EXPECT_NE(ReadFile("/tmp/slcan.link").find("bitrate 250000"), std::string::npos)
+      << ReadFile("/tmp/slcan.link");
+  EXPECT_NE(ReadFile("/tmp/slcan.link").find(",UP,"), std::string::npos);
+  EXPECT_TRUE(WaitFor([] { return ReadFile("/tmp/slcan.tty").find("S5\r") != std::string::npos; }))
+      << "the adapter was not told 250 kbit/s";
+}
+
 }  // namespace
 }  // namespace kvtest
 

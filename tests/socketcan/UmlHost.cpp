@@ -52,7 +52,7 @@ bool UmlController::Start(std::string& error) {
   std::ofstream(std::string(kDrive) + "/QV-RT/tarvix/kelvane/kelvanert.ini")
       << "PORT=" << kPort << "\n";
   setenv("KELVANERT_DRIVE_C", kDrive, 1);
-  setenv("TARVIX_SOCKETCAN", "vcan0,vcan1", 1);
+  setenv("TARVIX_SOCKETCAN", "vcan0,vcan1,slcan0", 1);
   char program[] = KV_CONTROLLER_PATH;
   char* arguments[] = {program, nullptr};
   if (posix_spawn(&pid_, program, nullptr, nullptr, arguments, environ) != 0) {
@@ -81,7 +81,7 @@ std::string UmlController::ServiceFile(const std::string& name) {
 
 Host::Host() : heartbeatDue_(std::chrono::steady_clock::now() + kHeartbeatEvery) {
   if (!client_.Connect("127.0.0.1", UmlController::Port())) return;
-  (void)receive(kDeadline);  // the greeting
+  WaitFor([&] { return greeted_; });
 }
 
 std::optional<kvhost::HostMessage> Host::receive(std::chrono::milliseconds timeout) {
@@ -96,6 +96,7 @@ std::optional<kvhost::HostMessage> Host::receive(std::chrono::milliseconds timeo
 
 void Host::take(const kvhost::HostMessage& m) {
   lastStatus = m.header.lastStatus;
+  if (m.header.type == kvhost::kText && m.text() == "<Connected to Kelvane>\n") greeted_ = true;
   if (m.header.type == kvhost::kCanRecords) {
     if (auto decoded = kvhost::DecodeCanRecords(m.payload, m.header.idCount)) {
       for (auto& r : *decoded) records[r.identifier] = r;
@@ -110,8 +111,9 @@ std::string Host::Command(const std::string& text) {
   const auto end = std::chrono::steady_clock::now() + kDeadline;
   while (std::chrono::steady_clock::now() < end && !client_.closed()) {
     auto m = receive(kDeadline);
-    if (m && (m->header.type == kvhost::kText || m->header.type == kvhost::kErrorText))
-      return m->text();
+    const bool text =
+        m && (m->header.type == kvhost::kText || m->header.type == kvhost::kErrorText);
+    if (text && m->text() != "<Connected to Kelvane>\n") return m->text();
   }
   return "(no reply)";
 }

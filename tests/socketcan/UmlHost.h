@@ -29,7 +29,8 @@ bool WaitFor(const std::function<bool()>& condition, std::chrono::milliseconds t
 // Runs `command` with /bin/sh; its exit status.
 int Shell(const std::string& command);
 
-// The controller process with TARVIX_SOCKETCAN=vcan0,vcan1 (CAN7, CAN8) on a drive in /tmp.
+// The controller process with TARVIX_SOCKETCAN=vcan0,vcan1,slcan0 (CAN7, CAN8, CAN9) on a drive
+// in /tmp. slcan0 exists only while a test makes it.
 class UmlController {
  public:
   // Starts it and waits until it listens; false (with `error`) when it does not.
@@ -71,6 +72,7 @@ class Host {
   void take(const kvhost::HostMessage& message);
 
   kvhost::HostClient client_;
+  bool greeted_ = false;
   std::chrono::steady_clock::time_point heartbeatDue_;
 };
 

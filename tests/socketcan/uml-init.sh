@@ -1,14 +1,16 @@
 #!/bin/sh
-# init of the user-mode kernel that run-in-uml.sh boots: CAN modules, vcan0 (CAN FD), vcan1
-# (classic CAN), loopback, a private /tmp, then the program with its arguments; its exit status
-# goes to $KV_UML_OUT/status and the kernel halts.
+# init of the user-mode kernel that run-in-uml.sh boots: CAN modules (slcan too: a CAN controller
+# with bit timing on a pseudo-terminal), vcan0 (CAN FD), vcan1 (classic CAN), loopback, a private
+# /tmp, then the program with its arguments; its exit status goes to $KV_UML_OUT/status and the
+# kernel halts.
 export PATH="$KV_UML_PATH:/usr/sbin:/sbin"
 mount -t proc proc /proc
 mount -t sysfs sysfs /sys
 mount -t tmpfs tmpfs /tmp
+mkdir -p /dev/pts && mount -t devpts devpts /dev/pts
 modules=/usr/lib/uml/modules/$(uname -r)/kernel
 for m in net/can/can net/can/can-raw net/can/can-bcm net/can/j1939/can-j1939 \
-         drivers/net/can/dev/can-dev drivers/net/can/vcan; do
+         drivers/net/can/dev/can-dev drivers/net/can/vcan drivers/net/can/slcan/slcan; do
   insmod "$modules/$m.ko"
 done
 ip link set lo up
