@@ -24,16 +24,10 @@ out=$(mktemp -d "$(dirname "$program")/uml-run.XXXXXX")
 trap 'rm -rf "$out"' EXIT
 printf '%s\n' "$@" > "$out/arguments"
 echo "booting user-mode Linux for $(basename "$program")"
-# Kernel arguments that are no kernel option reach init as environment variables (the sanitizers'
-# options too, so sanitizer builds run there as they do outside).
-sanitizers=""
-for name in ASAN_OPTIONS UBSAN_OPTIONS TSAN_OPTIONS LSAN_OPTIONS; do
-  value=$(printenv "$name") && sanitizers="$sanitizers $name=$value"
-done
-# shellcheck disable=SC2086
+# Kernel arguments that are no kernel option reach init as environment variables.
 timeout 280 linux.uml mem=768M root=/dev/root rootfstype=hostfs rootflags=/ rw \
   init="$here/uml-init.sh" con=null con0=fd:0,fd:1 \
-  KV_UML_PROGRAM="$program" KV_UML_OUT="$out" KV_UML_PATH="$PATH" $sanitizers \
+  KV_UML_PROGRAM="$program" KV_UML_OUT="$out" KV_UML_PATH="$PATH" \
   < /dev/null > "$out/console" 2>&1
 cat "$out/program.log" 2> /dev/null
 if [ ! -f "$out/status" ]; then

@@ -1,12 +1,19 @@
-// The CAN state word of an interface bound to a SocketCAN device: error frames, the device's own
-// report over netlink, and a device that is down or gone.
+// Interfaces bound to SocketCAN devices where no device is: the CAN state word (error frames, the
+// device's own report, a device that is down or gone) and sessions on a lost bus. Their traffic is
+// tested inside user-mode Linux (tests/socketcan); these run everywhere, sanitizer builds too.
 #include <gtest/gtest.h>
 #include <linux/can.h>
 #include <linux/can/error.h>
 
+#include <future>
 #include <vector>
 
+#include "driver/Properties.h"
+#include "driver/Sessions.h"
 #include "driver/States.h"
+#include "driver/Status.h"
+#include "driver/tarvix.h"
+#include "tarvix/TarvixControl.h"
 #include "tarvix/socketcan/BusState.h"
 
 namespace tarvix::test {
@@ -83,6 +90,36 @@ TEST(SocketCanStateTest, StateWordFollowsErrorFramesUnlessTheDeviceReportsItsOwn
     for (const WireFrame& f : c.frames) state.observe(f);
     EXPECT_EQ(state.word(c.started, c.device), c.word) << c.what;
   }
+}
+
+// CAN9 on a device this machine does not have.
+constexpr const char* kMissingDevice = R"({"devices": [{"name": "SocketCAN", "interfaces": [
+    {"name": "CAN9", "device": "kvnone0", "port": 9}]}]})";
+
+TEST(SocketCanStateTest, SessionsOnAMissingDeviceRunOnALostBus) {
+  std::string error;
+  ASSERT_TRUE(LoadConfiguration(kMissingDevice, "", &error)) << error;
+  kxRef receive = 0;
+  ASSERT_EQ(
+      kxCreateSession(driver::kDatabaseCan, "", "", "CAN9", driver::kModeReceiveStream, &receive),
+      driver::kSuccess);
+  ASSERT_EQ(kxStart(receive, driver::kScopeNormal), driver::kSuccess);
+  uint32_t state = 0;
+  ASSERT_EQ(kxReadState(receive, driver::kStateCan, sizeof state, &state, nullptr), 0);
+  EXPECT_EQ(state & 0xF, driver::kCanCommBusOff);
+  uint8_t buffer[64];
+  uint32_t bytes = 1;
+  EXPECT_EQ(kxReadFrame(receive, buffer, sizeof buffer, 0.0, &bytes), driver::kReadTimeout);
+  EXPECT_EQ(bytes, 0u);
+  // A read that waits without limit ends when its session is cleared.
+  auto waiting = std::async(std::launch::async, [&] {
+    uint32_t none = 0;
+    return kxReadFrame(receive, buffer, sizeof buffer, -1.0, &none);
+  });
+  EXPECT_EQ(kxClear(receive), driver::kSuccess);
+  ASSERT_EQ(waiting.wait_for(std::chrono::seconds(30)), std::future_status::ready);
+  EXPECT_EQ(waiting.get(), driver::kInvalidReference);
+  ResetToDefaults();
 }
 
 }  // namespace
