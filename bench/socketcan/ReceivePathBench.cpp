@@ -70,7 +70,9 @@ void BM_ReceivePathOnVcan(benchmark::State& state, kvtest::UmlController* contro
       burst += line;
     }
     const auto start = std::chrono::steady_clock::now();
-    Shell(burst + "wait");
+    Background cangen(burst + "wait");  // the host keeps its heartbeat while it runs
+    host.WaitFor([&] { return cangen.Ended(std::chrono::milliseconds(0)); },
+                 std::chrono::minutes(5));
     const double seconds =
         std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
     host.WaitFor([&] { return Counted(host, senders) >= frames; });

@@ -175,6 +175,7 @@ bool Background::Ended(std::chrono::milliseconds timeout) {
   if (ended && pid_ > 0) {
     cpuSeconds_ = static_cast<double>(usage.ru_utime.tv_sec + usage.ru_stime.tv_sec) +
                   static_cast<double>(usage.ru_utime.tv_usec + usage.ru_stime.tv_usec) / 1e6;
+    exitStatus_ = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
   }
   if (ended) pid_ = -1;
   return ended;

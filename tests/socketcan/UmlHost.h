@@ -87,10 +87,13 @@ class Background {
   pid_t pid() const { return pid_; }
   // CPU seconds (user and system) of the program once it has ended.
   double cpuSeconds() const { return cpuSeconds_; }
+  // Its exit status once it has ended (-1 when it was killed).
+  int exitStatus() const { return exitStatus_; }
 
  private:
   pid_t pid_ = -1;
   double cpuSeconds_ = 0;
+  int exitStatus_ = -1;
 };
 
 // CPU seconds (user and system) a running process has used so far, all its threads.
