@@ -152,7 +152,7 @@ const Rule kRules[] = {
      [](const SessionSetup&, SessionSettings& s, const void* v) {
        return SetRange(s.nodeAddress, v, driver::kJ1939NullAddress);
      },
-     nullptr},  // read through the bus's claims (below)
+     nullptr},  // read back as the session holds it (Load)
     {driver::kPropCanIoMode, 4, kCan | kOutput, false, nullptr, nullptr},  // from the database
 };
 
