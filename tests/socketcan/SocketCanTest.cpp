@@ -1,5 +1,5 @@
-// Interfaces bound to SocketCAN devices, inside a user-mode kernel with vcan0 (CAN FD) and vcan1
-// (classic CAN): the controller's view over TCP against can-utils as the independent reference.
+// Interfaces bound to SocketCAN devices, inside a user-mode kernel with vcan0 (CAN FD), vcan1
+// (classic CAN) and an slcan adapter: the controller over TCP against can-utils as the reference.
 #include <gtest/gtest.h>
 
 #include <algorithm>
