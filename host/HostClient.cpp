@@ -129,6 +129,10 @@ bool HostClient::WaitForClose(std::chrono::milliseconds timeout) {
   return true;
 }
 
+void HostClient::StopSending() {
+  if (socket_ >= 0) shutdown(socket_, SHUT_WR);
+}
+
 void HostClient::Close() {
   if (socket_ >= 0) close(socket_);
   socket_ = -1;

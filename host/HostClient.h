@@ -37,10 +37,15 @@ class HostClient {
 
   // True once the service ended the connection (end of stream seen).
   bool closed() const { return closed_; }
+  // Received bytes that do not make a whole message yet; after the end of the stream, the part
+  // of a message the service did not finish.
+  size_t partialBytes() const { return buffer_.size(); }
 
   // Waits up to `timeout` for the service to end the connection, discarding messages.
   bool WaitForClose(std::chrono::milliseconds timeout);
 
+  // Ends the sending direction only: the service sees the host leave while it still reads.
+  void StopSending();
   void Close();
   const std::string& error() const { return error_; }
 

@@ -13,6 +13,7 @@ HostConnection::HostConnection(platform::net::SocketHandle socket, ConnectionSet
       hardwareTable(std::move(setup.hardwareTable)),
       hardwareCount(static_cast<uint16_t>(hardwareTable.size())),
       statistics(setup.statistics),
+      heartbeatLimitMs(setup.heartbeatLimitMs),
       socket_(socket) {
   for (size_t i = 0; i < kDriverVersionCount; ++i) driverVersion[i] = setup.driverVersion[i];
   heartbeatWatch.Restart();

@@ -18,11 +18,15 @@
 
 namespace nKV_DLL300 {
 
+// A host that sends no CMD_HEARTBEAT for longer than this is ended (the service's default).
+constexpr uint32_t kDefaultHeartbeatLimitMs = 10000;
+
 // What a new connection takes over from the service at accept.
 struct ConnectionSetup {
   uint32_t driverVersion[kDriverVersionCount] = {};
-  std::vector<HardwareRecord> hardwareTable;  // the connection's own copy
-  ServiceStatistics* statistics = nullptr;    // not owned; may be null
+  std::vector<HardwareRecord> hardwareTable;             // the connection's own copy
+  ServiceStatistics* statistics = nullptr;               // not owned; may be null
+  uint32_t heartbeatLimitMs = kDefaultHeartbeatLimitMs;  // silence that ends the connection
 };
 
 // Created by the service thread at accept and destroyed when its slot is freed, after its
@@ -48,6 +52,7 @@ class HostConnection {
   const std::vector<HardwareRecord> hardwareTable;  // own copy, read-only
   const uint16_t hardwareCount;
   ServiceStatistics* const statistics;  // not owned; may be null
+  const uint32_t heartbeatLimitMs;      // CheckHeartbeat ends the connection after this silence
 
   // The socket while the connection holds one; kInvalidSocket after CloseConnection.
   // Service thread only (SendReply reads it under its lock).
@@ -55,14 +60,18 @@ class HostConnection {
   // True once a send failed so badly that the stream cannot go on; the loop then ends the
   // connection. Any thread.
   bool linkBroken() const { return linkBroken_.load(); }
+  // True while part of a message waits to be handed to the system (the socket had no room for
+  // all of it). Any thread.
+  bool hasPendingOutput() const { return outputPending_.load(); }
 
  private:
   friend class LinkAccess;
 
   std::mutex sendMutex_;
-  platform::net::SocketHandle socket_;  // changed under sendMutex_ by the service thread only
-  uint32_t sequenceNumber_ = 0;         // guarded by sendMutex_
-  std::vector<uint8_t> pendingOutput_;  // guarded by sendMutex_: unsent rest of one message
+  platform::net::SocketHandle socket_;      // changed under sendMutex_ by the service thread only
+  uint32_t sequenceNumber_ = 0;             // guarded by sendMutex_
+  std::vector<uint8_t> pendingOutput_;      // guarded by sendMutex_: unsent rest of one message
+  std::atomic<bool> outputPending_{false};  // written under sendMutex_: !pendingOutput_.empty()
   std::atomic<bool> linkBroken_{false};
 };
 

@@ -33,6 +33,8 @@ int32_t ReceiveMessage(HostConnection& connection, char* buffer, size_t& receive
 }
 
 void CloseConnection(HostConnection& connection) {
+  // Whatever the host was sent last reaches it whole, if it reads within the send wait.
+  FinishPendingOutput(connection);
   {
     std::lock_guard<std::mutex> lock(LinkAccess::sendMutex(connection));
     net::SocketHandle& socket = LinkAccess::socket(connection);
@@ -41,12 +43,13 @@ void CloseConnection(HostConnection& connection) {
       socket = net::kInvalidSocket;
     }
     LinkAccess::pendingOutput(connection).clear();
+    LinkAccess::notePendingOutput(connection);
   }
   connection.closeRequested.store(true);
 }
 
 int32_t CheckHeartbeat(HostConnection& connection) {
-  if (connection.heartbeatWatch.ElapsedMilliseconds() <= kHeartbeatLimitMs) return 0;
+  if (connection.heartbeatWatch.ElapsedMilliseconds() <= connection.heartbeatLimitMs) return 0;
   EndSession(connection);
   SendText(connection, kHeartbeatErrorText, nullptr, kMessageErrorText);
   CloseConnection(connection);

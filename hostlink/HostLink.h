@@ -11,7 +11,6 @@ namespace nKV_DLL300 {
 constexpr size_t kMessageBufferSize = 256;
 constexpr int32_t kReceiveFailed = -7;
 constexpr int32_t kHeartbeatTimeout = -25;
-constexpr uint64_t kHeartbeatLimitMs = 10000;
 constexpr char kHeartbeatErrorText[] =
     "<ERROR: Heartbeat message missing| TCP Client disconnect> \n";
 
@@ -21,14 +20,15 @@ constexpr char kHeartbeatErrorText[] =
 // Service thread only.
 int32_t ReceiveMessage(HostConnection& connection, char* buffer, size_t& received);
 
-// Closes the socket (a failing close puts the socket error into lastTcpError) and marks the
-// connection for the loop to free its slot. The session must already be stopped: no other
-// thread may send any more. Service thread only.
+// Hands the unsent rest of a partly sent message to the system first (waiting at most the send
+// wait of 1 s for room), then closes the socket (a failing close puts the socket error into
+// lastTcpError) and marks the connection for the loop to free its slot. The session must already
+// be stopped: no other thread may send any more. Service thread only.
 void CloseConnection(HostConnection& connection);
 
-// Ends a connection whose heartbeat lapsed more than 10 000 ms ago: stops its session, sends
-// the heartbeat error text, closes it and clears the watch. Returns 0, or -25 when it ended
-// the connection. Service thread only.
+// Ends a connection whose heartbeat lapsed more than its heartbeatLimitMs (10 000 ms unless the
+// service was given another time) ago: stops its session, sends the heartbeat error text, closes
+// it and clears the watch. Returns 0, or -25 when it ended the connection. Service thread only.
 int32_t CheckHeartbeat(HostConnection& connection);
 
 // Restarts the heartbeat watch (CMD_HEARTBEAT). Service thread only.

@@ -12,6 +12,10 @@ class LinkAccess {
   static uint32_t& sequenceNumber(HostConnection& c) { return c.sequenceNumber_; }
   static std::vector<uint8_t>& pendingOutput(HostConnection& c) { return c.pendingOutput_; }
   static std::atomic<bool>& linkBroken(HostConnection& c) { return c.linkBroken_; }
+  // After any change of pendingOutput: publishes whether a rest is waiting. Send lock held.
+  static void notePendingOutput(HostConnection& c) {
+    c.outputPending_.store(!c.pendingOutput_.empty());
+  }
 };
 
 }  // namespace nKV_DLL300

@@ -51,6 +51,7 @@ MessageHeaderFields HeaderFor(HostConnection& connection, const LinkedSession* s
 int32_t BreakLink(HostConnection& connection) {
   net::ShutdownBoth(LinkAccess::socket(connection));
   LinkAccess::pendingOutput(connection).clear();
+  LinkAccess::notePendingOutput(connection);
   LinkAccess::linkBroken(connection).store(true);
   return kSendFailed;
 }
@@ -73,6 +74,7 @@ bool FlushPendingLocked(HostConnection& connection, uint64_t deadline) {
       return false;
     }
     pending.erase(pending.begin(), pending.begin() + sent);
+    LinkAccess::notePendingOutput(connection);
   }
   return true;
 }
@@ -101,6 +103,7 @@ int32_t SendMessageLocked(HostConnection& connection, const net::ConstBuffer (&p
     if (offset < part.size) pending.insert(pending.end(), bytes + offset, bytes + part.size);
     offset = offset > part.size ? offset - part.size : 0;
   }
+  LinkAccess::notePendingOutput(connection);
   return 0;
 }
 
@@ -138,6 +141,13 @@ void FlushPendingOutput(HostConnection& connection) {
   if (!lock.owns_lock() || LinkAccess::socket(connection) == net::kInvalidSocket) return;
   if (LinkAccess::linkBroken(connection).load()) return;
   FlushPendingLocked(connection, NowIn(kMilliseconds));
+}
+
+void FinishPendingOutput(HostConnection& connection) {
+  std::lock_guard<std::mutex> lock(LinkAccess::sendMutex(connection));
+  if (LinkAccess::socket(connection) == net::kInvalidSocket) return;
+  if (LinkAccess::linkBroken(connection).load()) return;
+  FlushPendingLocked(connection, NowIn(kMilliseconds) + kSendWaitMs);
 }
 
 }  // namespace nKV_DLL300

@@ -35,8 +35,13 @@ inline void SendText(HostConnection& connection, const char* text, const LinkedS
   SendReply(connection, text, session, type, 0);
 }
 
-// Tries to pass the unsent rest of a partly taken message to the system without waiting.
-// The service thread calls it in every pass; it never blocks on a send in another thread.
+// Tries to pass the unsent rest of a partly taken message to the system without waiting. The
+// service thread calls it as soon as the socket of a connection with pending output can take
+// more; it never blocks on a send in another thread.
 void FlushPendingOutput(HostConnection& connection);
+
+// Passes the unsent rest to the system, waiting at most the send wait (1 s) for room. Called
+// before the connection is closed, when no other thread sends any more. Service thread.
+void FinishPendingOutput(HostConnection& connection);
 
 }  // namespace nKV_DLL300

@@ -24,9 +24,11 @@ constexpr size_t kConnectionSlots = 8;
 constexpr uint32_t kModuleStartDelayMs = 10000;
 
 // How a service starts. The module always uses the defaults with the linked driver; tests
-// shorten the delay and let the system choose the port.
+// shorten the delay and the heartbeat time and let the system choose the port.
 struct ServiceOptions {
   uint32_t startDelayMs = kModuleStartDelayMs;
+  // A host that sends no CMD_HEARTBEAT for longer than this is ended.
+  uint32_t heartbeatLimitMs = kDefaultHeartbeatLimitMs;
   // Replaces the configuration file when set (its text is read like the file's value).
   std::optional<std::string> portText;
   DriverSystem* driver = nullptr;  // required; not owned, must outlive the service

@@ -43,6 +43,35 @@ int PollRestarting(pollfd* fds, nfds_t count, uint32_t timeoutMs) {
   }
 }
 
+// The waits of the service: readability of every socket, writability of those that want it
+// (wantWritable and writable may be null when none does).
+int32_t PollSockets(const SocketHandle* sockets, size_t count, const bool* wantWritable,
+                    bool* readable, bool* writable, uint32_t timeoutMs) {
+  std::vector<pollfd> fds(count);
+  for (size_t i = 0; i < count; ++i) {
+    const bool write = wantWritable != nullptr && wantWritable[i];
+    fds[i] = pollfd{sockets[i], static_cast<short>(POLLIN | (write ? POLLOUT : 0)), 0};
+  }
+  int ready = PollRestarting(fds.data(), fds.size(), timeoutMs);
+  if (ready < 0) return Fail(-1);
+  int32_t readyCount = 0;
+  for (size_t i = 0; i < count; ++i) {
+    // select fails on a handle that is not open; poll reports it per descriptor instead.
+    if (fds[i].revents & POLLNVAL) {
+      SetLastSocketError(kErrorNotSocket);
+      return -1;
+    }
+    readable[i] = (fds[i].revents & (POLLIN | POLLHUP | POLLERR)) != 0;
+    bool canWrite = false;
+    if (writable != nullptr) {
+      canWrite = (fds[i].events & POLLOUT) != 0 && (fds[i].revents & (POLLOUT | POLLERR)) != 0;
+      writable[i] = canWrite;
+    }
+    readyCount += (readable[i] || canWrite) ? 1 : 0;
+  }
+  return readyCount;
+}
+
 }  // namespace
 
 SocketHandle CreateTcpSocket() {
@@ -91,21 +120,12 @@ bool SetSendBufferSize(SocketHandle socket, int32_t bytes) {
 
 int32_t WaitReadable(const SocketHandle* sockets, size_t count, bool* readable,
                      uint32_t timeoutMs) {
-  std::vector<pollfd> fds(count);
-  for (size_t i = 0; i < count; ++i) fds[i] = pollfd{sockets[i], POLLIN, 0};
-  int ready = PollRestarting(fds.data(), fds.size(), timeoutMs);
-  if (ready < 0) return Fail(-1);
-  int32_t readableCount = 0;
-  for (size_t i = 0; i < count; ++i) {
-    // select fails on a handle that is not open; poll reports it per descriptor instead.
-    if (fds[i].revents & POLLNVAL) {
-      SetLastSocketError(kErrorNotSocket);
-      return -1;
-    }
-    readable[i] = (fds[i].revents & (POLLIN | POLLHUP | POLLERR)) != 0;
-    readableCount += readable[i] ? 1 : 0;
-  }
-  return readableCount;
+  return PollSockets(sockets, count, nullptr, readable, nullptr, timeoutMs);
+}
+
+int32_t WaitReadableOrWritable(const SocketHandle* sockets, size_t count, const bool* wantWritable,
+                               bool* readable, bool* writable, uint32_t timeoutMs) {
+  return PollSockets(sockets, count, wantWritable, readable, writable, timeoutMs);
 }
 
 int32_t WaitWritable(SocketHandle socket, uint32_t timeoutMs) {

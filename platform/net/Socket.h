@@ -32,6 +32,10 @@ bool SetSendBufferSize(SocketHandle socket, int32_t bytes);
 // `timeoutMs` passed. Returns the number of readable sockets with readable[i] set for each, 0 on
 // time-out, -1 on failure (also when a handle is not an open socket).
 int32_t WaitReadable(const SocketHandle* sockets, size_t count, bool* readable, uint32_t timeoutMs);
+// WaitReadable that also ends when a socket with wantWritable[i] set can take more data
+// (writable[i] set for it). Returns the number of sockets that are readable or writable.
+int32_t WaitReadableOrWritable(const SocketHandle* sockets, size_t count, const bool* wantWritable,
+                               bool* readable, bool* writable, uint32_t timeoutMs);
 // Waits until the socket can take more data: 1 writable, 0 time-out, -1 failure.
 int32_t WaitWritable(SocketHandle socket, uint32_t timeoutMs);
 

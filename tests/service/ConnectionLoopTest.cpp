@@ -3,6 +3,7 @@
 
 #include <vector>
 
+#include "tarvix/TarvixControl.h"
 #include "tests/support/ServiceFixture.h"
 
 namespace kvtest {
@@ -10,9 +11,15 @@ namespace {
 
 constexpr size_t kSlots = 8;
 constexpr std::chrono::milliseconds kNoGreetingWindow = 300ms;
-constexpr std::chrono::milliseconds kHeartbeatDeadline = 40s;
+constexpr std::chrono::milliseconds kWellWithinThePassWait = 5s;
 
-class ConnectionLoopTest : public ServiceFixture {};
+class ConnectionLoopTest : public ServiceFixture {
+ protected:
+  void StartWithShortHeartbeat() {
+    heartbeatLimitMs_ = kTestHeartbeatLimitMs;
+    StartService();
+  }
+};
 
 TEST_F(ConnectionLoopTest, NinthHostWaitsInBacklogUntilSlotFrees) {
   std::vector<kvhost::HostClient> hosts;
@@ -40,10 +47,29 @@ TEST_F(ConnectionLoopTest, HostThatClosesItsSocketIsRemoved) {
   EXPECT_EQ(reply->header.sequence, 1u);
 }
 
+// Hosts that vanished without closing (asleep, cable pulled) hold every slot while a ninth host
+// waits in the backlog and gives up: the watchdog still ends them, and the next host gets in.
+TEST_F(ConnectionLoopTest, VanishedHostsInEverySlotAreEndedAndTheNextHostGetsIn) {
+  StartWithShortHeartbeat();
+  std::vector<kvhost::HostClient> vanished;
+  for (size_t i = 0; i < kSlots; ++i) vanished.push_back(ConnectHost());
+  kvhost::HostClient gaveUp = ConnectQuietly();
+  gaveUp.Close();
+  kvhost::HostClient next = ConnectQuietly();
+  auto greeting = next.Receive(kConditionDeadline);
+  ASSERT_TRUE(greeting) << "the host never got in";
+  EXPECT_EQ(greeting->text(), "<Connected to Kelvane>\n");
+  EXPECT_TRUE(WaitUntil([&] { return service().statistics().heartbeatTimeouts.load() >= kSlots; }));
+}
+
 TEST_F(ConnectionLoopTest, SilentHostIsEndedWithTheHeartbeatText) {
+  StartWithShortHeartbeat();
+  const auto connected = std::chrono::steady_clock::now();
   kvhost::HostClient host = ConnectHost();
-  auto farewell = host.Receive(kHeartbeatDeadline);
+  auto farewell = host.Receive(kConditionDeadline);
   ASSERT_TRUE(farewell) << "no heartbeat error";
+  EXPECT_GE(std::chrono::steady_clock::now() - connected,
+            std::chrono::milliseconds(kTestHeartbeatLimitMs));
   EXPECT_EQ(farewell->header.type, 5);
   EXPECT_EQ(farewell->header.sequence, 1u);
   EXPECT_EQ(farewell->text(), "<ERROR: Heartbeat message missing| TCP Client disconnect> \n");
@@ -107,6 +133,60 @@ TEST_F(SlowReaderTest, HostThatNeverReadsStaysConnectedAndIsStillServed) {
   }
   EXPECT_TRUE(gap) << "no message was dropped";
   EXPECT_EQ(statistics.connectionsOpen.load(), 1u);
+}
+
+// A hardware table larger than the socket's send buffer: a reply the system can take only in
+// part, however the buffers stand.
+class PartlySentReplyTest : public SlowReaderTest {
+ protected:
+  void SetUp() override {
+    std::string devices;
+    for (int d = 0; d < kDevices; ++d) {
+      std::string interfaces;
+      for (int i = 0; i < kInterfacesPerDevice; ++i) {
+        const std::string name = "CAN" + std::to_string(d * kInterfacesPerDevice + i + 1);
+        interfaces += std::string(i ? "," : "") + R"({"name": ")" + name + R"(", "bus": "b"})";
+      }
+      devices += std::string(d ? "," : "") + R"({"name": "D)" + std::to_string(d) +
+                 R"(", "interfaces": [)" + interfaces + "]}";
+    }
+    std::string error;
+    ASSERT_TRUE(tarvix::LoadConfiguration(
+        R"({"buses": [{"name": "b"}], "devices": [)" + devices + "]}", ".", &error))
+        << error;
+    SlowReaderTest::SetUp();
+  }
+  void TearDown() override {
+    SlowReaderTest::TearDown();
+    tarvix::ResetToDefaults();
+  }
+  static constexpr int kDevices = 64;  // 1024 interfaces: a table of 45 056 bytes
+  static constexpr int kInterfacesPerDevice = 16;
+};
+
+// The rest of the reply goes out as soon as the host reads again, and before the connection of a
+// host that leaves is closed.
+TEST_F(PartlySentReplyTest, RestOfAPartlySentMessageFollowsWhenTheHostReadsOrLeaves) {
+  for (bool leaves : {false, true}) {
+    SCOPED_TRACE(leaves ? "the host leaves" : "the host reads");
+    StartService();
+    kvhost::HostClient host;
+    ASSERT_TRUE(host.ConnectWithReceiveBuffer("127.0.0.1", port(), kSmallBuffer)) << host.error();
+    ASSERT_TRUE(WaitUntil([&] { return service().connections[0].connection != nullptr; }));
+    const nKV_DLL300::HostConnection& connection = *service().connections[0].connection;
+    SendAndWaitDispatched(host, "CMD_GET_HARDWARE_INFO");
+    ASSERT_TRUE(connection.hasPendingOutput()) << "the reply was taken whole";
+    if (leaves) host.StopSending();
+    // Well within the pass wait of 10 s, every message has arrived whole.
+    EXPECT_TRUE(WaitUntil(
+        [&] {
+          while (host.Receive(kNoGreetingWindow)) {
+          }
+          const bool sent = leaves ? host.closed() : !connection.hasPendingOutput();
+          return sent && host.partialBytes() == 0;
+        },
+        kWellWithinThePassWait));
+  }
 }
 
 }  // namespace

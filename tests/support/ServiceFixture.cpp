@@ -64,6 +64,7 @@ nKV_DLL300::ServiceOptions ServiceFixture::Options() {
   nKV_DLL300::ServiceOptions options;
   options.startDelayMs = 0;
   options.portText = "0";
+  options.heartbeatLimitMs = heartbeatLimitMs_;
   return options;
 }
 

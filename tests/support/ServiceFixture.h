@@ -21,6 +21,9 @@ using namespace std::chrono_literals;
 // Generous deadlines: a slow or loaded machine must not fail a test.
 constexpr std::chrono::milliseconds kReplyDeadline = 10s;
 constexpr std::chrono::milliseconds kConditionDeadline = 30s;
+// The heartbeat time of tests that wait for the watchdog: short, so that they do not wait out the
+// controller's 10 s, yet long enough for a test's own steps on a loaded machine.
+constexpr uint32_t kTestHeartbeatLimitMs = 3000;
 
 // Waits until `condition` holds or `timeout` passed; returns its last value.
 bool WaitUntil(const std::function<bool()>& condition,
@@ -49,7 +52,8 @@ class ServiceFixture : public ::testing::Test {
   void SetUp() override;
   void TearDown() override;
 
-  // The options of the service StartService makes; the default: delay 0, port "0".
+  // The options of the service StartService makes; the default: delay 0, port "0", heartbeat
+  // time heartbeatLimitMs_.
   virtual nKV_DLL300::ServiceOptions Options();
   // The driver the service uses: the linked driver library.
   virtual nKV_DLL300::DriverSystem& Driver();
@@ -78,6 +82,8 @@ class ServiceFixture : public ::testing::Test {
   void SendAndWaitDispatched(kvhost::HostClient& host, const std::string& text);
 
   TemporaryDrive drive_;
+  // Set before StartService to end hosts sooner than the controller's 10 s.
+  uint32_t heartbeatLimitMs_ = nKV_DLL300::kDefaultHeartbeatLimitMs;
 
  private:
   std::unique_ptr<nKV_DLL300::ServiceContext> service_;
