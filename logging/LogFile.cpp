@@ -51,6 +51,7 @@ void OpenLogFile(SessionLog& log, std::string_view headerLine) {
   log.setOpenedType(logType);
   log.setCanLayout(
       CanBinaryRecordLayout(settings.canIoMode.load(), settings.applicationProtocol.load()));
+  log.setLinChecksum(settings.logChecksum.load());
   const std::string path = NameLogFile(log, logType);
   switch (logType) {
     case kLogTypeText:

@@ -15,6 +15,7 @@ namespace nKV_DLL300 {
 namespace {
 
 // Settings a batch is written with; a batch is read at one moment, so they are read once for it.
+// The checksum column is the one the log was opened with.
 struct BatchSettings {
   uint8_t logTransmittedFrames;
   uint8_t logChecksum;
@@ -22,7 +23,7 @@ struct BatchSettings {
 
 BatchSettings ReadBatchSettings(const SessionLog& log) {
   const SessionSettings& settings = log.session().connection->settings;
-  return {settings.logTransmittedFrames.load(), settings.logChecksum.load()};
+  return {settings.logTransmittedFrames.load(), log.linChecksum()};
 }
 
 // Calls `write` for each of at most `frames` frames of the batch that the selection accepts.

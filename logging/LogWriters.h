@@ -16,7 +16,7 @@ namespace nKV_DLL300 {
 // or record; the next one is tried as usual. Nothing is read outside the
 // batch, whatever `frames` says. Poll thread. Never throws.
 void WriteCanLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames);
-// LIN lines carry the checksum column while logChecksum is set.
+// LIN lines carry the checksum column when logChecksum was set as the log was opened.
 void WriteLinLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames);
 void WriteFlexRayLog(SessionLog& log, const uint8_t* batch, uint32_t bytes, uint32_t frames);
 

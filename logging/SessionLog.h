@@ -45,6 +45,10 @@ class SessionLog {
   // mixes the two layouts.
   BinaryRecordLayout canLayout() const { return canLayout_; }
   void setCanLayout(BinaryRecordLayout layout) { canLayout_ = layout; }
+  // Whether LIN text lines carry the checksum column, fixed when the log is opened so that every
+  // line follows the header.
+  uint8_t linChecksum() const { return linChecksum_; }
+  void setLinChecksum(uint8_t logChecksum) { linChecksum_ = logChecksum; }
 
   // The text or binary stream (logFile): open while a run logs to one.
   bool isOpen() const { return logFile_ != nullptr; }
@@ -72,6 +76,7 @@ class SessionLog {
   std::FILE* logFile_ = nullptr;
   int32_t openedType_ = -1;
   BinaryRecordLayout canLayout_ = BinaryRecordLayout::kFixed24;
+  uint8_t linChecksum_ = 0;
   char line_[kLineBufferSize];
   // The stream's buffer: larger than the default page, so that a saturated bus costs a few
   // writes per millisecond. Outlives the stream (closed in closeStream or the destructor).
