@@ -143,7 +143,10 @@ int32_t CCAN::claimJ1939Address() {
     if (claimed < driver::kJ1939NullAddress) break;
     if (++retries > kClaimMaxRetries) break;
   }
-  if (claimed >= driver::kJ1939NullAddress) addressClaimStatus = kAddressNotClaimed;
+  // A write or read the driver refused reports its own status; only a claim that found no
+  // address is "not claimed".
+  if (addressClaimStatus >= 0 && claimed >= driver::kJ1939NullAddress)
+    addressClaimStatus = kAddressNotClaimed;
   recordStatus(addressClaimStatus);
   return addressClaimStatus;
 }
