@@ -61,6 +61,9 @@ class CCAN : public CTableSession<CanIdentifierRules, CanBusStatistics, kCanRead
  private:
   // The steps of openCanSession (see OpenSequence for the failure rule).
   void openSubordinate(OpenSequence& open, const std::string& interfaceName);
+  // Subordinate mode: the bit rate and (FD) data bit rate the interface runs, where the host gave
+  // none, into the settings; reads that fail leave them 0.
+  void readRunningRates(OpenSequence& open);
   void openDatabase(OpenSequence& open, const std::string& interfaceName);
   void openBuiltIn(OpenSequence& open, const std::string& interfaceName, uint64_t baudRate);
   void setInterfaceProperties(OpenSequence& open, uint32_t termination);

@@ -63,6 +63,23 @@ int32_t CCAN::openCanSession(const std::string& interfaceName, uint64_t baudRate
 void CCAN::openSubordinate(OpenSequence& open, const std::string& interfaceName) {
   readInterfaceIoMode(interfaceName);
   open.create(SubordinateDatabase(connection->settings), "", interfaceName);
+  readRunningRates(open);
+}
+
+// The interface runs at rates the host may not know: bus load needs them. A rate the host gave
+// stays; a read that fails leaves the rate unknown (bus load 0 %) and does not fail the start.
+void CCAN::readRunningRates(OpenSequence& open) {
+  SessionSettings& settings = connection->settings;
+  uint64_t rate = 0;
+  if (settings.baudRate.load() == 0) {
+    open.getIgnoringStatus(driver::kPropBaudRate, rate);
+    settings.baudRate.store(rate);
+  }
+  rate = 0;
+  if (settings.canIoMode.load() != 0 && settings.canFdBaudRate.load() == 0) {
+    open.getIgnoringStatus(driver::kPropCanFdBaudRate, rate);
+    settings.canFdBaudRate.store(rate);
+  }
 }
 
 void CCAN::openDatabase(OpenSequence& open, const std::string& interfaceName) {
@@ -74,6 +91,10 @@ void CCAN::openDatabase(OpenSequence& open, const std::string& interfaceName) {
   if (open.get(driver::kPropBaudRate, baudRate)) settings.baudRate.store(baudRate);
   uint32_t canIoMode = 0;
   if (open.get(driver::kPropCanIoMode, canIoMode)) settings.canIoMode.store(canIoMode);
+  // An FD cluster's data rate, without which its bus load cannot be reckoned.
+  uint64_t dataRate = 0;
+  if (canIoMode != 0) open.getIgnoringStatus(driver::kPropCanFdBaudRate, dataRate);
+  if (dataRate != 0) settings.canFdBaudRate.store(dataRate);
   open.setIgnoringStatus(driver::kPropIsoFdMode, settings.isoFdMode.load());
   open.stopInterface();
 }

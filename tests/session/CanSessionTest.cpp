@@ -115,10 +115,9 @@ TEST_F(CanSessionTest, BusErrorFramesAppearOnlyWhenTheHostAsksForThem) {
 }
 
 TEST_F(CanSessionTest, StatisticsShowFrameRatesAndTheBusLoadOfTheDefaultTraffic) {
-  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) {
-    s.baudRate = 500000;  // the frame durations are computed at the host's baud rate
-    s.logBusErrorFrames = 1;
-  });
+  // A subordinate session learns the bit rate its frame durations take from the interface.
+  kvhost::HostClient host =
+      StartedHost(0, "CAN1", [](SessionSettings& s) { s.logBusErrorFrames = 1; });
   ASSERT_TRUE(NextStatistics(host).has_value());  // the first period began with the session
   auto statistics = NextStatistics(host);
   ASSERT_TRUE(statistics.has_value());
@@ -186,6 +185,20 @@ TEST_F(CanSessionTest, DatabaseModeTakesBaudRateAndIoModeFromTheDatabase) {
   EXPECT_TRUE(RecordsWhere(host, AllFour));
 }
 
+// The data bit rate comes from the database too, so an FD cluster's bus load is known.
+TEST_F(CanSessionTest, DatabaseModeOnAnFdClusterShowsTheBusLoad) {
+  kvhost::HostClient host = StartedHost(0, "CAN5", [](SessionSettings& s) {
+    s.runMode.set("NORMAL");
+    s.alias.set("SimDB");
+    s.cluster.set("FD");
+  });
+  EXPECT_EQ(ConnectionAt(0).settings.canFdBaudRate.load(), 2000000u);
+  ASSERT_TRUE(NextStatistics(host).has_value());  // the first period began with the session
+  auto statistics = NextStatistics(host);
+  ASSERT_TRUE(statistics.has_value());
+  EXPECT_GT(statistics->busLoad, 0u);
+}
+
 // A second node that wants the claimed address on the same bus fails its start.
 TEST_F(CanSessionTest, J1939SessionClaimsItsAddressAndSeesExtendedFramesAsJ1939) {
   tarvix::StartRecording();
@@ -212,6 +225,19 @@ TEST_F(CanSessionTest, J1939SessionClaimsItsAddressAndSeesExtendedFramesAsJ1939)
   UsePort(ConnectionAt(1), "CAN2");
   j1939(ConnectionAt(1).settings);
   ExpectStartFails(second, "<ERROR: -1074384374>\n");  // 0xBFF6320A, not claimed
+}
+
+// A cluster without J1939 refuses the node name: the start reports the driver's status.
+TEST_F(CanSessionTest, RefusedJ1939NodeNameIsReportedWithTheDriversStatus) {
+  kvhost::HostClient host = ConnectHost();
+  UsePort(ConnectionAt(0), "CAN1");
+  SessionSettings& s = ConnectionAt(0).settings;
+  s.runMode.set("NORMAL");
+  s.alias.set("SimDB");
+  s.cluster.set("Body");
+  s.applicationProtocol = 1;
+  s.nodeAddress = 0x80;
+  ExpectStartFails(host, "<ERROR: -1074384848>\n");  // 0xBFF63030, unknown property
 }
 
 TEST_F(CanSessionTest, WrongBaudRateSeesOnlyBusErrorFrames) {
