@@ -65,11 +65,8 @@ VORA_DLL = $(DRIVE_C)/Program Files/Quovera/Shared/vora/vora.dll
 run: build
 	@mkdir -p "$(SERVICE_DIR)"
 	@install -D -m 755 build/vora/vora.dll "$(VORA_DLL)" && echo "kelvanert: measurement-data library $(VORA_DLL)"
-	@port=$$(awk 'BEGIN { p = 13456 } { for (i = 1; i <= NF; i++) { t = $$i; \
-	    if (length(t) <= 19 && index(t, "=") > 0) p = (substr(t, index(t, "=") + 1) + 0) % 65536; \
-	    exit } } END { print p }' "$(SERVICE_DIR)/kelvanert.ini" 2>/dev/null || echo 13456); \
-	  echo "kelvanert: service directory $(SERVICE_DIR)"; \
-	  echo "kelvanert: port $$port (listening 10 s after the start); Ctrl-C stops the controller"
+	@echo "kelvanert: service directory $(SERVICE_DIR)"
+	@echo "kelvanert: the service names its port when it listens, 10 s after the start; Ctrl-C stops the controller"
 	KELVANERT_DRIVE_C="$(DRIVE_C)" ./build/bin/kelvanert-controller
 
 # Every fuzz target (one per reader of outside input, fuzz/FuzzTargets.cmake) for FUZZ_SECONDS each

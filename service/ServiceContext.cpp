@@ -2,6 +2,7 @@
 #include "service/ServiceContext.h"
 
 #include "platform/Console.h"
+#include "platform/net/SocketError.h"
 #include "protocol/HardwareInfo.h"
 #include "service/CPollTCPThread.h"
 #include "service/Configuration.h"
@@ -17,6 +18,7 @@ namespace {
 
 constexpr uint64_t kPassPauseMs = 10;
 constexpr uint64_t kDelaySliceMs = 20;
+constexpr uint64_t kListenRetryMs = 1000;
 
 // The start delay, cut into slices so an unload need not wait for it to pass.
 void SleepWhileRunning(const ServiceContext& context, uint64_t milliseconds) {
@@ -40,13 +42,31 @@ std::string ChoosePort(const ServiceContext& context) {
   return choice.portText;
 }
 
-void SetUp(ServiceContext& context) {
+// Opens the listener; the first failure of a run of failures is told on the console, and so is
+// the port once it listens (the port a host connects to, whatever the configuration said).
+void TryListen(ServiceContext& context, const std::string& portText, bool& failureTold) {
   net::SocketHandle listener = net::kInvalidSocket;
-  (void)OpenListener(ChoosePort(context), listener);
+  if (OpenListener(portText, listener) < 0 || listener == net::kInvalidSocket) {
+    if (!failureTold) WriteConsoleLine(ListenerProblem(portText, net::LastSocketError()));
+    failureTold = true;
+    return;
+  }
+  context.boundPort.store(net::LocalPort(listener));
   context.listenSocket.store(listener);
-  (void)readDriverVersion(*context.options.driver, context.driverVersion);
-  if (listener != net::kInvalidSocket) context.boundPort.store(net::LocalPort(listener));
-  context.setUpComplete.store(true);
+  WriteConsoleLine("listening on port " + std::to_string(context.boundPort.load()));
+}
+
+// The passes; without a listener (its port was taken) the service tries again every second.
+void Serve(ServiceContext& context, const std::string& portText, bool& failureTold) {
+  while (context.running.load()) {
+    if (context.listenSocket.load() == net::kInvalidSocket) {
+      SleepWhileRunning(context, kListenRetryMs);
+      if (context.running.load()) TryListen(context, portText, failureTold);
+      continue;
+    }
+    (void)ConnectionPass(context);
+    SleepFor(kPassPauseMs);
+  }
 }
 
 }  // namespace
@@ -54,11 +74,12 @@ void SetUp(ServiceContext& context) {
 void RunService(ServiceContext& context) {
   SleepWhileRunning(context, context.options.startDelayMs);
   if (!context.running.load()) return;
-  SetUp(context);
-  while (context.running.load()) {
-    (void)ConnectionPass(context);
-    SleepFor(kPassPauseMs);
-  }
+  const std::string portText = ChoosePort(context);
+  bool failureTold = false;
+  TryListen(context, portText, failureTold);
+  (void)readDriverVersion(*context.options.driver, context.driverVersion);
+  context.setUpComplete.store(true);
+  Serve(context, portText, failureTold);
 }
 
 ServiceContext::ServiceContext(ServiceOptions serviceOptions) : options(std::move(serviceOptions)) {

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <vector>
 
+#include "platform/net/Socket.h"
 #include "tests/support/ServiceFixture.h"
 
 namespace kvtest {
@@ -52,16 +53,45 @@ TEST_F(ServiceStartTest, SetUpProblemsAreReportedOnTheConsoleInOneLine) {
     testing::internal::CaptureStderr();
     StartService(kSetUpOnly);
     std::string console = testing::internal::GetCapturedStderr();
+    const int32_t listening = service().listeningPort();
     StopService();
     for (const std::string& word : row.words)
       EXPECT_NE(console.find(word), std::string::npos) << console;
-    EXPECT_EQ(std::count(console.begin(), console.end(), '\n'), row.words.empty() ? 0 : 1)
+    // Besides the problem, the one line that names the port the service listens on.
+    EXPECT_NE(console.find("listening on port " + std::to_string(listening)), std::string::npos)
+        << console;
+    EXPECT_EQ(std::count(console.begin(), console.end(), '\n'), row.words.empty() ? 1 : 2)
         << console;
     if (row.file == nullptr) {
       EXPECT_TRUE(std::filesystem::is_directory(drive_.Native("QV-RT\\tarvix\\kelvane")));
     }
     std::filesystem::remove_all(drive_.Native("QV-RT"));
   }
+}
+
+// A port another program holds: one line names it and the reason, and the service takes the port
+// over once it frees.
+TEST_F(ServiceStartTest, PortInUseIsToldOnceAndTakenOverWhenItFrees) {
+  platform::net::SocketHandle holder = platform::net::CreateTcpSocket();
+  ASSERT_TRUE(platform::net::BindAnyAddress(holder, 0));
+  ASSERT_TRUE(platform::net::Listen(holder, 1));
+  const int32_t held = platform::net::LocalPort(holder);
+  drive_.WriteFile(kConfigFile, "PORT=" + std::to_string(held) + "\n");
+  testing::internal::CaptureStderr();
+  StartService(kSetUpOnly);
+  EXPECT_EQ(service().listeningPort(), -1);
+  platform::net::Close(holder);
+  EXPECT_TRUE(WaitUntil([&] { return service().listeningPort() == held; }));
+  const std::string console = testing::internal::GetCapturedStderr();
+  EXPECT_NE(console.find("cannot listen on port " + std::to_string(held) + " (socket error 10048"),
+            std::string::npos)
+      << console;
+  EXPECT_EQ(std::count(console.begin(), console.end(), '\n'), 2) << console;
+  kvhost::HostClient host;
+  ASSERT_TRUE(host.Connect("127.0.0.1", static_cast<uint16_t>(held))) << host.error();
+  auto greeting = host.Receive(kReplyDeadline);
+  ASSERT_TRUE(greeting);
+  EXPECT_EQ(greeting->text(), "<Connected to Kelvane>\n");
 }
 
 }  // namespace
