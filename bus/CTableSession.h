@@ -77,7 +77,8 @@ class CTableSession : public CBusSystem {
         break;
     }
   }
-  // A frame taken into the table while txTimeStatistic > 0.
+  // A frame that passed the table's filters (listed or not: a full table still counts it), while
+  // txTimeStatistic > 0.
   virtual void countFrame(const driver::RawFrameView& frame, bool inWindow) = 0;
 
   // reportBusState, step 1: a new statistics period starts now.

@@ -12,7 +12,8 @@ inline constexpr uint32_t kFlexRayStateId = 0x00130020;            // 4-byte sta
 inline constexpr uint32_t kFlexRayStatisticsStateId = 0x08130021;  // six 32-bit words
 inline constexpr uint32_t kFlexRayLastStateId = 0x00130004;        // one 32-bit word
 
-// A frame taken into the identifier table: data (0x20) or null (0x21); other types count nowhere.
+// A frame that passed the identifier table's filters: data (0x20) or null (0x21); other types count
+// nowhere.
 void countFrame(FlexRayBusStatistics& statistics, uint8_t type, bool inWindow);
 
 // The two window counts turned into frames per second over elapsedMs.

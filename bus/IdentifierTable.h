@@ -78,13 +78,15 @@ class IdentifierTable {
   // Entry i in the order first seen (0 <= i < idCount).
   const Entry& entry(uint32_t i) const { return entries_[i]; }
 
-  // Folds a batch of `bytes` bytes into the table. onTaken(const driver::RawFrameView&) is called
-  // for every frame that was counted into an entry (the bus statistics count those). Returns 0, or
-  // kStatusPayloadNotStored when a payload copy could not be stored: that entry then holds no
-  // payload (payloadLength 0) until a later frame's copy succeeds.
-  template <class OnTaken>
+  // Folds a batch of `bytes` bytes into the table. onCounted(const driver::RawFrameView&) is
+  // called for every frame that passes the settings' filters (the bus statistics count those),
+  // whether or not its identifier found room: a full table lists no new identifier, but the
+  // statistics still describe the whole bus. Returns 0, or kStatusPayloadNotStored when a payload
+  // copy could not be stored: that entry then holds no payload (payloadLength 0) until a later
+  // frame's copy succeeds.
+  template <class OnCounted>
   int32_t updateIdentifierTable(const void* batch, uint32_t bytes, const TableSettings& settings,
-                                OnTaken&& onTaken) {
+                                OnCounted&& onCounted) {
     driver::RawFrameWalker walker(batch, bytes);
     driver::RawFrameView frame;
     typename Rules::KeyState keyState;
@@ -94,8 +96,8 @@ class IdentifierTable {
       // before it, taken into the table or not.
       const uint64_t key = Rules::key(frame, keyState);
       if (skipped(frame, settings)) continue;
-      if (!take(frame, key, status)) continue;
-      onTaken(static_cast<const driver::RawFrameView&>(frame));
+      take(frame, key, status);
+      onCounted(static_cast<const driver::RawFrameView&>(frame));
     }
     return status;
   }
@@ -170,13 +172,14 @@ class IdentifierTable {
            frame.header.type == Rules::kBusErrorType;
   }
 
-  // Counts the frame into its entry, making the entry if there is room. False: frame skipped.
-  bool take(const driver::RawFrameView& frame, uint64_t key, int32_t& status) {
+  // Counts the frame into its entry, making the entry if there is room; a new identifier that
+  // finds none is left out of the table.
+  void take(const driver::RawFrameView& frame, uint64_t key, int32_t& status) {
     const uint32_t slot = index_.probe(key);
     uint32_t i = index_.entryAt(slot);
     const uint64_t timestamp = frame.header.timestamp;
     if (i == IdentifierIndex::kNoEntry) {
-      if (count_ >= capacity_) return false;
+      if (count_ >= capacity_) return;
       i = count_++;
       index_.set(slot, key, i);
       Entry& e = entries_[i];
@@ -191,7 +194,6 @@ class IdentifierTable {
       e.lastTimestamp = timestamp;
     }
     if constexpr (Rules::kCopiesPayload) storePayload(i, frame, status);
-    return true;
   }
 
   void storePayload(uint32_t i, const driver::RawFrameView& frame, int32_t& status) {

@@ -9,8 +9,8 @@ namespace nKV_DLL300 {
 
 inline constexpr uint32_t kLinStateId = 0x00130030;  // 8-byte state, the low 32 bits are used
 
-// A frame taken into the identifier table: data (0x40), bus error (0x41), no response (0x42);
-// other types count nowhere.
+// A frame that passed the identifier table's filters: data (0x40), bus error (0x41), no response
+// (0x42); other types count nowhere.
 void countFrame(LinBusStatistics& statistics, uint8_t type, bool inWindow);
 
 // The three window counts turned into frames per second over elapsedMs.

@@ -93,14 +93,14 @@ TEST(IdentifierTable, EchoesAndBusErrorsEnterOnlyWhenTheirSettingAllowsIt) {
   EXPECT_EQ(lin->entry(0).identifier, 0x13u);
 }
 
-TEST(IdentifierTable, FullTableIgnoresNewIdentifiersAndKeepsUpdatingKnownOnes) {
+TEST(IdentifierTable, FullTableListsNoNewIdentifierButCountsEveryFrame) {
   auto table = CanIdentifierTable::create(2);
   FrameBatch batch;
   batch.can(1, 0x1, {}).can(2, 0x2, {}).can(3, 0x3, {}).can(4, 0x1, {});
-  int taken = 0;
+  int counted = 0;
   table->updateIdentifierTable(batch.data(), batch.size(), kDefaults,
-                               [&](const driver::RawFrameView&) { ++taken; });
-  EXPECT_EQ(taken, 3);
+                               [&](const driver::RawFrameView&) { ++counted; });
+  EXPECT_EQ(counted, 4);
   ASSERT_EQ(table->idCount(), 2);
   EXPECT_EQ(table->entry(0).count, 2u);
   EXPECT_EQ(table->entry(1).identifier, 0x2u);

@@ -254,13 +254,31 @@ TEST_F(CanSessionTest, WrongBaudRateSeesOnlyBusErrorFrames) {
   EXPECT_EQ(message->records.size(), 1u);
 }
 
-TEST_F(CanSessionTest, TableCapacityBoundsTheIdentifiersShown) {
-  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) { s.dataLogIdsMax = 2; });
+TEST_F(CanSessionTest, FullTableListsNoMoreIdentifiersButItsStatisticsCountTheWholeBus) {
+  auto tableOf = [](uint32_t capacity) {
+    return [capacity](SessionSettings& s) {
+      s.dataLogIdsMax = capacity;
+      s.baudRate = 500000;  // for the bus load
+    };
+  };
+  kvhost::HostClient full = StartedHost(0, "CAN1", tableOf(2));  // the body bus has 4 identifiers
+  kvhost::HostClient roomy = StartedHost(1, "CAN2", tableOf(1000));
   auto message = RecordsWhere(
-      host, [](const RecordMessage& m) { return !m.records.empty() && m.records[0].count > 50; });
+      full, [](const RecordMessage& m) { return !m.records.empty() && m.records[0].count > 50; });
   ASSERT_TRUE(message.has_value());
   EXPECT_EQ(message->records.size(), 2u);
   EXPECT_EQ(message->header.idCount, 2u);
+
+  // A full window of each: whichever two identifiers were left out, the rates are the bus's.
+  ASSERT_TRUE(NextStatistics(full).has_value());
+  ASSERT_TRUE(NextStatistics(roomy).has_value());
+  auto a = NextStatistics(full);
+  auto b = NextStatistics(roomy);
+  ASSERT_TRUE(a.has_value() && b.has_value());
+  EXPECT_NEAR(a->standardFramesPerSecond, b->standardFramesPerSecond, 12.0);
+  EXPECT_NEAR(a->extendedFramesPerSecond, b->extendedFramesPerSecond, 2.0);
+  EXPECT_NEAR(a->remoteFramesPerSecond, b->remoteFramesPerSecond, 1.0);
+  EXPECT_NEAR(a->busLoad, b->busLoad, 30.0);
 }
 
 }  // namespace
