@@ -83,9 +83,12 @@ class CTableSession : public CBusSystem {
 
   // reportBusState, step 1: a new statistics period starts now.
   void beginReport() { stateWatch.Restart(); }
-  // The statistics block as one message of type 6.
+  // The statistics block as one message of type 6, if the host can take it now; otherwise it is
+  // skipped, and the next report carries the state of then.
   void sendStatistics() {
-    SendReply(*connection, &statistics, this, kMessageStatistics, sizeof(Statistics));
+    SnapshotSend snapshot(*connection);
+    if (!snapshot.hasRoom()) return snapshot.skip();
+    snapshot.send(&statistics, this, kMessageStatistics, sizeof(Statistics));
   }
   // reportBusState, last step: true when the counting window has passed, and a new one begins.
   // The new window starts where the report's own period started (beginReport), so each report
@@ -116,6 +119,7 @@ class CTableSession : public CBusSystem {
     stateWatch.Restart();
     windowWatch.Restart();
     burst_ = 0;
+    recordsOwed_ = false;
     if (connection->settings.logFileEnabled.load() != 0) OpenLogFile(sessionLog, logHeaderLine());
     prepareLoop();
     return true;
@@ -130,7 +134,11 @@ class CTableSession : public CBusSystem {
     if (status != 0 && status != kReadNothingYet) recordStatus(status);
     if (bytes > 0 && status >= 0) takeBatch(bytes);
     SessionSettings& settings = connection->settings;
-    if (dataWatch.ElapsedMilliseconds() > settings.txTimeData.load()) sendIdentifierRecords();
+    if (dataWatch.ElapsedMilliseconds() > settings.txTimeData.load()) {
+      sendIdentifierRecords();
+    } else if (recordsOwed_) {
+      sendOwedRecords();
+    }
     const uint32_t statisticPeriod = settings.txTimeStatistic.load();
     if (statisticPeriod > 0) {
       const uint64_t elapsed = stateWatch.ElapsedMilliseconds();
@@ -166,22 +174,48 @@ class CTableSession : public CBusSystem {
     idCount.store(table->idCount());
   }
 
+  // The periodic identifier records. A host that cannot take them now misses this report; it
+  // gets the table as soon as it has room again (sendOwedRecords), not a period later.
   void sendIdentifierRecords() {
-    const bool reset = resetRequested.exchange(false);
-    if (reset) {
+    if (resetRequested.exchange(false)) {
       statistics = Statistics{};
+      table->reset();
       idCount.store(0);
     }
     dataWatch.Restart();
+    recordsOwed_ = false;
+    if (table->idCount() == 0) return;  // nothing is sent while the table is empty
+    SnapshotSend snapshot(*connection);
+    if (!snapshot.hasRoom()) {
+      snapshot.skip();
+      recordsOwed_ = true;
+      return;
+    }
+    sendTable(snapshot);
+  }
+
+  // A report was skipped: the current table goes out once the host has room, and the period
+  // starts again from there.
+  void sendOwedRecords() {
+    SnapshotSend snapshot(*connection);
+    if (!snapshot.hasRoom()) return;  // the next period counts another skipped report
+    dataWatch.Restart();
+    recordsOwed_ = false;
+    sendTable(snapshot);
+  }
+
+  // Every message of the table, in one snapshot: all of them go out or none.
+  void sendTable(SnapshotSend& snapshot) {
     (void)table->sendIdentifierRecords(
-        reset, [&](uint8_t type, const void* payload, uint32_t length, uint16_t records) {
-          SendRecords(*connection, payload, this, type, length, records);
-          return 0;  // a failed send is in lastTcpError; the other messages still go out
+        false, [&](uint8_t type, const void* payload, uint32_t length, uint16_t records) {
+          snapshot.send(payload, this, type, length, records);
+          return 0;  // a broken link is in lastTcpError; the loop reads on
         });
   }
 
   const ReadPacing pacing_;
-  uint32_t burst_ = 0;  // nearly full reads in a row
+  uint32_t burst_ = 0;        // nearly full reads in a row
+  bool recordsOwed_ = false;  // the last identifier report was skipped for want of room
 };
 
 }  // namespace nKV_DLL300

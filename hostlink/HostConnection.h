@@ -31,8 +31,8 @@ struct ConnectionSetup {
 
 // Created by the service thread at accept and destroyed when its slot is freed, after its
 // session has been stopped and deleted. The service thread runs every handler; the session's
-// poll thread and log writers also send through it (SendReply serialises them) and read its
-// settings.
+// poll thread and log writers also send through it (with SnapshotSend, which never waits for
+// the host; every message stays whole) and read its settings.
 class HostConnection {
  public:
   HostConnection(platform::net::SocketHandle socket, ConnectionSetup setup);
@@ -68,9 +68,14 @@ class HostConnection {
   friend class LinkAccess;
 
   std::mutex sendMutex_;
-  platform::net::SocketHandle socket_;      // changed under sendMutex_ by the service thread only
-  uint32_t sequenceNumber_ = 0;             // guarded by sendMutex_
-  std::vector<uint8_t> pendingOutput_;      // guarded by sendMutex_: unsent rest of one message
+  platform::net::SocketHandle socket_;  // changed under sendMutex_ by the service thread only
+  // Taken once per message, sent or not: under sendMutex_ for a message that goes out (so the
+  // stream's numbers rise), by anyone for a snapshot that is dropped (SnapshotSend::skip).
+  std::atomic<uint32_t> sequenceNumber_{0};
+  std::vector<uint8_t> pendingOutput_;  // guarded by sendMutex_: unsent rest of messages
+  // Set by the holder of sendMutex_ while it waits for the host to make room; a snapshot then
+  // gives up instead of waiting for the lock.
+  std::atomic<bool> waitingForRoom_{false};
   std::atomic<bool> outputPending_{false};  // written under sendMutex_: !pendingOutput_.empty()
   std::atomic<bool> linkBroken_{false};
 };

@@ -15,7 +15,9 @@ namespace {
 void SendLogError(const LinkedSession& session, int32_t code) {
   char text[sizeof kLogErrorFormat + 16];
   std::snprintf(text, sizeof text, kLogErrorFormat, code);
-  SendText(*session.connection, text, &session, kMessageErrorText);
+  // Logging never waits for a host: a report the host cannot take now is dropped (the code stays
+  // in lastStatus, which every later header carries).
+  SendTextWithoutWaiting(*session.connection, text, &session, kMessageErrorText);
 }
 
 }  // namespace

@@ -60,7 +60,8 @@ class SessionLog {
   // Writes the buffered rest and closes the stream; false when the rest could not be written.
   bool closeStream();
 
-  // Stores `code` in the session's lastStatus and sends it to the host at once.
+  // Stores `code` in the session's lastStatus and sends it to the host at once, if the host can
+  // take it now (SendTextWithoutWaiting).
   void fail(int32_t code);
 
   // The writers format each text line here, then write it whole.
@@ -85,7 +86,8 @@ class SessionLog {
 };
 
 // Sends the session's lastStatus as "<ERROR:LOG FILE: %d> \n" (message type 5), with the session
-// attached so that the header carries lastStatus too. Any thread of the session.
+// attached so that the header carries lastStatus too, without waiting for the host. Any thread
+// of the session.
 void ReportLogError(const LinkedSession& session);
 
 }  // namespace nKV_DLL300
