@@ -4,6 +4,7 @@
 #include <cstdio>
 #include <string_view>
 #include <thread>
+#include <utility>
 
 namespace kvmon {
 
@@ -75,7 +76,7 @@ bool ControllerLink::SendAfterPause(const std::string& text, const MessageSink& 
   if (unansweredSince_) {
     const auto until = *unansweredSince_ + kCommandPause;
     while (Clock::now() < until) {
-      if (auto message = client_.Receive(
+      if (auto message = ReceiveCounted(
               std::chrono::duration_cast<std::chrono::milliseconds>(until - Clock::now()))) {
         if (sink) sink(*message);
       } else if (client_.closed()) {
@@ -96,7 +97,7 @@ std::optional<kvhost::HostMessage> ControllerLink::Request(const std::string& co
   if (!SendAfterPause(command, sink)) return std::nullopt;
   const auto deadline = Clock::now() + kReplyDeadline;
   while (Clock::now() < deadline) {
-    auto message = client_.Receive(kReceiveSlice);
+    auto message = ReceiveCounted(kReceiveSlice);
     if (message && IsReply(*message, reply)) return message;
     if (message && sink) sink(*message);
     if (client_.closed()) {
@@ -118,7 +119,19 @@ bool ControllerLink::HeartbeatIfDue() {
 }
 
 std::optional<kvhost::HostMessage> ControllerLink::Receive(std::chrono::milliseconds timeout) {
-  return client_.Receive(timeout);
+  return ReceiveCounted(timeout);
 }
+
+std::optional<kvhost::HostMessage> ControllerLink::ReceiveCounted(
+    std::chrono::milliseconds timeout) {
+  auto message = client_.Receive(timeout);
+  if (message) {
+    skipped_ += message->header.sequence - nextSequence_;  // modulo 2^32, like the numbers
+    nextSequence_ = message->header.sequence + 1;
+  }
+  return message;
+}
+
+uint32_t ControllerLink::TakeSkipped() { return std::exchange(skipped_, 0); }
 
 }  // namespace kvmon

@@ -49,15 +49,24 @@ class ControllerLink {
   bool closed() const { return client_.closed(); }
   const std::string& error() const { return error_; }
 
+  // Messages the controller numbered but this host never received since the last call: the
+  // controller drops a report that a slow host cannot take at once, and its sequence number
+  // shows the gap.
+  uint32_t TakeSkipped();
+
  private:
   explicit ControllerLink(kvhost::HostClient client);
   bool SendAfterPause(const std::string& text, const MessageSink& sink);
+  // Every receive of the link: counts the gaps in the sequence numbers.
+  std::optional<kvhost::HostMessage> ReceiveCounted(std::chrono::milliseconds timeout);
 
   kvhost::HostClient client_;
   std::chrono::steady_clock::time_point lastHeartbeat_;
   // A command without a reply was sent at this time; the next one waits kCommandPause after it.
   std::optional<std::chrono::steady_clock::time_point> unansweredSince_;
   std::string error_;
+  uint32_t nextSequence_ = 1;  // the greeting was 0
+  uint32_t skipped_ = 0;
 };
 
 }  // namespace kvmon

@@ -8,7 +8,9 @@
 #include <chrono>
 #include <csignal>
 #include <cstdio>
+#include <cstdlib>
 #include <memory>
+#include <string_view>
 
 #include "host/kvmon/ControllerLink.h"
 #include "host/kvmon/HardwareListing.h"
@@ -24,6 +26,7 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 constexpr std::chrono::milliseconds kLoopSlice{200};
+constexpr uint32_t kDefaultTableCapacity = 1000;  // the controller's SET_PROP_DATA_LOG_IDS_MAX
 
 void OnStopSignal(int) { gStopRequested = 1; }
 
@@ -83,15 +86,42 @@ int ListHardware(ControllerLink& link, const Options& options) {
   return std::fflush(stdout) == 0 ? 0 : 1;
 }
 
+// The capacity of the identifier table that kvmon asked for (--table-size), else the
+// controller's default.
+uint32_t AskedTableCapacity(const Options& options) {
+  constexpr std::string_view kTableSize = "SET_PROP_DATA_LOG_IDS_MAX=";
+  uint32_t capacity = kDefaultTableCapacity;
+  for (const auto& property : options.properties) {
+    if (property.starts_with(kTableSize))
+      capacity =
+          static_cast<uint32_t>(std::strtoul(property.c_str() + kTableSize.size(), nullptr, 10));
+  }
+  return capacity;
+}
+
+std::string TableFullText(uint32_t capacity) {
+  return "identifier table full (" + std::to_string(capacity) +
+         "): new identifiers are counted in the statistics but not listed; --table-size raises "
+         "it (up to 65535)";
+}
+
 // Hands the session's messages to the display and keeps what the loop needs to know.
 class SessionMessages {
  public:
-  SessionMessages(Display& display, std::string interfaceName)
-      : display_(display), interfaceName_(std::move(interfaceName)) {}
+  SessionMessages(Display& display, std::string interfaceName, uint32_t tableCapacity)
+      : display_(display),
+        interfaceName_(std::move(interfaceName)),
+        tableCapacity_(tableCapacity) {}
 
   void operator()(const kvhost::HostMessage& message) {
-    if (const auto bus = BusOfRecordType(message.header.type)) return ShowRecords(*bus, message);
-    if (message.header.type == kvhost::kStatistics) return ShowStatistics(message);
+    if (const auto bus = BusOfRecordType(message.header.type)) {
+      WatchTableSize(message.header);
+      return ShowRecords(*bus, message);
+    }
+    if (message.header.type == kvhost::kStatistics) {
+      WatchTableSize(message.header);
+      return ShowStatistics(message);
+    }
     if (message.header.type == kvhost::kErrorText) {
       lastError_ = ExplainError(message.text(), interfaceName_);
       display_.ShowNotice(lastError_);
@@ -123,8 +153,18 @@ class SessionMessages {
     }
   }
 
+  // Statistics carry the table's size; a record message reaches the capacity only when it holds
+  // the whole table. Said once each time the table fills.
+  void WatchTableSize(const kvhost::MessageHeaderView& header) {
+    const bool full = header.idCount >= tableCapacity_;
+    if (full && !tableFull_) display_.ShowNotice(TableFullText(tableCapacity_));
+    tableFull_ = full;
+  }
+
   Display& display_;
   std::string interfaceName_;
+  const uint32_t tableCapacity_;
+  bool tableFull_ = false;
   uint64_t recordMessages_ = 0;
   std::string lastError_;
 };
@@ -146,6 +186,8 @@ bool Monitor(ControllerLink& link, const Options& options, Display& display,
       return false;
     }
     if (auto message = link.Receive(kLoopSlice)) messages(*message);
+    if (const uint32_t skipped = link.TakeSkipped())
+      display.ShowNotice("host too slow: " + std::to_string(skipped) + " reports skipped");
     if (link.closed()) {
       error = messages.lastError().empty() ? "the controller ended the connection"
                                            : messages.lastError();
@@ -157,7 +199,7 @@ bool Monitor(ControllerLink& link, const Options& options, Display& display,
 
 int RunSession(ControllerLink& link, const Options& options) {
   auto display = MakeDisplay(options);
-  SessionMessages messages(*display, options.interfaceName);
+  SessionMessages messages(*display, options.interfaceName, AskedTableCapacity(options));
   const MessageSink sink = [&messages](const kvhost::HostMessage& message) { messages(message); };
   std::string error;
   const bool ok = SetUpSession(link, options, sink, error) &&

@@ -233,6 +233,33 @@ TEST_F(KvmonSession, RefusalsOfTheControllerAreToldInPlainWords) {
   }
 }
 
+// A controller whose sockets hold little, so that a host that stops reading is soon too slow.
+class KvmonSlowHost : public KvmonSession {
+ protected:
+  nKV_DLL300::ServiceOptions Options() override {
+    nKV_DLL300::ServiceOptions options = KvmonSession::Options();
+    options.socketSendBufferBytes = 4096;
+    return options;
+  }
+};
+
+// kvmon stops reading while nobody reads its output; the controller then skips its reports.
+TEST_F(KvmonSlowHost, SkippedReportsAndAFullTableAreToldOnStandardError) {
+  auto kvmon = Start({"--json", "--data-period", "1", "--table-size", "2", "CAN1"});
+  EXPECT_TRUE(WaitUntil([&] { return service().statistics().snapshotsSkipped.load() > 0; }));
+  EXPECT_TRUE(kvmon.ReadUntil(
+      [&](const std::string&) {
+        return kvmon.err().find("kvmon: host too slow: ") != std::string::npos;
+      },
+      kToolDeadline))
+      << kvmon.err();
+  EXPECT_NE(kvmon.err().find("kvmon: identifier table full (2): new identifiers are counted"),
+            std::string::npos)
+      << kvmon.err();
+  Interrupt(kvmon);
+  ExpectNoHostLeft();
+}
+
 uint16_t PortWithoutListener() {
   const int probe = socket(AF_INET, SOCK_STREAM, 0);
   sockaddr_in address{};
