@@ -18,9 +18,11 @@ constexpr int32_t kSmallBuffer = 4096;  // socket buffers that a stalled host fi
 constexpr uint32_t kIdentifiers = 100;  // 0x100 upwards, each every 10 ms: 10 000 frames/s
 constexpr uint32_t kFirstIdentifier = 0x100;
 constexpr uint64_t kPeriodUnits = 10 * 10000;  // 10 ms in 100 ns units
-// Far fewer frames than a second of traffic: a poll thread that waited a second for the host would
-// lose frames.
-constexpr uint32_t kQueueFrames = 8192;
+// 1.6 s of traffic: room for a poll thread that a busy machine holds back now and then. A poll
+// thread that waited up to a second per send for the host would read one 100 000-byte batch
+// (about 4 000 frames) per second or less, and fill it within the stall below.
+constexpr uint32_t kQueueFrames = 16384;
+constexpr uint32_t kStallQueues = 3;  // the stall lasts this many queues' worth of frames
 
 // A 1 Mbit/s bus with a counter byte per identifier, seen by CAN1 and CAN2.
 std::string BusyBus() {
@@ -115,13 +117,14 @@ TEST_F(SlowHostTest, StalledHostCostsTheLogNoFrameAndCatchesUpWithACurrentTable)
   ASSERT_NO_FATAL_FAILURE(NextTable(steady, steadyView));
 
   // The slow host stops reading but keeps its heartbeat, until its reports are being skipped and
-  // the bus has carried twice a receive queue's worth of frames since.
+  // the bus has carried kStallQueues receive queues' worth of frames since.
   const ServiceStatistics& statistics = service().statistics();
   std::optional<uint64_t> framesAtFirstSkip;
   uint32_t steadyTables = 0;
   auto heartbeat = std::chrono::steady_clock::now();
   const auto deadline = heartbeat + kConditionDeadline;
-  while (!framesAtFirstSkip || steadyView.frames < *framesAtFirstSkip + 2 * kQueueFrames) {
+  while (!framesAtFirstSkip ||
+         steadyView.frames < *framesAtFirstSkip + kStallQueues * kQueueFrames) {
     ASSERT_LT(std::chrono::steady_clock::now(), deadline)
         << "the slow host's reports never skipped";
     if (std::chrono::steady_clock::now() - heartbeat > 1s) {
@@ -162,7 +165,7 @@ TEST_F(SlowHostTest, StalledHostCostsTheLogNoFrameAndCatchesUpWithACurrentTable)
     previous[id] = frame;
   }
   EXPECT_EQ(previous.size(), kIdentifiers);
-  EXPECT_GT(frames, 2 * kQueueFrames);
+  EXPECT_GT(frames, kStallQueues * kQueueFrames);
 }
 
 }  // namespace
