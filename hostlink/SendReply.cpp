@@ -47,10 +47,12 @@ MessageHeaderFields HeaderFor(HostConnection& connection, const LinkedSession* s
   return fields;
 }
 
-// Waits up to `ms` for room towards the host. A wait that may last is announced, so that a
-// snapshot does not wait for the send lock meanwhile. Send lock held.
+// Waits up to `ms` for room towards the host. Only a wait for a socket that has no room now is
+// announced, so that a snapshot does not wait for the send lock meanwhile (and one that finds a
+// quick sender holding the lock still goes out). Send lock held.
 int32_t WaitForRoom(HostConnection& connection, net::SocketHandle socket, uint32_t ms) {
-  if (ms == 0) return net::WaitWritable(socket, 0);
+  const int32_t now = net::WaitWritable(socket, 0);
+  if (now != 0 || ms == 0) return now;
   std::atomic<bool>& waiting = LinkAccess::waitingForRoom(connection);
   waiting.store(true);
   const int32_t ready = net::WaitWritable(socket, ms);
