@@ -20,6 +20,8 @@ namespace {
 
 constexpr uint16_t kPort = 13999;
 constexpr auto kHeartbeatEvery = 2s;
+// A heartbeat has no reply; the pause keeps the next command out of its TCP segment.
+constexpr auto kPauseAfterHeartbeat = 300ms;
 constexpr auto kControllerStart = 60s;  // the module listens 10 s after it is loaded
 const char* const kDrive = "/tmp/kv-drive";
 
@@ -84,11 +86,16 @@ Host::Host() : heartbeatDue_(std::chrono::steady_clock::now() + kHeartbeatEvery)
   WaitFor([&] { return greeted_; });
 }
 
+void Host::heartbeatIfDue() {
+  const auto now = std::chrono::steady_clock::now();
+  if (now < heartbeatDue_) return;
+  (void)client_.Send("CMD_HEARTBEAT");
+  heartbeatSent_ = now;
+  heartbeatDue_ = now + kHeartbeatEvery;
+}
+
 std::optional<kvhost::HostMessage> Host::receive(std::chrono::milliseconds timeout) {
-  if (std::chrono::steady_clock::now() >= heartbeatDue_) {
-    (void)client_.Send("CMD_HEARTBEAT");
-    heartbeatDue_ = std::chrono::steady_clock::now() + kHeartbeatEvery;
-  }
+  if (!replyAwaited_) heartbeatIfDue();
   auto message = client_.Receive(std::min<std::chrono::milliseconds>(timeout, 500ms));
   if (message) take(*message);
   return message;
@@ -107,15 +114,23 @@ void Host::take(const kvhost::HostMessage& m) {
 }
 
 std::string Host::Command(const std::string& text) {
+  heartbeatIfDue();
+  std::this_thread::sleep_until(heartbeatSent_ + kPauseAfterHeartbeat);
   if (!client_.Send(text)) return "(not sent)";
+  replyAwaited_ = true;
   const auto end = std::chrono::steady_clock::now() + kDeadline;
+  std::string reply = "(no reply)";
   while (std::chrono::steady_clock::now() < end && !client_.closed()) {
     auto m = receive(kDeadline);
     const bool text =
         m && (m->header.type == kvhost::kText || m->header.type == kvhost::kErrorText);
-    if (text && m->text() != "<Connected to Kelvane>\n") return m->text();
+    if (text && m->text() != "<Connected to Kelvane>\n") {
+      reply = m->text();
+      break;
+    }
   }
-  return "(no reply)";
+  replyAwaited_ = false;
+  return reply;
 }
 
 std::string Host::Start(const std::vector<std::string>& properties) {

@@ -47,7 +47,9 @@ class UmlController {
 };
 
 // One host connection. Records and statistics are collected while replies are awaited; every
-// exchange also sends the heartbeat now and then, so long tests keep the connection.
+// exchange also sends the heartbeat now and then, so long tests keep the connection. The
+// controller reads each TCP segment as one command, so the heartbeat never goes out while a reply
+// is awaited, and a command waits a pause after it.
 class Host {
  public:
   Host();
@@ -70,10 +72,13 @@ class Host {
  private:
   std::optional<kvhost::HostMessage> receive(std::chrono::milliseconds timeout);
   void take(const kvhost::HostMessage& message);
+  void heartbeatIfDue();
 
   kvhost::HostClient client_;
   bool greeted_ = false;
+  bool replyAwaited_ = false;
   std::chrono::steady_clock::time_point heartbeatDue_;
+  std::chrono::steady_clock::time_point heartbeatSent_;
 };
 
 // A program in the background (candump), ended with SIGINT by Stop() or the destructor.
