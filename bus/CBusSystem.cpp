@@ -11,7 +11,9 @@ namespace {
 constexpr uint64_t kPollPeriodMs = 10;
 }  // namespace
 
-CBusSystem::CBusSystem(HostConnection* owner, driver::BusKind kind) : LinkedSession(owner, kind) {}
+CBusSystem::CBusSystem(HostConnection* owner, driver::BusKind kind) : LinkedSession(owner, kind) {
+  createdWatch.Restart();
+}
 
 CBusSystem::~CBusSystem() { endForDestruction(); }
 

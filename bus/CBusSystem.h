@@ -91,6 +91,9 @@ class CBusSystem : public LinkedSession {
   // Closes the log file of the session, if one is open.
   void closeLogFile() { CloseLogFile(sessionLog); }
 
+  // Restarted at construction (service thread, before the poll thread starts); read by the poll
+  // thread when its loop begins.
+  Stopwatch createdWatch;
   // Poll thread only, from the start of each poll loop.
   Stopwatch dataWatch;    // period of the identifier-record messages
   Stopwatch stateWatch;   // period of the bus-statistics messages

@@ -41,7 +41,8 @@ class CTableSession : public CBusSystem {
   // Slot 5: the poll loop. Allocates the table (none: -22 in lastStatus, and the loop does not
   // run; the next pollOnce tries again, with the capacity then set), reads without blocking while
   // pollActive, and sends the records and statistics at their periods. Returns the last read's
-  // status (0 if none was made).
+  // status (0 if none was made, and 0 for "nothing to read yet", which is no failure: a paused
+  // session must not report it as its last error).
   int32_t pollLoop() override {
     if (!beginLoop()) {
       recordStatus(kStatusTableNotAllocated);
@@ -50,7 +51,7 @@ class CTableSession : public CBusSystem {
     int32_t status = 0;
     while (pollActive.load()) status = pollPass();
     table.reset();
-    return status;
+    return status == kReadNothingYet ? 0 : status;
   }
 
  protected:
@@ -116,8 +117,11 @@ class CTableSession : public CBusSystem {
     idCount.store(0);
     statistics = Statistics{};
     dataWatch.Restart();
-    stateWatch.Restart();
-    windowWatch.Restart();
+    // The driver buffers frames from the moment the session was created; the first statistics
+    // period and counting window start then too, so that the frames of a slow start (a J1939
+    // address claim) are not counted as one second's worth.
+    stateWatch = createdWatch;
+    windowWatch = createdWatch;
     burst_ = 0;
     recordsOwed_ = false;
     if (connection->settings.logFileEnabled.load() != 0) OpenLogFile(sessionLog, logHeaderLine());
@@ -133,6 +137,7 @@ class CTableSession : public CBusSystem {
     pace(bytes);
     if (status != 0 && status != kReadNothingYet) recordStatus(status);
     if (bytes > 0 && status >= 0) takeBatch(bytes);
+    sessionLog.flushIfDue();
     SessionSettings& settings = connection->settings;
     if (dataWatch.ElapsedMilliseconds() > settings.txTimeData.load()) {
       sendIdentifierRecords();

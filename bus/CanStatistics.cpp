@@ -24,8 +24,6 @@ void countFrame(CanBusStatistics& s, CanFrameTimes& times, const driver::RawFram
     case kTypeBusError:
       Count(s.errorFrames, s.errorFramesPerSecond, inWindow);
       return;
-    case driver::kFrameJ1939:
-      return;
     default:
       break;
   }
@@ -35,7 +33,9 @@ void countFrame(CanBusStatistics& s, CanFrameTimes& times, const driver::RawFram
   } else {
     Count(s.standardFrames, s.standardFramesPerSecond, inWindow);
   }
-  times.addFrame(extended, frame.length);
+  // A J1939 message may be reassembled from several bus frames (up to 2047 bytes), so its length
+  // tells no frame duration: it counts as a frame of its identifier but adds no bus time.
+  if (frame.type != driver::kFrameJ1939) times.addFrame(extended, frame.length);
 }
 
 void PrepareToSend(CanBusStatistics& s, const CanFrameTimes& times, uint64_t elapsedMs) {

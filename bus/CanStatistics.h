@@ -13,9 +13,10 @@ inline constexpr uint32_t kCanExtendedIdentifier = 0x20000000;
 inline constexpr uint32_t kCanStateId = 0x00130010;  // 4-byte state word
 
 // A frame that passed the identifier table's filters: remote (0x01) and bus-error (0x02) frames
-// count as such, J1939 frames (0xC0) count nowhere, every other type is a standard or extended data
-// frame whose durations go into the bus time. inWindow: the statistics window is still open, so the
-// frame also counts into the PerSecond field.
+// count as such, every other type is a standard or extended data frame by its identifier. Data
+// frames add their durations to the bus time, except J1939 messages (0xC0), whose length may span
+// several frames. inWindow: the statistics window is still open, so the frame also counts into the
+// PerSecond field.
 void countFrame(CanBusStatistics& statistics, CanFrameTimes& times,
                 const driver::RawFrameHeader& frame, bool inWindow);
 

@@ -31,11 +31,22 @@ bool SessionLog::openStream(const std::string& runtimePath, const char* mode) {
   logFile_ = platform::OpenFile(runtimePath, mode);
   if (logFile_ == nullptr) return false;
   std::setvbuf(logFile_, streamBuffer_, _IOFBF, kStreamBufferSize);
+  unflushed_ = false;
+  flushWatch_.Restart();
   return true;
 }
 
 bool SessionLog::write(const void* bytes, size_t size) {
+  unflushed_ = true;
   return std::fwrite(bytes, 1, size, logFile_) == size;
+}
+
+void SessionLog::flushIfDue() {
+  if (!unflushed_ || logFile_ == nullptr) return;
+  if (flushWatch_.ElapsedMilliseconds() < kFlushPeriodMs) return;
+  unflushed_ = false;
+  flushWatch_.Restart();
+  if (std::fflush(logFile_) != 0) fail(kLogWriteIncomplete);
 }
 
 bool SessionLog::closeStream() {

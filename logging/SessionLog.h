@@ -9,6 +9,7 @@
 
 #include "logging/BinaryLogFormat.h"
 #include "logging/TextLogFormat.h"
+#include "timing/Stopwatch.h"
 
 namespace nKV_DLL300 {
 
@@ -59,6 +60,12 @@ class SessionLog {
   bool write(const void* bytes, size_t size);
   // Writes the buffered rest and closes the stream; false when the rest could not be written.
   bool closeStream();
+  // Hands what the stream buffers to the file when something was written since the last flush and
+  // that flush is kFlushPeriodMs old, so that a frame reaches the file within about a second
+  // while the session runs (a host may follow the log). A failed flush stores -21 and reports it.
+  // Called by the poll loop after every pass; costs a flag test when nothing was written.
+  void flushIfDue();
+  static constexpr uint64_t kFlushPeriodMs = 1000;
 
   // Stores `code` in the session's lastStatus and sends it to the host at once, if the host can
   // take it now (SendTextWithoutWaiting).
@@ -75,6 +82,8 @@ class SessionLog {
  private:
   LinkedSession& session_;
   std::FILE* logFile_ = nullptr;
+  bool unflushed_ = false;  // bytes were written since the last flush
+  Stopwatch flushWatch_;    // since the last flush (or the open)
   int32_t openedType_ = -1;
   BinaryRecordLayout canLayout_ = BinaryRecordLayout::kFixed24;
   uint8_t linChecksum_ = 0;

@@ -1,5 +1,5 @@
 // Handlers that store a number and acknowledge it; CAN I/O mode and application protocol first
-// check the number and keep the old value when it is out of range, yet acknowledge it anyway.
+// check the number and keep the old value when it is out of range, then acknowledge the kept one.
 #include "protocol/PlainProperties.h"
 
 #include <atomic>
@@ -76,7 +76,8 @@ void NodeName(HostConnection& connection, std::string_view value) {
 }
 
 // Stores `read` only when it is 0 to `highest`; otherwise the range error comes first. The
-// acknowledgement always follows with the value read.
+// acknowledgement always follows, with the value the setting now holds: a refused value is kept
+// out, so acknowledging it would tell the host a mode that the session will not use.
 void StoreValidOrRefuse(HostConnection& connection, std::atomic<uint32_t>& field, int32_t read,
                         int32_t highest, std::string_view rangeError, std::string_view pattern) {
   if (read >= 0 && read <= highest) {
@@ -84,7 +85,7 @@ void StoreValidOrRefuse(HostConnection& connection, std::atomic<uint32_t>& field
   } else {
     SendPropertyReply(connection, std::string(rangeError), kWith);
   }
-  Acknowledge(connection, pattern, std::to_string(read), kWith);
+  Acknowledge(connection, pattern, std::to_string(static_cast<int32_t>(field.load())), kWith);
 }
 
 void CanIoMode(HostConnection& connection, std::string_view value) {

@@ -49,7 +49,7 @@ TEST(CanStatistics, EachFrameTypeCountsIntoItsOwnFields) {
   }
 }
 
-TEST(CanStatistics, OnlyDataFramesAddBusTimeAndJ1939CountsNowhere) {
+TEST(CanStatistics, OnlyDataFramesAddBusTimeAndJ1939CountsAsExtendedWithout) {
   CanBusStatistics s{};
   CanFrameTimes times;
   times.buildFrameTimeTables({0, 0, 500000, 0});
@@ -57,7 +57,8 @@ TEST(CanStatistics, OnlyDataFramesAddBusTimeAndJ1939CountsNowhere) {
   countFrame(s, times, CanFrame(0, 0x02, 0), kInWindow);
   countFrame(s, times, CanFrame(0x38FEF100, driver::kFrameJ1939, 8), kInWindow);
   EXPECT_EQ(times.busTimeMax(), 0.0);
-  EXPECT_EQ(s.extendedFrames + s.standardFrames, 0u);
+  EXPECT_EQ(s.extendedFrames, 1u);
+  EXPECT_EQ(s.standardFrames, 0u);
   countFrame(s, times, CanFrame(0x20000100, 0x00, 8), kInWindow);
   EXPECT_DOUBLE_EQ(times.busTimeMax(), 308.0);
 }

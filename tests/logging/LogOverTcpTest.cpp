@@ -279,6 +279,42 @@ TEST_F(LogOverTcpTest, EchoFramesAreLoggedOnlyWithTheSetting) {
   }
 }
 
+// One frame every 100 ms fills the stream's buffer only after minutes: the records must reach the
+// file while the session still runs, text and binary alike.
+TEST_F(LogOverTcpTest, LogsReachTheFileWhileTheSessionRuns) {
+  std::string error;
+  ASSERT_TRUE(tarvix::LoadConfiguration(
+      R"({"buses":[{"name":"slow","traffic":[{"id":"0x123","length":1,"periodMs":100}]}],
+      "devices":[{"name":"SIM-CAN","interfaces":[{"name":"CAN1","bus":"slow"}]}]})",
+      drive_.path().string(), &error))
+      << error;
+  for (const char* type : {"0", "1"}) {
+    std::vector<std::string> errors;
+    kvhost::HostClient host =
+        Configured({"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE_NAME=follow",
+                    std::string("SET_PROP_LOGFILE_TYPE=") + type, "SET_PROP_LOGFILE=1"},
+                   errors);
+    const bool text = type[0] == '0';
+    const std::string name = text ? "follow.txt" : "follow.zfl";
+    const size_t twoFrames =
+        text ? std::string_view(kCanTextLogHeader).size() + 1 + 2 * kTimeCellLength : 12 + 2 * 24;
+    // Heartbeats keep the session alive: the end of a silent connection would close the file.
+    auto lastBeat = std::chrono::steady_clock::now();
+    EXPECT_TRUE(WaitUntil([&] {
+      if (std::chrono::steady_clock::now() - lastBeat > 2s) {
+        EXPECT_TRUE(host.Send("CMD_HEARTBEAT"));
+        lastBeat = std::chrono::steady_clock::now();
+      }
+      std::error_code ignored;
+      return std::filesystem::file_size(LogPath(name), ignored) >= twoFrames;
+    }))
+        << name;
+    Terminate(host);
+    EXPECT_TRUE(errors.empty());
+  }
+  tarvix::ResetToDefaults();
+}
+
 // A file that cannot be opened is reported once with the session; a name that would leave the
 // service directory is refused when set, and the session logs to the default name.
 TEST_F(LogOverTcpTest, BadFilesAndNamesAreReported) {

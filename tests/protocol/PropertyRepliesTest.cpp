@@ -144,16 +144,16 @@ std::vector<Row> StoreOnlyValidRows() {
   return {
       One("CanIoModeTwoIsStored", io + "2", {"<ACK: SET_PROP_SESSION_IOMODE 2> \n"},
           STORED(canIoMode == 2)),
-      {"CanIoModeOutOfRangeGivesTheErrorThenTheAcknowledgementAndKeepsTheOldMode",
+      {"CanIoModeOutOfRangeGivesTheErrorThenAcknowledgesTheKeptMode",
        {{io + "1", {"<ACK: SET_PROP_SESSION_IOMODE 1> \n"}},
-        {io + "5", {ioError, "<ACK: SET_PROP_SESSION_IOMODE 5> \n"}}},
+        {io + "5", {ioError, "<ACK: SET_PROP_SESSION_IOMODE 1> \n"}}},
        STORED(canIoMode == 1)},
       One("CanIoModeMinusOneIsOutOfRange", io + "-1",
-          {ioError, "<ACK: SET_PROP_SESSION_IOMODE -1> \n"}, STORED(canIoMode == 0)),
+          {ioError, "<ACK: SET_PROP_SESSION_IOMODE 0> \n"}, STORED(canIoMode == 0)),
       One("ApplicationProtocolOneIsStored", app + "1",
           {"<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 1> \n"}, STORED(applicationProtocol == 1)),
-      One("ApplicationProtocolTwoGivesTheErrorThenTheAcknowledgement", app + "2",
-          {appError, "<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 2> \n"},
+      One("ApplicationProtocolTwoGivesTheErrorThenAcknowledgesTheKeptValue", app + "2",
+          {appError, "<ACK: SET_PROP_SESSION_APPLICATION_PROTOCOL 0> \n"},
           STORED(applicationProtocol == 0)),
   };
 }
