@@ -32,6 +32,10 @@ class BinaryRecordReader {
   size_t offset_ = 0;
 };
 
+// True when `type` is a frame type of `bus` (CAN 0x00 0x01 0x02 0x10 0x18 0xC0, LIN 0x40 to 0x42,
+// FlexRay 0x20 0x21).
+bool IsFrameTypeOfBus(uint8_t type, driver::BusKind bus);
+
 // Checks that every record of `size` bytes parses in `layout`, ends exactly at the end, has a type
 // of `bus` and a payload the layout can hold, with time stamps that never go back. Used to tell
 // apart the two CAN layouts of a log whose writer settings are unknown.
@@ -39,7 +43,8 @@ bool RecordsAreConsistent(const uint8_t* records, size_t size, BinaryRecordLayou
                           driver::BusKind bus);
 
 // The CAN layout that reads `size` bytes of records consistently: fixed 24-byte records when they
-// do, else the variable layout.
+// do, else the variable layout. A cut last record (a log copied while it was written) does not
+// count against a layout when its head, if there is one, looks like the others.
 BinaryRecordLayout DetectCanRecordLayout(const uint8_t* records, size_t size);
 
 }  // namespace nKV_DLL300

@@ -6,9 +6,10 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
-#include <fstream>
-#include <iterator>
+#include <exception>
+#include <filesystem>
 
+#include "host/kvlog/BusCheck.h"
 #include "host/kvlog/CandumpFormat.h"
 #include "host/voradump/VoraDumpTool.h"
 #include "host/voradump/VoraReader.h"
@@ -48,15 +49,33 @@ const char kUsage[] =
     "      --lin-checksum      LIN text: write the checksum column\n"
     "      --can-records MODE  CAN record sizes: auto (default), fixed (24 bytes, classic\n"
     "                          sessions) or variable (FD and J1939 sessions)\n"
-    "  -h, --help              show this text\n";
+    "  -h, --help              show this text\n"
+    "\n"
+    "Exit status: 0 converted (a cut last record, as in a copy taken while the controller wrote\n"
+    "the log, is reported and skipped), 1 a file problem (unreadable, not a log, records of\n"
+    "another bus than --bus), 2 a usage error.\n";
 
 constexpr uint8_t kHdf5Signature[8] = {0x89, 'H', 'D', 'F', '\r', '\n', 0x1A, '\n'};
 
-bool ReadWholeFile(const std::string& path, std::vector<uint8_t>& out) {
-  std::ifstream in(path, std::ios::binary);
-  if (!in) return false;
-  out.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-  return !in.bad();
+// Reads the whole file at `path`; false with `error` in plain words.
+bool ReadWholeFile(const std::string& path, std::vector<uint8_t>& out, std::string& error) {
+  std::error_code ignored;
+  if (std::filesystem::is_directory(path, ignored)) {
+    error = "it is a directory; give a log file in it";
+    return false;
+  }
+  std::FILE* in = std::fopen(path.c_str(), "rb");
+  if (in == nullptr) {
+    error = std::strerror(errno);
+    return false;
+  }
+  uint8_t chunk[65536];
+  size_t n = 0;
+  while ((n = std::fread(chunk, 1, sizeof chunk, in)) > 0) out.insert(out.end(), chunk, chunk + n);
+  const bool failed = std::ferror(in) != 0;
+  if (failed) error = std::strerror(errno);
+  std::fclose(in);
+  return !failed;
 }
 
 bool IsMeasurementFile(const std::string& path, const std::vector<uint8_t>& head) {
@@ -66,7 +85,9 @@ bool IsMeasurementFile(const std::string& path, const std::vector<uint8_t>& head
 
 void ReportTrailing(uint64_t bytes, std::FILE* err) {
   if (bytes > 0) {
-    std::fprintf(err, "kvlog: %llu bytes after the last whole frame record ignored\n",
+    std::fprintf(err,
+                 "kvlog: the log ends in a cut record (a copy taken while the controller wrote "
+                 "it?): %llu bytes after the last whole frame record skipped\n",
                  static_cast<unsigned long long>(bytes));
   }
 }
@@ -152,8 +173,6 @@ int ConvertMeasurementFile(const std::string& path, const ConvertOptions& option
   return status;
 }
 
-bool ParseOptions(int argc, char** argv, ConvertOptions& options, std::string& output, bool& help);
-
 }  // namespace
 
 CandumpResult WriteCandumpLog(const uint8_t* records, size_t size, BinaryRecordLayout layout,
@@ -190,8 +209,15 @@ int ConvertBinaryLog(const std::vector<uint8_t>& file, const ConvertOptions& opt
                  "kvlog: a binary log does not name its bus: give --bus can, lin or flexray\n");
     return 2;
   }
-  return ConvertRecords(file.data() + kBinaryLogFileHeaderSize,
-                        file.size() - kBinaryLogFileHeaderSize, *options.bus, options, out, err);
+  const uint8_t* records = file.data() + kBinaryLogFileHeaderSize;
+  const size_t size = file.size() - kBinaryLogFileHeaderSize;
+  const std::string foreign =
+      ExplainForeignRecords(records, size, *options.bus, options.decode.canRecords);
+  if (!foreign.empty()) {
+    std::fprintf(err, "kvlog: %s\n", foreign.c_str());
+    return 1;
+  }
+  return ConvertRecords(records, size, *options.bus, options, out, err);
 }
 
 int ConvertFile(const std::string& path, const std::vector<uint8_t>& file,
@@ -202,8 +228,81 @@ int ConvertFile(const std::string& path, const std::vector<uint8_t>& file,
 
 namespace {
 
-bool ParseOptions(int argc, char** argv, ConvertOptions& options, std::string& output, bool& help) {
-  enum { kCandump = 256, kLinChecksum, kCanRecords };
+// Options without a short form.
+enum LongOnly : int { kCandump = 256, kLinChecksum, kCanRecords };
+
+// A usage error in plain words, and where to read more; always false.
+bool Usage(std::FILE* err, const std::string& words) {
+  std::fprintf(err, "kvlog: %s\nTry 'kvlog --help'.\n", words.c_str());
+  return false;
+}
+
+bool SetFormat(ConvertOptions& options, const char* text, std::FILE* err) {
+  if (std::strcmp(text, "text") == 0) {
+    options.format = OutputFormat::kText;
+  } else if (std::strcmp(text, "candump") == 0) {
+    options.format = OutputFormat::kCandump;
+  } else {
+    return Usage(err, std::string("--format: '") + text + "' is not text or candump");
+  }
+  return true;
+}
+
+bool SetCanRecords(ConvertOptions& options, const char* text, std::FILE* err) {
+  if (std::strcmp(text, "auto") == 0) {
+    options.decode.canRecords = voradump::CanRecords::kAuto;
+  } else if (std::strcmp(text, "fixed") == 0) {
+    options.decode.canRecords = voradump::CanRecords::kFixed;
+  } else if (std::strcmp(text, "variable") == 0) {
+    options.decode.canRecords = voradump::CanRecords::kVariable;
+  } else {
+    return Usage(err, std::string("--can-records: '") + text + "' is not auto, fixed or variable");
+  }
+  return true;
+}
+
+// One option; false on a bad value (reported on `err`).
+bool ApplyOption(int opt, const char* arg, ConvertOptions& options, std::string& output,
+                 std::FILE* err) {
+  switch (opt) {
+    case 'b':
+      options.bus = voradump::BusOfName(arg);
+      return options.bus
+                 ? true
+                 : Usage(err, std::string("--bus: '") + arg + "' is not can, lin or flexray");
+    case 'f':
+      return SetFormat(options, arg, err);
+    case kCandump:
+      options.format = OutputFormat::kCandump;
+      return true;
+    case 'i':
+      options.interfaceName = arg;
+      return IsValidInterfaceName(options.interfaceName)
+                 ? true
+                 : Usage(err, "--interface needs 1 to 32 printable characters without blanks");
+    case 'o':
+      output = arg;
+      return true;
+    case 'g':
+      options.group = arg;
+      options.hasGroup = true;
+      return true;
+    case 'c':
+      options.channel = arg;
+      options.hasChannel = true;
+      return true;
+    case kLinChecksum:
+      options.decode.linChecksum = 1;
+      return true;
+    case kCanRecords:
+      return SetCanRecords(options, arg, err);
+    default:
+      return Usage(err, "unknown option or missing value");
+  }
+}
+
+bool ParseOptions(int argc, char** argv, ConvertOptions& options, std::string& output, bool& help,
+                  std::FILE* err) {
   static const option kOptions[] = {{"bus", required_argument, nullptr, 'b'},
                                     {"format", required_argument, nullptr, 'f'},
                                     {"candump", no_argument, nullptr, kCandump},
@@ -216,79 +315,27 @@ bool ParseOptions(int argc, char** argv, ConvertOptions& options, std::string& o
                                     {"help", no_argument, nullptr, 'h'},
                                     {nullptr, 0, nullptr, 0}};
   optind = 1;
+  opterr = 0;
   for (int opt; (opt = getopt_long(argc, argv, "b:f:i:o:g:c:h", kOptions, nullptr)) != -1;) {
-    switch (opt) {
-      case 'b':
-        options.bus = voradump::BusOfName(optarg);
-        if (!options.bus) return false;
-        break;
-      case 'f':
-        if (std::strcmp(optarg, "text") == 0)
-          options.format = OutputFormat::kText;
-        else if (std::strcmp(optarg, "candump") == 0)
-          options.format = OutputFormat::kCandump;
-        else
-          return false;
-        break;
-      case kCandump:
-        options.format = OutputFormat::kCandump;
-        break;
-      case 'i':
-        options.interfaceName = optarg;
-        if (!IsValidInterfaceName(options.interfaceName)) return false;
-        break;
-      case 'o':
-        output = optarg;
-        break;
-      case 'g':
-        options.group = optarg;
-        options.hasGroup = true;
-        break;
-      case 'c':
-        options.channel = optarg;
-        options.hasChannel = true;
-        break;
-      case kLinChecksum:
-        options.decode.linChecksum = 1;
-        break;
-      case kCanRecords:
-        if (std::strcmp(optarg, "auto") == 0)
-          options.decode.canRecords = voradump::CanRecords::kAuto;
-        else if (std::strcmp(optarg, "fixed") == 0)
-          options.decode.canRecords = voradump::CanRecords::kFixed;
-        else if (std::strcmp(optarg, "variable") == 0)
-          options.decode.canRecords = voradump::CanRecords::kVariable;
-        else
-          return false;
-        break;
-      case 'h':
-        help = true;
-        return true;
-      default:
-        return false;
+    if (opt == 'h') {
+      help = true;
+      return true;
     }
+    if (opt == '?' || opt == ':') {
+      return Usage(err, std::string("unknown option or missing value: ") + argv[optind - 1]);
+    }
+    if (!ApplyOption(opt, optarg, options, output, err)) return false;
   }
-  return optind + 1 == argc;
+  if (optind == argc) return Usage(err, "name the log file to convert");
+  if (optind + 1 < argc) return Usage(err, "one log file at a time");
+  return true;
 }
 
-}  // namespace
-
-int RunKvlog(int argc, char** argv) {
-  ConvertOptions options;
-  std::string output;
-  bool help = false;
-  if (!ParseOptions(argc, argv, options, output, help)) {
-    std::fputs(kUsage, stderr);
-    return 2;
-  }
-  if (help) {
-    std::fputs(kUsage, stdout);
-    return 0;
-  }
-  const std::string input = argv[optind];
+int Convert(const std::string& input, const ConvertOptions& options, const std::string& output) {
   std::vector<uint8_t> file;
-  if (!ReadWholeFile(input, file)) {
-    std::fprintf(stderr, "kvlog: cannot read %s: %s\n", input.c_str(), std::strerror(errno));
+  std::string error;
+  if (!ReadWholeFile(input, file, error)) {
+    std::fprintf(stderr, "kvlog: cannot read %s: %s\n", input.c_str(), error.c_str());
     return 1;
   }
   std::FILE* out = output.empty() ? stdout : std::fopen(output.c_str(), "w");
@@ -299,6 +346,25 @@ int RunKvlog(int argc, char** argv) {
   int status = ConvertFile(input, file, options, out, stderr);
   if ((out == stdout ? std::fflush(out) : std::fclose(out)) != 0) status = 1;
   return status;
+}
+
+}  // namespace
+
+int RunKvlog(int argc, char** argv) {
+  ConvertOptions options;
+  std::string output;
+  bool help = false;
+  if (!ParseOptions(argc, argv, options, output, help, stderr)) return 2;
+  if (help) {
+    std::fputs(kUsage, stdout);
+    return 0;
+  }
+  try {
+    return Convert(argv[optind], options, output);
+  } catch (const std::exception& failure) {  // out of memory for a huge file, for example
+    std::fprintf(stderr, "kvlog: %s: %s\n", argv[optind], failure.what());
+    return 1;
+  }
 }
 
 }  // namespace kvlog

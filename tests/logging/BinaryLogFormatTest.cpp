@@ -93,16 +93,20 @@ TEST(BinaryRecordReader, FixedRecordBoundsAnOverlongPayloadToItsEightBytes) {
   EXPECT_EQ(v.payloadLength, 8u);
 }
 
-TEST(BinaryRecordReader, DetectsTheCanLayoutFromRecordsWithEmptyPayloads) {
+// A log copied while the controller wrote it ends in part of a record, anywhere in it.
+TEST(BinaryRecordReader, DetectsTheCanLayoutFromRecordsWithEmptyPayloadsAlsoWhenCut) {
   const auto frames = {
       FrameSpec{.timestamp = 1, .identifier = 0x321, .type = 0x01},
       FrameSpec{.timestamp = 2, .identifier = 0x100, .payload = {1, 2, 3, 4, 5, 6, 7, 8}},
-      FrameSpec{.timestamp = 3, .identifier = 0, .type = 0x02}};
-  const auto fixed = Records(frames, BinaryRecordLayout::kFixed24);
-  const auto variable = Records(frames, BinaryRecordLayout::kCanVariable);
-  EXPECT_EQ(DetectCanRecordLayout(fixed.data(), fixed.size()), BinaryRecordLayout::kFixed24);
-  EXPECT_EQ(DetectCanRecordLayout(variable.data(), variable.size()),
-            BinaryRecordLayout::kCanVariable);
+      FrameSpec{.timestamp = 3, .identifier = 0, .type = 0x02},
+      FrameSpec{.timestamp = 4, .identifier = 0x1A0, .payload = {0xAA, 0xBB, 0xCC}}};
+  for (const auto layout : {BinaryRecordLayout::kFixed24, BinaryRecordLayout::kCanVariable}) {
+    const auto records = Records(frames, layout);
+    for (const size_t cut : {0, 1, 5, 15, 16, 17, 23}) {
+      EXPECT_EQ(DetectCanRecordLayout(records.data(), records.size() - cut), layout)
+          << "layout " << static_cast<int>(layout) << ", cut " << cut;
+    }
+  }
 }
 
 }  // namespace
