@@ -307,8 +307,7 @@ TEST_F(LogOverTcpTest, LogsReachTheFileWhileTheSessionRuns) {
       }
       std::error_code ignored;
       return std::filesystem::file_size(LogPath(name), ignored) >= twoFrames;
-    }))
-        << name;
+    })) << name;
     Terminate(host);
     EXPECT_TRUE(errors.empty());
   }
