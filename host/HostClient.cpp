@@ -33,6 +33,7 @@ HostClient& HostClient::operator=(HostClient&& other) noexcept {
     Close();
     socket_ = other.socket_;
     closed_ = other.closed_;
+    unresolved_ = other.unresolved_;
     buffer_ = std::move(other.buffer_);
     error_ = std::move(other.error_);
     other.socket_ = -1;
@@ -48,33 +49,46 @@ bool HostClient::ConnectWithReceiveBuffer(const std::string& host, uint16_t port
   return ConnectSocket(host, port, bytes);
 }
 
+int HostClient::ConnectAddress(const void* addrinfoEntry, int32_t receiveBuffer) {
+  const auto* address = static_cast<const addrinfo*>(addrinfoEntry);
+  const int fd = socket(address->ai_family, SOCK_STREAM | SOCK_CLOEXEC, 0);
+  if (fd < 0) {
+    error_ = std::strerror(errno);
+    return -1;
+  }
+  int on = 1;
+  setsockopt(fd, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
+  if (receiveBuffer > 0)
+    setsockopt(fd, SOL_SOCKET, SO_RCVBUF, &receiveBuffer, sizeof receiveBuffer);
+  if (connect(fd, address->ai_addr, address->ai_addrlen) != 0) {
+    error_ = std::strerror(errno);
+    close(fd);
+    return -1;
+  }
+  return fd;
+}
+
 bool HostClient::ConnectSocket(const std::string& host, uint16_t port, int32_t receiveBuffer) {
   Close();
   closed_ = false;
+  unresolved_ = false;
   buffer_.clear();
-  sockaddr_in address{};
-  address.sin_family = AF_INET;
-  address.sin_port = htons(port);
-  std::string numeric = host == "localhost" ? "127.0.0.1" : host;
-  if (inet_pton(AF_INET, numeric.c_str(), &address.sin_addr) != 1) {
-    error_ = "not an IPv4 address: " + host;
+  addrinfo hints{};
+  hints.ai_family = AF_UNSPEC;
+  hints.ai_socktype = SOCK_STREAM;
+  addrinfo* addresses = nullptr;
+  const int resolved = getaddrinfo(host.c_str(), std::to_string(port).c_str(), &hints, &addresses);
+  if (resolved != 0) {
+    unresolved_ = true;
+    error_ = "cannot resolve '" + host + "': " + gai_strerror(resolved);
     return false;
   }
-  socket_ = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-  if (socket_ < 0) {
-    error_ = std::strerror(errno);
-    return false;
+  for (const addrinfo* address = addresses; address != nullptr && socket_ < 0;
+       address = address->ai_next) {
+    socket_ = ConnectAddress(address, receiveBuffer);
   }
-  int on = 1;
-  setsockopt(socket_, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
-  if (receiveBuffer > 0)
-    setsockopt(socket_, SOL_SOCKET, SO_RCVBUF, &receiveBuffer, sizeof receiveBuffer);
-  if (connect(socket_, reinterpret_cast<sockaddr*>(&address), sizeof address) != 0) {
-    error_ = std::strerror(errno);
-    Close();
-    return false;
-  }
-  return true;
+  freeaddrinfo(addresses);
+  return socket_ >= 0;
 }
 
 bool HostClient::Send(std::string_view text) {

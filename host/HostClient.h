@@ -22,11 +22,16 @@ class HostClient {
   HostClient(const HostClient&) = delete;
   HostClient& operator=(const HostClient&) = delete;
 
-  // Connects to `host`:`port` (numeric IPv4 address or "localhost"); false with error() set.
+  // Connects to `host`:`port`: a host name, an IPv4 or an IPv6 address, each address the name
+  // resolves to tried in turn. False with error() set; unresolved() tells a name that does not
+  // resolve from a controller that does not answer.
   bool Connect(const std::string& host, uint16_t port);
   // Like Connect, with the receive buffer limited before connecting (a slow reader's window).
   bool ConnectWithReceiveBuffer(const std::string& host, uint16_t port, int32_t bytes);
   bool connected() const { return socket_ >= 0; }
+  bool unresolved() const { return unresolved_; }
+  // The socket, for waiting on several clients at once; -1 when not connected.
+  int fd() const { return socket_; }
 
   // Sends `text` in one send call, exactly as given (no terminator added).
   bool Send(std::string_view text);
@@ -51,11 +56,14 @@ class HostClient {
 
  private:
   bool ConnectSocket(const std::string& host, uint16_t port, int32_t receiveBuffer);
+  // One address of the name: a connected socket, or -1 with error_ set.
+  int ConnectAddress(const void* addrinfoEntry, int32_t receiveBuffer);
   // Reads what is there within the time left; false on time-out or end of stream.
   bool FillBuffer(std::chrono::steady_clock::time_point deadline);
 
   int socket_ = -1;
   bool closed_ = false;
+  bool unresolved_ = false;
   std::vector<uint8_t> buffer_;  // received bytes not yet returned as messages
   std::string error_;
 };

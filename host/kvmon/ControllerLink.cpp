@@ -6,6 +6,8 @@
 #include <thread>
 #include <utility>
 
+#include "host/kvmon/ControllerAddress.h"
+
 namespace kvmon {
 
 volatile std::sig_atomic_t gStopRequested = 0;
@@ -36,7 +38,7 @@ bool IsReply(const kvhost::HostMessage& message, ControllerLink::Reply reply) {
 }
 
 std::string Where(const std::string& host, uint16_t port) {
-  return host + ":" + std::to_string(port);
+  return ControllerAddress{host, port}.Text();
 }
 
 }  // namespace
@@ -51,7 +53,11 @@ std::optional<ControllerLink> ControllerLink::Open(const std::string& host, uint
                                            std::chrono::duration<double>(waitSeconds));
   bool announced = false;
   while (!client.Connect(host, port)) {
-    if (Clock::now() >= deadline || gStopRequested || client.error().rfind("not an IPv4", 0) == 0) {
+    if (client.unresolved()) {
+      error = client.error() + " (the controller's host name, from -c or KVMON_CONTROLLER)";
+      return std::nullopt;
+    }
+    if (Clock::now() >= deadline || gStopRequested) {
       error = "cannot connect to the controller at " + Where(host, port) + ": " + client.error() +
               " (is it running? it listens 10 s after its start)";
       return std::nullopt;

@@ -28,6 +28,7 @@ class ControllerLink {
 
   // Connects, retrying until `waitSeconds` passed (the controller listens 10 s after its start),
   // and receives the greeting. nullopt with `error` in plain words.
+  // A name that does not resolve is reported at once, not blamed on the controller.
   static std::optional<ControllerLink> Open(const std::string& host, uint16_t port,
                                             double waitSeconds, std::string& error);
 
@@ -46,7 +47,11 @@ class ControllerLink {
   // The next message within `timeout`; nullopt on time-out or when the connection ended.
   std::optional<kvhost::HostMessage> Receive(std::chrono::milliseconds timeout);
 
+  // Waits up to `timeout` for the controller to close the connection, discarding what it sends.
+  bool WaitForClose(std::chrono::milliseconds timeout) { return client_.WaitForClose(timeout); }
+
   bool closed() const { return client_.closed(); }
+  int fd() const { return client_.fd(); }
   const std::string& error() const { return error_; }
 
   // Messages the controller numbered but this host never received since the last call: the

@@ -1,29 +1,27 @@
-// What kvmon shows a session on: the live terminal table or one of the line formats.
+// What kvmon shows its sessions on: the live terminal table or one of the line formats.
 #pragma once
 
 #include <string>
-#include <vector>
 
-#include "host/RecordDecoder.h"
-#include "host/kvmon/BusReport.h"
-#include "host/kvmon/FrameNames.h"
+#include "host/kvmon/SourceModel.h"
 
 namespace kvmon {
 
-// Called from the tool's one thread, one message at a time.
+// Called from the tool's one thread, one message at a time, after the message went into the
+// source's model.
 class Display {
  public:
   virtual ~Display() = default;
-  // One identifier-record message of `messageBytes` payload bytes: the controller's whole table,
-  // or part of it when the table needs more than one message.
-  virtual void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
-                           size_t messageBytes) = 0;
-  virtual void ShowStatistics(const BusReport& report) = 0;
+  // An identifier-record message of `source`: its rows start at `firstRow` of the source's table
+  // (the controller's whole table, or part of it when the table needs more than one message).
+  virtual void ShowRecords(const SourceModel& source, size_t firstRow) = 0;
+  // `source` received a statistics report.
+  virtual void ShowStatistics(const SourceModel& source) = 0;
   // Something the controller said during the session, in plain words.
   virtual void ShowNotice(const std::string& words) = 0;
-  // The session is over; leave the terminal as it was.
+  // The sessions are over; leave the terminal as it was.
   virtual void Close() {}
-  // True once the output could not be written (a closed pipe): the tool ends the session.
+  // True once the output could not be written (a closed pipe): the tool ends the sessions.
   virtual bool failed() const = 0;
 };
 

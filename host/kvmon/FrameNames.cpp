@@ -97,7 +97,7 @@ char ChannelName(const kvhost::IdentifierRecord& record) { return record.channel
 std::string IdentifierText(Bus bus, const kvhost::IdentifierRecord& record) {
   char text[24];
   if (bus == Bus::kFlexRay) {
-    std::snprintf(text, sizeof text, "%u%c", record.identifier, ChannelName(record));
+    std::snprintf(text, sizeof text, "slot %u %c", record.identifier, ChannelName(record));
   } else if (IsExtended(bus, record)) {
     std::snprintf(text, sizeof text, "%08X", PlainIdentifier(bus, record));
   } else {

@@ -27,8 +27,8 @@ const char* BusName(Bus bus);
 // "data", "remote", "error", "fd", "fd-brs", "j1939", "no-resp", "null", or "0xNN".
 std::string FrameTypeName(Bus bus, uint8_t type);
 
-// CAN: "100" or "18FEF100" (extended, without the marker bit); LIN: "10"; FlexRay: "1A" (slot
-// and channel).
+// CAN: "100" or "18FEF100" (hex; extended without the marker bit); LIN: "10" (hex); FlexRay:
+// "slot 40 B" (the slot in decimal and the channel), which no one reads as hex.
 std::string IdentifierText(Bus bus, const kvhost::IdentifierRecord& record);
 // The identifier without the extended marker bit.
 uint32_t PlainIdentifier(Bus bus, const kvhost::IdentifierRecord& record);

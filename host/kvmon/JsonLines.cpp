@@ -12,13 +12,28 @@ std::string Field(const char* name, const std::string& jsonValue) {
 
 std::string Bool(bool value) { return value ? "true" : "false"; }
 
-std::string BusFields(Bus bus, const kvhost::IdentifierRecord& r) {
-  if (bus == Bus::kLin)
-    return Field("checksum", std::to_string(r.checksum)) + Field("flag", std::to_string(r.flag));
-  if (bus != Bus::kFlexRay) return "";
+std::string Number(const std::optional<double>& value, const char* format = "%.4f") {
+  if (!value) return "null";
+  char text[48];
+  std::snprintf(text, sizeof text, format, *value);
+  return text;
+}
+
+std::string BusFields(const SourceModel& source, const kvhost::IdentifierRecord& r) {
+  if (source.bus() == Bus::kLin) {
+    return Field("checksum", source.checksums() ? std::to_string(r.checksum & 0xFF) : "null") +
+           Field("flag", std::to_string(r.flag));
+  }
+  if (source.bus() != Bus::kFlexRay) return "";
   return Field("channel", JsonString(std::string(1, ChannelName(r)))) +
          Field("cycle", std::to_string(r.cycle)) + Field("startup", Bool(r.startup)) +
          Field("sync", Bool(r.sync)) + Field("preamble", Bool(r.preamble));
+}
+
+std::string TimingFields(const Timing& t) {
+  return Field("mean_period_ms", Number(t.meanMs)) + Field("jitter_ms", Number(t.jitterMs)) +
+         Field("min_gap_ms", Number(t.minGapMs)) + Field("max_gap_ms", Number(t.maxGapMs)) +
+         Field("overdue", Bool(t.overdue));
 }
 
 std::string Counts(const BusReport& report, bool perSecond) {
@@ -31,11 +46,7 @@ std::string Counts(const BusReport& report, bool perSecond) {
   return object + "}";
 }
 
-std::string Percent(uint32_t hundredths) {
-  char text[24];
-  std::snprintf(text, sizeof text, "%.2f", hundredths / 100.0);
-  return text;
-}
+std::string Percent(uint32_t hundredths) { return Number(hundredths / 100.0, "%.2f"); }
 
 }  // namespace
 
@@ -56,31 +67,30 @@ std::string JsonString(const std::string& text) {
   return out + "\"";
 }
 
-std::string JsonLines::RecordObject(const std::string& interfaceName, Bus bus,
-                                    const kvhost::IdentifierRecord& r) {
-  std::string object = "{\"kind\":\"record\"" + Field("interface", JsonString(interfaceName)) +
-                       Field("bus", JsonString(BusName(bus))) +
-                       Field("id", std::to_string(PlainIdentifier(bus, r))) +
-                       Field("extended", Bool(IsExtended(bus, r))) +
-                       Field("type", JsonString(FrameTypeName(bus, r.type))) +
-                       Field("type_code", std::to_string(r.type)) +
-                       Field("length", std::to_string(r.payloadLength)) +
-                       Field("data", JsonString(HexBytes(r.payload, ""))) +
-                       Field("count", std::to_string(r.count));
-  if (const auto period = PeriodMs(r)) {
-    char text[40];
-    std::snprintf(text, sizeof text, "%.4f", *period);
-    object += Field("period_ms", text);
-  } else {
-    object += Field("period_ms", "null");
-  }
-  object += Field("timestamp", std::to_string(r.lastTimestamp)) +
-            Field("echo", Bool((r.echo & 0x80) != 0));
-  return object + BusFields(bus, r) + "}";
+std::string JsonLines::RecordObject(const ShownRow& shown) {
+  const SourceModel& source = *shown.source;
+  const kvhost::IdentifierRecord& r = shown.row->record;
+  const Bus bus = source.bus();
+  std::string object =
+      "{\"kind\":\"record\"" + Field("timestamp", UnixTimeText(r.lastTimestamp)) +
+      Field("interface", JsonString(source.interfaceName())) +
+      Field("bus", JsonString(BusName(bus))) +
+      Field("id", std::to_string(PlainIdentifier(bus, r))) +
+      Field("id_text", JsonString(IdentifierText(bus, r))) +
+      Field("extended", Bool(IsExtended(bus, r))) +
+      Field("type", JsonString(FrameTypeName(bus, r.type))) +
+      Field("type_code", std::to_string(r.type)) +
+      Field("length", std::to_string(r.payloadLength)) +
+      Field("data", JsonString(HexBytes(r.payload, ""))) + Field("count", std::to_string(r.count)) +
+      Field("period_ms", Number(PeriodMs(r))) + Field("echo", Bool((r.echo & 0x80) != 0)) +
+      Field("raw_timestamp", std::to_string(r.lastTimestamp));
+  return object + BusFields(source, r) + TimingFields(shown.timing) + "}";
 }
 
-std::string JsonLines::StatisticsObject(const std::string& interfaceName, const BusReport& report) {
-  std::string object = "{\"kind\":\"statistics\"" + Field("interface", JsonString(interfaceName)) +
+std::string JsonLines::StatisticsObject(const std::string& interfaceName, uint64_t when,
+                                        const BusReport& report) {
+  std::string object = "{\"kind\":\"statistics\"" + Field("timestamp", UnixTimeText(when)) +
+                       Field("interface", JsonString(interfaceName)) +
                        Field("bus", JsonString(BusName(report.bus))) +
                        Field("per_second", Counts(report, true)) +
                        Field("totals", Counts(report, false));
@@ -92,13 +102,14 @@ std::string JsonLines::StatisticsObject(const std::string& interfaceName, const 
   return object + Field("fault", std::to_string(report.faultCode)) + "}";
 }
 
-void JsonLines::ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, size_t) {
-  for (const auto& record : records) Write(RecordObject(interfaceName_, bus, record));
+void JsonLines::ShowRecords(const SourceModel& source, size_t firstRow) {
+  for (const auto& shown : SelectMessageRows(source, firstRow, view_)) Write(RecordObject(shown));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 
-void JsonLines::ShowStatistics(const BusReport& report) {
-  Write(StatisticsObject(interfaceName_, report));
+void JsonLines::ShowStatistics(const SourceModel& source) {
+  if (!source.report()) return;
+  Write(StatisticsObject(source.interfaceName(), clock_(), *source.report()));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 

@@ -1,42 +1,48 @@
 // kvmon's machine format: one JSON object per line for each identifier record and statistics
-// report.
+// report; docs/kvmon.md describes every field.
 #pragma once
 
 #include <cstdio>
+#include <functional>
 #include <string>
 
 #include "host/kvmon/Display.h"
+#include "host/kvmon/RowSelection.h"
 
 namespace kvmon {
 
 // Objects such as
-//   {"kind":"record","interface":"CAN1","bus":"CAN","id":256,"extended":false,"type":"data",
-//    "type_code":0,"length":8,"data":"2A01020304050607","count":1234,"period_ms":10.0,
-//    "timestamp":133400000000000000,"echo":false}
-//   {"kind":"statistics","interface":"CAN1","bus":"CAN","per_second":{"standard":100,...},
-//    "totals":{...},"bus_load":12.34,"peak_load":13.0,"state":"error active","tec":0,...}
-// Notices go to `err` as plain text.
+//   {"kind":"record","timestamp":1700000000.123456,"interface":"CAN1","bus":"CAN","id":256,
+//    "id_text":"100","extended":false,"type":"data","type_code":0,"length":8,
+//    "data":"2A01020304050607","count":1234,"period_ms":10.0,"echo":false,
+//    "raw_timestamp":133400000000000000,"mean_period_ms":10.0,...,"overdue":false}
+//   {"kind":"statistics","timestamp":1700000000.200000,"interface":"CAN1","bus":"CAN",
+//    "per_second":{"standard":100,...},"totals":{...},"bus_load":12.34,...}
+// Times are Unix seconds (the raw 100 ns count since 1601 is an extra field). Rows the view
+// hides are left out. Notices go to `err` as plain text.
 class JsonLines : public Display {
  public:
-  JsonLines(std::string interfaceName, std::FILE* out, std::FILE* err)
-      : interfaceName_(std::move(interfaceName)), out_(out), err_(err) {}
+  JsonLines(ViewOptions view, std::FILE* out, std::FILE* err,
+            std::function<uint64_t()> clock = HostNow)
+      : view_(std::move(view)), out_(out), err_(err), clock_(std::move(clock)) {}
 
-  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
-                   size_t messageBytes) override;
-  void ShowStatistics(const BusReport& report) override;
+  void ShowRecords(const SourceModel& source, size_t firstRow) override;
+  void ShowStatistics(const SourceModel& source) override;
   void ShowNotice(const std::string& words) override;
   bool failed() const override { return failed_; }
 
-  static std::string RecordObject(const std::string& interfaceName, Bus bus,
-                                  const kvhost::IdentifierRecord& record);
-  static std::string StatisticsObject(const std::string& interfaceName, const BusReport& report);
+  static std::string RecordObject(const ShownRow& row);
+  // `when`: the receipt time in TimingHealth.h units.
+  static std::string StatisticsObject(const std::string& interfaceName, uint64_t when,
+                                      const BusReport& report);
 
  private:
   void Write(const std::string& line);
 
-  std::string interfaceName_;
+  ViewOptions view_;
   std::FILE* out_;
   std::FILE* err_;
+  std::function<uint64_t()> clock_;
   bool failed_ = false;
 };
 

@@ -1,16 +1,16 @@
-// kvmon's run: options, connection, hardware listing or session set-up, the monitoring loop with
-// its heartbeat, and the clean end on Ctrl-C.
+// kvmon's run: options, connections, hardware listing or the sessions with their display, and
+// the clean end on Ctrl-C or q.
 #include "host/kvmon/KvmonTool.h"
 
 #include <sys/ioctl.h>
 #include <unistd.h>
 
-#include <chrono>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <memory>
-#include <string_view>
+#include <optional>
+#include <utility>
 
 #include "host/kvmon/ControllerLink.h"
 #include "host/kvmon/HardwareListing.h"
@@ -18,23 +18,31 @@
 #include "host/kvmon/KvmonOptions.h"
 #include "host/kvmon/PlainLines.h"
 #include "host/kvmon/PlainWords.h"
-#include "host/kvmon/SessionSetup.h"
+#include "host/kvmon/SessionGroup.h"
 #include "host/kvmon/TerminalView.h"
 
 namespace kvmon {
 namespace {
 
-using Clock = std::chrono::steady_clock;
-constexpr std::chrono::milliseconds kLoopSlice{200};
-constexpr uint32_t kDefaultTableCapacity = 1000;  // the controller's SET_PROP_DATA_LOG_IDS_MAX
+constexpr char kShowCursor[] = "\x1b[?25h\n";
 
-void OnStopSignal(int) { gStopRequested = 1; }
+// The first Ctrl-C (or SIGTERM) ends the sessions in order; a second one ends kvmon at once,
+// leaving the terminal as it was.
+void OnStopSignal(int signal) {
+  if (!gStopRequested) {
+    gStopRequested = 1;
+    return;
+  }
+  TerminalKeys::RestoreFromSignal();
+  if (isatty(STDOUT_FILENO)) (void)!write(STDOUT_FILENO, kShowCursor, sizeof kShowCursor - 1);
+  std::signal(signal, SIG_DFL);
+  std::raise(signal);
+}
 
-// Ctrl-C and SIGTERM end the session; a second Ctrl-C ends kvmon at once (SA_RESETHAND).
 void InstallSignals() {
   struct sigaction action {};
   action.sa_handler = OnStopSignal;
-  action.sa_flags = SA_RESETHAND;  // no SA_RESTART: a waiting receive returns at once
+  action.sa_flags = 0;  // no SA_RESTART: a waiting receive returns at once
   sigemptyset(&action.sa_mask);
   sigaction(SIGINT, &action, nullptr);
   sigaction(SIGTERM, &action, nullptr);
@@ -48,28 +56,18 @@ TerminalSize QueryTerminalSize() {
   return TerminalSize{size.ws_col, size.ws_row};
 }
 
-std::string ControllerText(const Options& options) {
-  return options.controllerHost + ":" + std::to_string(options.controllerPort);
-}
-
-std::unique_ptr<Display> MakeDisplay(const Options& options) {
-  OutputMode mode = options.output;
-  if (mode == OutputMode::kAuto)
-    mode = isatty(STDOUT_FILENO) ? OutputMode::kTerminal : OutputMode::kPlain;
-  if (mode == OutputMode::kJson)
-    return std::make_unique<JsonLines>(options.interfaceName, stdout, stderr);
-  if (mode == OutputMode::kPlain)
-    return std::make_unique<PlainLines>(options.interfaceName, stdout, stderr);
-  const Bus bus = BusOfInterface(options.interfaceName).value_or(Bus::kCan);
-  return std::make_unique<TerminalView>(
-      bus, options.interfaceName + " on " + ControllerText(options), stdout, QueryTerminalSize);
-}
-
-int ListHardware(ControllerLink& link, const Options& options) {
+int ListHardware(const Options& options) {
+  std::string error;
+  auto link = ControllerLink::Open(options.controller.host, options.controller.port,
+                                   options.waitSeconds, error);
+  if (!link) {
+    std::fprintf(stderr, "kvmon: %s\n", error.c_str());
+    return 1;
+  }
   const auto reply =
-      link.Request("CMD_GET_HARDWARE_INFO", nullptr, ControllerLink::Reply::kHardwareTable);
+      link->Request("CMD_GET_HARDWARE_INFO", nullptr, ControllerLink::Reply::kHardwareTable);
   if (!reply) {
-    std::fprintf(stderr, "kvmon: %s\n", link.error().c_str());
+    std::fprintf(stderr, "kvmon: %s\n", link->error().c_str());
     return 1;
   }
   const auto entries = kvhost::DecodeHardwareTable(reply->payload);
@@ -81,140 +79,103 @@ int ListHardware(ControllerLink& link, const Options& options) {
   if (options.output == OutputMode::kJson) {
     PrintHardwareJson(*entries, stdout);
   } else {
-    PrintHardwareTable(*entries, reply->header, ControllerText(options), stdout);
+    PrintHardwareTable(*entries, reply->header, options.controller.Text(), stdout);
   }
   return std::fflush(stdout) == 0 ? 0 : 1;
 }
 
-// The capacity of the identifier table that kvmon asked for (--table-size), else the
-// controller's default.
-uint32_t AskedTableCapacity(const Options& options) {
-  constexpr std::string_view kTableSize = "SET_PROP_DATA_LOG_IDS_MAX=";
-  uint32_t capacity = kDefaultTableCapacity;
-  for (const auto& property : options.properties) {
-    if (property.starts_with(kTableSize))
-      capacity =
-          static_cast<uint32_t>(std::strtoul(property.c_str() + kTableSize.size(), nullptr, 10));
-  }
-  return capacity;
+std::string Title(const Options& options) {
+  std::string names;
+  for (const auto& name : options.interfaces) names += (names.empty() ? "" : ", ") + name;
+  return names + " on " + options.controller.Text();
 }
 
-std::string TableFullText(uint32_t capacity) {
-  return "identifier table full (" + std::to_string(capacity) +
-         "): new identifiers are counted in the statistics but not listed; --table-size raises "
-         "it (up to 65535)";
+std::string TransmitText(const TransmitFrame& frame) {
+  if (!frame.periodMs) return frame.text + " once";
+  char every[48];
+  std::snprintf(every, sizeof every, " every %g ms", *frame.periodMs);
+  return frame.text + every;
 }
 
-// Hands the session's messages to the display and keeps what the loop needs to know.
-class SessionMessages {
- public:
-  SessionMessages(Display& display, std::string interfaceName, uint32_t tableCapacity)
-      : display_(display),
-        interfaceName_(std::move(interfaceName)),
-        tableCapacity_(tableCapacity) {}
-
-  void operator()(const kvhost::HostMessage& message) {
-    if (const auto bus = BusOfRecordType(message.header.type)) {
-      WatchTableSize(message.header);
-      return ShowRecords(*bus, message);
-    }
-    if (message.header.type == kvhost::kStatistics) {
-      WatchTableSize(message.header);
-      return ShowStatistics(message);
-    }
-    if (message.header.type == kvhost::kErrorText) {
-      lastError_ = ExplainError(message.text(), interfaceName_);
-      display_.ShowNotice(lastError_);
-    }
-  }
-
-  uint64_t recordMessages() const { return recordMessages_; }
-  const std::string& lastError() const { return lastError_; }
-
- private:
-  void ShowRecords(Bus bus, const kvhost::HostMessage& message) {
-    ++recordMessages_;
-    const auto count = message.header.idCount;
-    const auto records = bus == Bus::kCan   ? kvhost::DecodeCanRecords(message.payload, count)
-                         : bus == Bus::kLin ? kvhost::DecodeLinRecords(message.payload, count)
-                                            : kvhost::DecodeFlexRayRecords(message.payload, count);
-    if (records) {
-      display_.ShowRecords(bus, *records, message.payload.size());
-    } else {
-      display_.ShowNotice("a malformed identifier report of the controller was skipped");
-    }
-  }
-
-  void ShowStatistics(const kvhost::HostMessage& message) {
-    if (const auto report = DecodeBusReport(message.payload)) {
-      display_.ShowStatistics(*report);
-    } else {
-      display_.ShowNotice("a malformed statistics report of the controller was skipped");
-    }
-  }
-
-  // Statistics carry the table's size; a record message reaches the capacity only when it holds
-  // the whole table. Said once each time the table fills.
-  void WatchTableSize(const kvhost::MessageHeaderView& header) {
-    const bool full = header.idCount >= tableCapacity_;
-    if (full && !tableFull_) display_.ShowNotice(TableFullText(tableCapacity_));
-    tableFull_ = full;
-  }
-
-  Display& display_;
-  std::string interfaceName_;
-  const uint32_t tableCapacity_;
-  bool tableFull_ = false;
-  uint64_t recordMessages_ = 0;
-  std::string lastError_;
-};
-
-bool LimitReached(const Options& options, const SessionMessages& messages,
-                  Clock::time_point start) {
-  if (options.recordMessages && messages.recordMessages() >= *options.recordMessages) return true;
-  return options.durationSeconds &&
-         Clock::now() - start >= std::chrono::duration<double>(*options.durationSeconds);
+// The row key of the --tx frame's echo: identifier with the extended bit, and the record type.
+std::pair<uint32_t, uint8_t> EchoKey(const TransmitFrame& frame) {
+  return {frame.identifier | (frame.extended ? 0x20000000u : 0u),
+          static_cast<uint8_t>(frame.remote ? 0x01 : frame.frameType)};
 }
 
-// Runs until Ctrl-C, a limit, a failed output or the end of the connection; false on the last.
-bool Monitor(ControllerLink& link, const Options& options, Display& display,
-             SessionMessages& messages, std::string& error) {
-  const auto start = Clock::now();
-  while (!gStopRequested && !LimitReached(options, messages, start) && !display.failed()) {
-    if (!link.HeartbeatIfDue()) {
-      error = link.error();
-      return false;
-    }
-    if (auto message = link.Receive(kLoopSlice)) messages(*message);
-    if (const uint32_t skipped = link.TakeSkipped())
-      display.ShowNotice("host too slow: " + std::to_string(skipped) + " reports skipped");
-    if (link.closed()) {
-      error = messages.lastError().empty() ? "the controller ended the connection"
-                                           : messages.lastError();
-      return false;
-    }
+// What a script should know at the end: quiet buses, and whether the --tx frame went out.
+void Summarise(const Options& options, const SessionGroup& group) {
+  for (const auto& name : options.interfaces) {
+    const SourceModel* model = group.ModelOf(name);
+    if (model != nullptr && !model->seenFrames())
+      std::fprintf(stderr, "kvmon: no frame was seen on %s\n", name.c_str());
   }
-  return true;
+  if (!options.transmit) return;
+  const auto [identifier, type] = EchoKey(*options.transmit);
+  const auto sent = group.ModelOf(options.interfaces[0])->EchoCount(identifier, type);
+  const std::string what = options.interfaces[0] + " " + TransmitText(*options.transmit);
+  if (sent) {
+    std::fprintf(stderr, "kvmon: %s: %u sent\n", what.c_str(), *sent);
+  } else {
+    std::fprintf(stderr,
+                 "kvmon: %s: no echo seen, it may not have gone out (a subordinate session needs "
+                 "--baud; a listen-only or J1939 session shows no echo)\n",
+                 what.c_str());
+  }
 }
 
-int RunSession(ControllerLink& link, const Options& options) {
-  auto display = MakeDisplay(options);
-  SessionMessages messages(*display, options.interfaceName, AskedTableCapacity(options));
-  const MessageSink sink = [&messages](const kvhost::HostMessage& message) { messages(message); };
+bool OnTerminal(const Options& options) {
+  return options.output == OutputMode::kTerminal ||
+         (options.output == OutputMode::kAuto && isatty(STDOUT_FILENO));
+}
+
+std::unique_ptr<TerminalView> MakeTable(const Options& options, const SessionGroup& group) {
+  auto table = std::make_unique<TerminalView>(group.Models(), Title(options), options.view, stdout,
+                                              QueryTerminalSize);
+  if (options.transmit) {
+    const auto [identifier, type] = EchoKey(*options.transmit);
+    table->SetTransmit({group.Models()[0], identifier, type, TransmitText(*options.transmit)});
+  }
+  return table;
+}
+
+int RunSessions(const Options& options) {
+  SessionGroup group(options);
   std::string error;
-  const bool ok = SetUpSession(link, options, sink, error) &&
-                  Monitor(link, options, *display, messages, error) &&
-                  TerminateSession(link, sink, error);
+  if (!group.Connect(error)) {
+    std::fprintf(stderr, "kvmon: %s\n", error.c_str());
+    return 1;
+  }
+  const bool live = options.output != OutputMode::kJson && OnTerminal(options);
+  std::optional<TerminalKeys> keys = live ? TerminalKeys::Open() : std::nullopt;
+  std::unique_ptr<Display> display;
+  TerminalView* table = nullptr;
+  if (options.output == OutputMode::kJson) {
+    display = std::make_unique<JsonLines>(options.view, stdout, stderr);
+  } else if (!live) {
+    display = std::make_unique<PlainLines>(options.view, stdout, stderr);
+  } else {
+    auto made = MakeTable(options, group);
+    table = made.get();
+    display = std::move(made);
+  }
+  group.Attach(*display);
+  const bool ok = group.SetUp(error) && group.Monitor(table, keys ? &*keys : nullptr, error);
+  std::string endError;
+  const bool ended = group.Terminate(endError);
+  keys.reset();
   display->Close();
   if (!ok) std::fprintf(stderr, "kvmon: %s\n", error.c_str());
-  return ok ? 0 : 1;
+  if (ok && !ended) std::fprintf(stderr, "kvmon: %s\n", endError.c_str());
+  if (ok && ended) Summarise(options, group);
+  return ok && ended ? 0 : 1;
 }
 
 }  // namespace
 
 int RunKvmon(int argc, char** argv) {
   Options options;
-  switch (ParseOptions(argc, argv, options, stderr)) {
+  switch (ParseOptions(argc, argv, options, stderr, std::getenv(kControllerVariable))) {
     case ParseResult::kHelp:
       PrintUsage(stdout);
       return 0;
@@ -224,14 +185,8 @@ int RunKvmon(int argc, char** argv) {
       break;
   }
   InstallSignals();
-  std::string error;
-  auto link = ControllerLink::Open(options.controllerHost, options.controllerPort,
-                                   options.waitSeconds, error);
-  if (!link) {
-    std::fprintf(stderr, "kvmon: %s\n", error.c_str());
-    return 1;
-  }
-  return options.hardware ? ListHardware(*link, options) : RunSession(*link, options);
+  if (options.hardware) return ListHardware(options);
+  return RunSessions(options);
 }
 
 }  // namespace kvmon

@@ -11,7 +11,23 @@ constexpr size_t kFullMessage = 100000 - (28 + 2047);
 
 }  // namespace
 
-void LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records, size_t payloadBytes) {
+bool LiveRow::Changed() const {
+  if (fresh || resized) return true;
+  for (const bool byte : changed) {
+    if (byte) return true;
+  }
+  return false;
+}
+
+void LiveTable::Clear() {
+  rows_.clear();
+  lastPayloads_.clear();
+  payloads_.clear();
+  lastMessageBytes_ = 0;
+}
+
+size_t LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records,
+                         size_t payloadBytes) {
   const bool continues = lastMessageBytes_ >= kFullMessage && !rows_.empty() && !records.empty() &&
                          records.front().identifier >= rows_.back().record.identifier;
   lastMessageBytes_ = payloadBytes;
@@ -20,6 +36,7 @@ void LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records, siz
     payloads_.clear();
     rows_.clear();
   }
+  const size_t first = rows_.size();
   for (const auto& record : records) {
     const RowKey key = KeyOf(bus_, record);
     LiveRow row;
@@ -28,6 +45,7 @@ void LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records, siz
     const auto before = lastPayloads_.find(key);
     row.fresh = before == lastPayloads_.end();
     if (!row.fresh) {
+      row.resized = before->second.size() != record.payload.size();
       for (size_t i = 0; i < record.payload.size(); ++i) {
         row.changed[i] = i >= before->second.size() || before->second[i] != record.payload[i];
       }
@@ -35,6 +53,7 @@ void LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records, siz
     payloads_[key] = record.payload;
     rows_.push_back(std::move(row));
   }
+  return first;
 }
 
 }  // namespace kvmon

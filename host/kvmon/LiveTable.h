@@ -14,6 +14,10 @@ struct LiveRow {
   kvhost::IdentifierRecord record;
   std::vector<bool> changed;  // one per payload byte: differs from the previous report
   bool fresh = false;         // first report of this identifier
+  bool resized = false;       // the payload length differs from the previous report's
+
+  // New, or its payload changed since the previous report.
+  bool Changed() const;
 };
 
 // Keeps the payloads of the last report per row key. Not thread-safe.
@@ -26,7 +30,10 @@ class LiveTable {
   // more: a message continues the report before it when that one was full and this one goes on in
   // identifier order. A new report replaces the rows; identifiers missing from it (after a reset
   // on the controller) are forgotten.
-  void Update(const std::vector<kvhost::IdentifierRecord>& records, size_t payloadBytes = 0);
+  // Returns the index of the first row the message added.
+  size_t Update(const std::vector<kvhost::IdentifierRecord>& records, size_t payloadBytes = 0);
+  // Forgets every row and payload, as if no report had come.
+  void Clear();
 
   const std::vector<LiveRow>& rows() const { return rows_; }
   Bus bus() const { return bus_; }

@@ -1,7 +1,6 @@
 // Text lines of records and statistics, written and flushed one report at a time.
 #include "host/kvmon/PlainLines.h"
 
-#include <chrono>
 #include <cstdio>
 
 namespace kvmon {
@@ -14,11 +13,12 @@ std::string Dashed(std::string text) {
   return text;
 }
 
-std::string BusExtras(Bus bus, const kvhost::IdentifierRecord& r) {
+std::string BusExtras(const SourceModel& source, const kvhost::IdentifierRecord& r) {
   char text[96];
-  if (bus == Bus::kLin) {
+  if (source.bus() == Bus::kLin) {
+    if (!source.checksums()) return " checksum=-";
     std::snprintf(text, sizeof text, " checksum=%02X", r.checksum & 0xFF);
-  } else if (bus == Bus::kFlexRay) {
+  } else if (source.bus() == Bus::kFlexRay) {
     std::snprintf(text, sizeof text, " cycle=%u%s%s", r.cycle, r.startup ? " startup" : "",
                   r.sync ? " sync" : "");
   } else {
@@ -27,21 +27,22 @@ std::string BusExtras(Bus bus, const kvhost::IdentifierRecord& r) {
   return text;
 }
 
-}  // namespace
-
-std::string NowText() {
-  const auto micros = std::chrono::duration_cast<std::chrono::microseconds>(
-                          std::chrono::system_clock::now().time_since_epoch())
-                          .count();
-  char text[40];
-  std::snprintf(text, sizeof text, "%lld.%06lld", static_cast<long long>(micros / 1000000),
-                static_cast<long long>(micros % 1000000));
+std::string Milliseconds(const char* name, const std::optional<double>& value) {
+  if (!value) return std::string(" ") + name + "=-";
+  char text[48];
+  std::snprintf(text, sizeof text, " %s=%.3fms", name, *value);
   return text;
 }
 
-std::string PlainLines::RecordLine(const std::string& interfaceName, Bus bus,
-                                   const kvhost::IdentifierRecord& r) {
-  std::string line = UnixTimeText(r.lastTimestamp) + " " + interfaceName + " " +
+}  // namespace
+
+std::string HostTimeText(uint64_t hostTime) { return UnixTimeText(hostTime); }
+
+std::string PlainLines::RecordLine(const ShownRow& shown, bool withTiming) {
+  const SourceModel& source = *shown.source;
+  const kvhost::IdentifierRecord& r = shown.row->record;
+  const Bus bus = source.bus();
+  std::string line = UnixTimeText(r.lastTimestamp) + " " + source.interfaceName() + " " +
                      IdentifierText(bus, r) + " " + FrameTypeName(bus, r.type) + " [" +
                      std::to_string(r.payloadLength) + "]";
   if (!r.payload.empty()) line += " " + HexBytes(r.payload, " ");
@@ -52,7 +53,13 @@ std::string PlainLines::RecordLine(const std::string& interfaceName, Bus bus,
     line += text;
   }
   if (r.echo & 0x80) line += " echo";
-  return line + BusExtras(bus, r);
+  line += BusExtras(source, r);
+  if (withTiming) {
+    line += Milliseconds("mean", shown.timing.meanMs) +
+            Milliseconds("jitter", shown.timing.jitterMs) +
+            Milliseconds("min", shown.timing.minGapMs) + Milliseconds("max", shown.timing.maxGapMs);
+  }
+  return shown.timing.overdue ? line + " overdue" : line;
 }
 
 std::string PlainLines::StatisticsLine(const std::string& interfaceName, const std::string& when,
@@ -68,14 +75,15 @@ std::string PlainLines::StatisticsLine(const std::string& interfaceName, const s
   return line;
 }
 
-void PlainLines::ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
-                             size_t) {
-  for (const auto& record : records) Write(RecordLine(interfaceName_, bus, record));
+void PlainLines::ShowRecords(const SourceModel& source, size_t firstRow) {
+  for (const auto& shown : SelectMessageRows(source, firstRow, view_))
+    Write(RecordLine(shown, view_.timing));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 
-void PlainLines::ShowStatistics(const BusReport& report) {
-  Write(StatisticsLine(interfaceName_, NowText(), report));
+void PlainLines::ShowStatistics(const SourceModel& source) {
+  if (!source.report()) return;
+  Write(StatisticsLine(source.interfaceName(), HostTimeText(clock_()), *source.report()));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 

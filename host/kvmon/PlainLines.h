@@ -3,31 +3,34 @@
 #pragma once
 
 #include <cstdio>
+#include <functional>
 #include <string>
 
 #include "host/kvmon/Display.h"
+#include "host/kvmon/RowSelection.h"
 
 namespace kvmon {
 
-// Lines such as
+// Lines such as (docs/kvmon.md)
 //   1700000000.123456 CAN1 100 data [8] 2A 01 02 03 04 05 06 07 count=1234 period=10.000ms
+//   1700000000.123456 FlexRay1 slot 40 B data [2] 40 41 count=9 period=5.000ms cycle=3
 //   1700000000.200000 CAN1 statistics standard=100/s ... load=12.34% peak=13.00% state=error-active
-//   tec=0
-// Notices go to `err`.
+// The rows the view shows (filter, changed-only, age); with the view's timing on, each record line
+// also carries mean=, jitter=, min= and max=; an overdue row ends in " overdue". Notices go to
+// `err`.
 class PlainLines : public Display {
  public:
-  PlainLines(std::string interfaceName, std::FILE* out, std::FILE* err)
-      : interfaceName_(std::move(interfaceName)), out_(out), err_(err) {}
+  PlainLines(ViewOptions view, std::FILE* out, std::FILE* err,
+             std::function<uint64_t()> clock = HostNow)
+      : view_(std::move(view)), out_(out), err_(err), clock_(std::move(clock)) {}
 
-  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
-                   size_t messageBytes) override;
-  void ShowStatistics(const BusReport& report) override;
+  void ShowRecords(const SourceModel& source, size_t firstRow) override;
+  void ShowStatistics(const SourceModel& source) override;
   void ShowNotice(const std::string& words) override;
   bool failed() const override { return failed_; }
 
-  // The line of one record, without its line end.
-  static std::string RecordLine(const std::string& interfaceName, Bus bus,
-                                const kvhost::IdentifierRecord& record);
+  // The line of one shown row, without its line end.
+  static std::string RecordLine(const ShownRow& row, bool withTiming);
   // The line of one statistics report, without its line end; `when` is its receipt time text.
   static std::string StatisticsLine(const std::string& interfaceName, const std::string& when,
                                     const BusReport& report);
@@ -35,13 +38,14 @@ class PlainLines : public Display {
  private:
   void Write(const std::string& line);
 
-  std::string interfaceName_;
+  ViewOptions view_;
   std::FILE* out_;
   std::FILE* err_;
+  std::function<uint64_t()> clock_;
   bool failed_ = false;
 };
 
-// The wall-clock time now as "1700000000.123456".
-std::string NowText();
+// A host time in TimingHealth.h units as "1700000000.123456".
+std::string HostTimeText(uint64_t hostTime);
 
 }  // namespace kvmon

@@ -1,14 +1,16 @@
-// kvmon's live terminal table: the identifiers of the session updated in place, changed payload
-// bytes highlighted, with the statistics line below.
+// kvmon's live terminal table: the identifiers of every session updated in place, changed payload
+// bytes highlighted, the statistics below, and keys to pause, clear, sort and scroll.
 #pragma once
 
 #include <cstdio>
 #include <functional>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "host/kvmon/Display.h"
-#include "host/kvmon/LiveTable.h"
+#include "host/kvmon/RowSelection.h"
+#include "host/kvmon/TerminalKeys.h"
 
 namespace kvmon {
 
@@ -17,34 +19,62 @@ struct TerminalSize {
   int rows = 24;
 };
 
+// The frame a session transmits, for the title: its row is found by the echo of the frame.
+struct TransmitWatch {
+  const SourceModel* source = nullptr;
+  uint32_t identifier = 0;  // with the CAN extended bit
+  uint8_t type = 0;         // the record type the echo carries
+  std::string text;         // "123#11223344 every 100 ms"
+};
+
+// What the tool must do after a key.
+enum class KeyAction : uint8_t { kNone, kQuit, kClear };
+
 // Draws with ANSI escape sequences on `out`, which must be a terminal; `size` is asked before
-// every drawing (the window may have changed).
+// every drawing (the window may have changed). With more than one source the rows carry an
+// interface column and each source gets its statistics lines.
 class TerminalView : public Display {
  public:
-  TerminalView(Bus bus, std::string title, std::FILE* out, std::function<TerminalSize()> size);
+  TerminalView(std::vector<const SourceModel*> sources, std::string title, ViewOptions view,
+               std::FILE* out, std::function<TerminalSize()> size);
 
-  void ShowRecords(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
-                   size_t messageBytes) override;
-  void ShowStatistics(const BusReport& report) override;
+  void ShowRecords(const SourceModel& source, size_t firstRow) override;
+  void ShowStatistics(const SourceModel& source) override;
   void ShowNotice(const std::string& words) override;
   void Close() override;
   bool failed() const override { return failed_; }
+
+  void SetTransmit(TransmitWatch watch) { transmit_ = std::move(watch); }
+  // Pause, sort, timing and scrolling are handled here (and redrawn); quit and clear are the
+  // tool's.
+  KeyAction HandleKey(Key key);
 
   // The screen's lines without escape sequences other than the highlighting, for `size`.
   std::vector<std::string> Lines(TerminalSize size) const;
 
  private:
-  void Draw();
-  std::string RowLine(const LiveRow& row, int columns) const;
-  std::string RatesLine() const;
-  std::string StateLine() const;
+  // Draws the screen; a paused view only when `evenPaused`.
+  void Draw(bool evenPaused = false);
+  size_t RowRoom(TerminalSize size) const;
+  // The largest scroll that still fills the rows' room.
+  size_t LastScroll(size_t rows, TerminalSize size) const;
+  std::string TitleLine(size_t shown) const;
+  std::string HeaderLine(int width) const;
+  std::string RowLine(const ShownRow& row, int columns) const;
+  std::string PayloadText(const LiveRow& row, int room) const;
+  std::string TimingText(const ShownRow& row) const;
+  std::vector<std::string> StatisticsLines(int width) const;
+  int IdWidth() const;
 
-  LiveTable table_;
+  std::vector<const SourceModel*> sources_;
   std::string title_;
-  std::optional<BusReport> report_;
+  ViewOptions view_;
+  std::optional<TransmitWatch> transmit_;
   std::string notice_;
   std::FILE* out_;
   std::function<TerminalSize()> size_;
+  size_t scroll_ = 0;  // rows scrolled off the top
+  bool paused_ = false;
   bool started_ = false;
   bool failed_ = false;
 };

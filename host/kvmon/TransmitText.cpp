@@ -127,6 +127,7 @@ std::optional<TransmitFrame> ParseTransmitFrame(const std::string& text, std::st
     return std::nullopt;
   }
   TransmitFrame frame;
+  frame.text = text;
   if (!ReadIdentifier(text.substr(0, hash), frame, error)) return std::nullopt;
   const std::string data = text.substr(hash + 1);
   bool ok = false;

@@ -17,6 +17,7 @@ struct TransmitFrame {
   std::vector<uint8_t> payload;
   uint32_t length = 0;             // payload length on the bus (remote: the requested length)
   std::optional<double> periodMs;  // cyclic when set
+  std::string text;                // as the user wrote it
 };
 
 // Reads ID#HEXDATA, ID#R[LEN] (remote) or ID##F HEXDATA (CAN FD; flag F bit 0: bit-rate

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "host/kvmon/KvmonOptions.h"
+#include "host/kvmon/SessionSetup.h"
 #include "host/kvmon/TransmitText.h"
 
 namespace kvmon {
@@ -18,7 +19,7 @@ struct Parsed {
   std::string err;
 };
 
-Parsed Parse(std::vector<std::string> args) {
+Parsed Parse(std::vector<std::string> args, const char* controllerVariable = nullptr) {
   args.insert(args.begin(), "kvmon");
   std::vector<char*> argv;
   for (auto& arg : args) argv.push_back(arg.data());
@@ -27,7 +28,8 @@ Parsed Parse(std::vector<std::string> args) {
   char* text = nullptr;
   size_t size = 0;
   std::FILE* err = open_memstream(&text, &size);
-  parsed.result = ParseOptions(static_cast<int>(args.size()), argv.data(), parsed.options, err);
+  parsed.result = ParseOptions(static_cast<int>(args.size()), argv.data(), parsed.options, err,
+                               controllerVariable);
   std::fclose(err);
   parsed.err.assign(text, size);
   std::free(text);
@@ -47,7 +49,7 @@ TEST(KvmonOptions, OptionsBecomeTheControllersPropertyMessagesInOrder) {
         "SET_PROP_SESSION_ALIAS=SimDB", "SET_PROP_SESSION_CLUSTER=FlexRay"}},
       {{"LIN1", "--run-mode", "Normal", "-b", "19200"},
        {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_RUNMODE=NORMAL",
-        "SET_PROP_SESSION_BAUDRATE=19200"}},
+        "SET_PROP_SESSION_BAUDRATE=19200", "SET_PROP_SESSION_LOG_CHECKSUM=1"}},
       {{"--run-mode", "subordinate", "--alias", "SimDB", "--cluster", "Body", "CAN1"},
        {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_SESSION_RUNMODE=SUBORDINATE",
         "SET_PROP_SESSION_ALIAS=SimDB", "SET_PROP_SESSION_CLUSTER=Body"}},
@@ -65,14 +67,24 @@ TEST(KvmonOptions, OptionsBecomeTheControllersPropertyMessagesInOrder) {
         "SET_PROP_SESSION_TERMINATION=1", "SET_PROP_SESSION_TRANSCEIVER_TYPE=4"}},
       {{"--data-period", "200", "--stats-period", "1000", "--table-size", "50", "LIN2"},
        {"SET_PROP_SESSION_PORTNAME=LIN2", "SET_PROP_TX_TIME_DATA=200",
-        "SET_PROP_TX_TIME_STATISTIC=1000", "SET_PROP_DATA_LOG_IDS_MAX=50"}},
+        "SET_PROP_TX_TIME_STATISTIC=1000", "SET_PROP_DATA_LOG_IDS_MAX=50",
+        "SET_PROP_SESSION_LOG_CHECKSUM=1"}},
+      // A text log gets a checksum column only when asked for.
+      {{"--log", "text", "--log-name", "lin", "LIN2"},
+       {"SET_PROP_SESSION_PORTNAME=LIN2", "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=0",
+        "SET_PROP_LOGFILE_NAME=lin"}},
+      // The transmitting session sees its own frame.
+      {{"--run-mode", "normal", "-b", "500000", "--tx", "123#11", "CAN3"},
+       {"SET_PROP_SESSION_PORTNAME=CAN3", "SET_PROP_SESSION_RUNMODE=NORMAL",
+        "SET_PROP_SESSION_BAUDRATE=500000", "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=1"}},
       {{"-l", "vora", "--log-name", "run", "--log-group", "g", "--log-channel", "c", "CAN1"},
        {"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=2",
         "SET_PROP_LOGFILE_NAME=run", "SET_PROP_LOGFILE_VORA_GROUP_NAME=g",
         "SET_PROP_LOGFILE_VORA_CHANNEL_NAME=c"}},
-      {{"--no-response", "--log-checksum", "--log", "text", "LIN1"},
+      {{"--no-response", "--log-checksum", "--log", "text", "--log-name", "l", "LIN1"},
        {"SET_PROP_SESSION_PORTNAME=LIN1", "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1",
-        "SET_PROP_SESSION_LOG_CHECKSUM=1", "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=0"}},
+        "SET_PROP_SESSION_LOG_CHECKSUM=1", "SET_PROP_LOGFILE=1", "SET_PROP_LOGFILE_TYPE=0",
+        "SET_PROP_LOGFILE_NAME=l"}},
       {{"--null-frames", "--key-slot", "5", "FlexRay2"},
        {"SET_PROP_SESSION_PORTNAME=FlexRay2", "SET_PROP_SESSION_SHOW_NULL_FRAMES=1",
         "SET_PROP_SESSION_KEY_SLOT=5"}},
@@ -80,27 +92,90 @@ TEST(KvmonOptions, OptionsBecomeTheControllersPropertyMessagesInOrder) {
   for (const auto& c : cases) {
     const auto parsed = Parse(c.args);
     EXPECT_EQ(parsed.result, ParseResult::kRun) << c.args.back() << ": " << parsed.err;
-    EXPECT_EQ(parsed.options.properties, c.properties) << c.args.back();
+    ASSERT_EQ(parsed.options.interfaces.size(), 1u) << c.args.back();
+    EXPECT_EQ(SessionProperties(parsed.options, parsed.options.interfaces[0]), c.properties)
+        << c.args.back();
   }
 }
 
-TEST(KvmonOptions, ConnectionAndOutputOptionsAreRead) {
-  const auto parsed =
-      Parse({"-c", "10.0.0.7:2000", "--json", "-n", "3", "-d", "2.5", "-w", "1", "CAN2"});
+TEST(KvmonOptions, SeveralInterfacesShareTheSettingsAndLogToFilesOfTheirOwn) {
+  const auto parsed = Parse({"--log", "binary", "--log-name", "run", "CAN1", "LIN1"});
   ASSERT_EQ(parsed.result, ParseResult::kRun) << parsed.err;
-  EXPECT_EQ(parsed.options.controllerHost, "10.0.0.7");
-  EXPECT_EQ(parsed.options.controllerPort, 2000);
+  EXPECT_EQ(parsed.options.interfaces, (std::vector<std::string>{"CAN1", "LIN1"}));
+  EXPECT_EQ(
+      SessionProperties(parsed.options, "CAN1"),
+      (std::vector<std::string>{"SET_PROP_SESSION_PORTNAME=CAN1", "SET_PROP_LOGFILE=1",
+                                "SET_PROP_LOGFILE_TYPE=1", "SET_PROP_LOGFILE_NAME=run-CAN1"}));
+  EXPECT_EQ(SessionProperties(parsed.options, "LIN1").back(), "SET_PROP_SESSION_LOG_CHECKSUM=1");
+}
+
+TEST(KvmonOptions, ConnectionOutputAndViewOptionsAreRead) {
+  const auto parsed = Parse({"-c",       "10.0.0.7:2000", "--json",    "-n",  "3",
+                             "-d",       "2.5",           "-w",        "1",   "-f",
+                             "100,~1A0", "--changed",     "--age",     "2",   "--sort",
+                             "count",    "--timing",      "--overdue", "2.5", "CAN2"});
+  ASSERT_EQ(parsed.result, ParseResult::kRun) << parsed.err;
+  EXPECT_EQ(parsed.options.controller.host, "10.0.0.7");
+  EXPECT_EQ(parsed.options.controller.port, 2000);
   EXPECT_EQ(parsed.options.output, OutputMode::kJson);
-  EXPECT_EQ(parsed.options.recordMessages, 3u);
+  EXPECT_EQ(parsed.options.reports, 3u);
   EXPECT_EQ(parsed.options.durationSeconds, 2.5);
+  const ViewOptions& view = parsed.options.view;
+  EXPECT_EQ(view.filter.text(), "100,~1A0");
+  EXPECT_TRUE(view.changedOnly);
+  EXPECT_EQ(view.ageSeconds, 2.0);
+  EXPECT_EQ(view.sort, SortOrder::kCount);
+  EXPECT_TRUE(view.timing);
+  EXPECT_EQ(view.overdueFactor, 2.5);
   EXPECT_TRUE(Parse({"--hardware"}).options.hardware);
   EXPECT_EQ(Parse({"--help"}).result, ParseResult::kHelp);
+}
+
+struct AddressCase {
+  const char* option;    // -c, or nullptr
+  const char* variable;  // KVMON_CONTROLLER, or nullptr
+  const char* host;
+  uint16_t port;
+};
+
+TEST(KvmonOptions, ControllerComesFromTheOptionOrElseTheEnvironment) {
+  const AddressCase cases[] = {
+      {nullptr, nullptr, "127.0.0.1", 13456},
+      {"bench-pc", nullptr, "bench-pc", 13456},
+      {"bench-pc:2000", nullptr, "bench-pc", 2000},
+      {"[fe80::1]:2000", nullptr, "fe80::1", 2000},
+      {"[::1]", nullptr, "::1", 13456},
+      {"::1", nullptr, "::1", 13456},
+      {nullptr, "rig7:2100", "rig7", 2100},
+      {"10.0.0.7", "rig7:2100", "10.0.0.7", 13456},
+  };
+  for (const auto& c : cases) {
+    std::vector<std::string> args = {"CAN1"};
+    if (c.option != nullptr) args = {"-c", c.option, "CAN1"};
+    const auto parsed = Parse(args, c.variable);
+    ASSERT_EQ(parsed.result, ParseResult::kRun) << parsed.err;
+    EXPECT_EQ(parsed.options.controller.host, c.host);
+    EXPECT_EQ(parsed.options.controller.port, c.port) << c.host;
+  }
+  const auto bad = Parse({"CAN1"}, "rig7:0");
+  EXPECT_EQ(bad.result, ParseResult::kUsageError);
+  EXPECT_NE(bad.err.find("KVMON_CONTROLLER: '0' is not a TCP port"), std::string::npos) << bad.err;
 }
 
 TEST(KvmonOptions, BadValuesAreUsageErrorsThatNameTheProblem) {
   const std::pair<std::vector<std::string>, std::string> cases[] = {
       {{}, "name the interface"},
-      {{"CAN1", "CAN2"}, "one interface at a time"},
+      {{"CAN1", "CAN1"}, "named twice"},
+      {{"--log", "text", "CAN1"}, "--log needs --log-name"},
+      {{"--log-name", "run", "CAN1"}, "--log-name needs --log"},
+      {{"--log", "text", "--log-name", "../x", "CAN1"}, "not a plain file name"},
+      {{"--log", "text", "--log-name", "a\\b", "CAN1"}, "not a plain file name"},
+      {{"--run-mode", "normal", "LIN1"}, "needs its bit rate: give --baud"},
+      {{"--run-mode", "normal", "-b", "500000", "--io-mode", "fd-brs", "CAN3"}, "--fd-baud"},
+      {{"--tx", "123#11", "CAN3", "CAN4"}, "one interface only"},
+      {{"-f", "1G0", "CAN1"}, "'1G0' is no identifier"},
+      {{"--sort", "name", "CAN1"}, "--sort"},
+      {{"--overdue", "1", "CAN1"}, "--overdue"},
       {{"--stats-period", "999", "CAN1"}, "--stats-period"},
       {{"--node-address", "256", "CAN1"}, "--node-address"},
       {{"--io-mode", "3", "CAN1"}, "--io-mode"},
@@ -112,6 +187,7 @@ TEST(KvmonOptions, BadValuesAreUsageErrorsThatNameTheProblem) {
       {{"--tx", "123#11", "LIN1"}, "CAN interfaces only"},
       {{"--tx-every", "10", "CAN1"}, "needs a --tx frame"},
       {{"-c", "127.0.0.1:70000", "CAN1"}, "not a TCP port"},
+      {{"-c", ":2000", "CAN1"}, "names no host"},
       {{"--frobnicate", "CAN1"}, "unknown option"},
       {{"CAN1=x"}, "not an interface name"},
   };

@@ -6,6 +6,7 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <cstring>
 #include <map>
 #include <nlohmann/json.hpp>
 #include <set>
@@ -56,14 +57,15 @@ std::vector<json> JsonObjects(const std::string& out) {
   return objects;
 }
 
-// The latest record of each "id/type" (FlexRay: "slot/channel").
+// The latest record of each "interface id/type" (FlexRay: "interface slot/channel").
 std::map<std::string, json> LatestRecords(const std::string& out) {
   std::map<std::string, json> latest;
   for (const auto& object : JsonObjects(out)) {
     if (object["kind"] != "record") continue;
     const std::string second = object.contains("channel") ? object["channel"].get<std::string>()
                                                           : object["type"].get<std::string>();
-    latest[std::to_string(object["id"].get<uint32_t>()) + "/" + second] = object;
+    latest[object["interface"].get<std::string>() + " " +
+           std::to_string(object["id"].get<uint32_t>()) + "/" + second] = object;
   }
   return latest;
 }
@@ -88,17 +90,21 @@ struct BusCase {
   std::set<std::string> keys;
 };
 
-// Bus-error frames are not listed by default: the records are exactly the expected ones.
+// Bus-error frames are not listed by default: the records are exactly the expected ones. Several
+// interfaces go through one kvmon, each with a connection and session of its own.
 TEST_F(KvmonSession, JsonLinesShowTheDefaultTrafficOfEachBus) {
   const BusCase cases[] = {
-      {{"CAN1"}, {"256/data", "416/data", "801/remote", "419361024/data"}},
-      {{"--run-mode", "normal", "--baud", "19200", "LIN1"}, {"16/data", "17/data", "19/data"}},
-      {{"--no-response", "LIN2"}, {"16/data", "17/data", "18/no-resp", "19/data"}},
+      {{"-c", "localhost:" + std::to_string(port()), "--no-response", "CAN1", "LIN2", "FlexRay2"},
+       {"CAN1 256/data", "CAN1 416/data", "CAN1 801/remote", "CAN1 419361024/data", "LIN2 16/data",
+        "LIN2 17/data", "LIN2 18/no-resp", "LIN2 19/data", "FlexRay2 1/A", "FlexRay2 1/B",
+        "FlexRay2 2/A", "FlexRay2 3/A", "FlexRay2 40/B"}},
+      {{"--run-mode", "normal", "--baud", "19200", "LIN1"},
+       {"LIN1 16/data", "LIN1 17/data", "LIN1 19/data"}},
       {{"--alias", "SimDB", "--cluster", "FlexRay", "FlexRay1"},
-       {"1/A", "1/B", "2/A", "3/A", "40/B"}},
+       {"FlexRay1 1/A", "FlexRay1 1/B", "FlexRay1 2/A", "FlexRay1 3/A", "FlexRay1 40/B"}},
   };
   for (const auto& c : cases) {
-    const bool can1 = c.args.back() == "CAN1";
+    const bool can1 = c.args.front() == "-c";
     std::vector<std::string> args = {"--json"};
     args.insert(args.end(), c.args.begin(), c.args.end());
     auto kvmon = Start(args);
@@ -110,22 +116,26 @@ TEST_F(KvmonSession, JsonLinesShowTheDefaultTrafficOfEachBus) {
         << c.args.back() << ": " << kvmon.out() << kvmon.err();
     const auto latest = LatestRecords(kvmon.out());
     EXPECT_EQ(latest.size(), c.keys.size()) << c.args.back();
+    for (const auto& [key, record] : latest) {
+      if (record["bus"] == "LIN") EXPECT_TRUE(record["checksum"].is_number()) << key;
+    }
     if (can1) {
-      const json& counter = latest.at("256/data");
+      const json& counter = latest.at("CAN1 256/data");
       EXPECT_EQ(counter["length"], 8);
       EXPECT_EQ(counter["data"].get<std::string>().substr(2), "01020304050607");
-      EXPECT_EQ(latest.at("416/data")["data"], "AABBCC");
-      EXPECT_EQ(latest.at("801/remote")["length"], 0);
-      EXPECT_EQ(latest.at("419361024/data")["extended"], true);
-      EXPECT_EQ(latest.at("419361024/data")["data"], "0011223344556677");
-      const std::map<std::string, double> periods = {
-          {"256/data", 10}, {"416/data", 50}, {"801/remote", 500}, {"419361024/data", 100}};
+      EXPECT_EQ(latest.at("CAN1 416/data")["data"], "AABBCC");
+      EXPECT_EQ(latest.at("CAN1 801/remote")["length"], 0);
+      EXPECT_EQ(latest.at("CAN1 419361024/data")["id_text"], "18FEF100");
+      EXPECT_EQ(latest.at("FlexRay2 40/B")["id_text"], "slot 40 B");
+      const std::map<std::string, double> periods = {{"CAN1 256/data", 10},
+                                                     {"CAN1 416/data", 50},
+                                                     {"CAN1 801/remote", 500},
+                                                     {"CAN1 419361024/data", 100}};
       for (const auto& [key, period] : periods) {
         EXPECT_NEAR(latest.at(key)["period_ms"].get<double>(), period, period * 0.2) << key;
       }
       for (const auto& object : JsonObjects(kvmon.out())) {
-        if (object["kind"] != "statistics") continue;
-        EXPECT_EQ(object["bus"], "CAN");
+        if (object["kind"] != "statistics" || object["interface"] != "CAN1") continue;
         EXPECT_EQ(object["state"], "error active");
         EXPECT_EQ(object["tec"], 0);
       }
@@ -135,6 +145,7 @@ TEST_F(KvmonSession, JsonLinesShowTheDefaultTrafficOfEachBus) {
   ExpectNoHostLeft();
 }
 
+// A quiet bus sends no identifier table: its statistics periods count instead.
 TEST_F(KvmonSession, TextLinesEndByThemselvesAfterTheAskedNumberOfReports) {
   auto kvmon = Start({"-n", "2", "CAN1"});
   ASSERT_EQ(kvmon.WaitForExit(kToolDeadline), 0) << kvmon.err();
@@ -145,7 +156,32 @@ TEST_F(KvmonSession, TextLinesEndByThemselvesAfterTheAskedNumberOfReports) {
   }
   EXPECT_EQ(counterLines, 2u) << kvmon.out();
   EXPECT_GE(statisticsLines, 1u) << kvmon.out();
+  auto quiet = Start({"-n", "1", "CAN3"});
+  ASSERT_EQ(quiet.WaitForExit(kToolDeadline), 0) << quiet.err();
+  EXPECT_NE(quiet.err().find("no frame was seen on CAN3"), std::string::npos) << quiet.err();
   ExpectNoHostLeft();
+}
+
+// The README's walk-through pasted into a script: kvmon returns once the controller closed the
+// session, so kvlog at once finds a complete log that holds the frame of the last report.
+TEST_F(KvmonSession, LogIsCompleteForKvlogWhenKvmonReturns) {
+  auto kvmon = Start({"--json", "--log", "binary", "--log-name", "walk", "-n", "2", "CAN1"});
+  ASSERT_EQ(kvmon.WaitForExit(kToolDeadline), 0) << kvmon.err();
+  const uint64_t last = LatestRecords(kvmon.out()).at("CAN1 256/data")["raw_timestamp"];
+  const std::string path = drive_.Native("QV-RT\\tarvix\\kelvane\\walk.zfl").string();
+  auto kvlog = KvmonProcess::WithPipes(KVLOG_PATH, {"--bus", "can", "--candump", path});
+  ASSERT_EQ(kvlog.WaitForExit(kToolDeadline), 0) << kvlog.err();
+  EXPECT_EQ(kvlog.err(), "");  // no cut record
+  EXPECT_GT(SplitLines(kvlog.out()).size(), 100u);
+  const auto file = drive_.ReadFile("QV-RT\\tarvix\\kelvane\\walk.zfl");
+  ASSERT_TRUE(file);
+  bool found = false;
+  for (size_t at = 12; at + 24 <= file->size() && !found; at += 24) {
+    uint64_t stamp = 0;
+    std::memcpy(&stamp, file->data() + at, sizeof stamp);
+    found = stamp == last;
+  }
+  EXPECT_TRUE(found) << "the frame of the last report is missing from the log";
 }
 
 TEST_F(KvmonSession, TerminalShowsTheLiveTableAndCtrlCEndsTheSession) {
@@ -164,7 +200,11 @@ TEST_F(KvmonSession, TerminalShowsTheLiveTableAndCtrlCEndsTheSession) {
   EXPECT_NE(kvmon.out().find("321       remote     0"), std::string::npos) << kvmon.out();
   EXPECT_NE(kvmon.out().find("1A0       data       3"), std::string::npos) << kvmon.out();
   EXPECT_NE(kvmon.out().find("AA BB CC"), std::string::npos);
-  kvmon.Type("\x03");  // Ctrl-C typed on the terminal
+  kvmon.Type("s");  // the next sort order: by count
+  EXPECT_TRUE(kvmon.ReadUntil(
+      [](const std::string& out) { return out.find("by count") != std::string::npos; },
+      kToolDeadline));
+  kvmon.Type("\x03");  // Ctrl-C typed on the terminal, which reads single keys
   EXPECT_EQ(kvmon.WaitForExit(kToolDeadline), 0) << kvmon.out();
   EXPECT_NE(kvmon.out().find("\x1b[?25h"), std::string::npos) << "the cursor is shown again";
   ExpectNoHostLeft();
@@ -200,13 +240,24 @@ TEST_F(KvmonSession, TransmitFrameDefinedWithTxIsSeenOnTheOtherInterfaceOfTheBus
   EXPECT_TRUE(watcher.ReadUntil(
       [](const std::string& out) {
         auto latest = LatestRecords(out);
-        auto found = latest.find("291/data");
+        auto found = latest.find("CAN4 291/data");
         return found != latest.end() && found->second["data"] == "11223344" &&
                found->second["count"] >= 2;
       },
       kToolDeadline))
       << watcher.out() << watcher.err() << sender.err();
+  // The sender lists its own frame, marked as sent by its interface.
+  EXPECT_TRUE(sender.ReadUntil(
+      [](const std::string& out) {
+        return out.find(" CAN3 123 data [4] 11 22 33 44 count=") != std::string::npos &&
+               out.find(" echo") != std::string::npos;
+      },
+      kToolDeadline))
+      << sender.out() << sender.err();
   Interrupt(sender);
+  EXPECT_NE(sender.err().find("CAN3 123#11223344 every 20 ms: "), std::string::npos)
+      << sender.err();
+  EXPECT_NE(sender.err().find(" sent"), std::string::npos) << sender.err();
   Interrupt(watcher);
   ExpectNoHostLeft();
 }
@@ -279,6 +330,12 @@ TEST_F(KvmonSession, MissingControllerIsReportedAfterTheWait) {
   EXPECT_EQ(kvmon.WaitForExit(kToolDeadline), 1);
   EXPECT_NE(kvmon.err().find("cannot connect to the controller"), std::string::npos) << kvmon.err();
   EXPECT_NE(kvmon.err().find("is it running?"), std::string::npos) << kvmon.err();
+  // A name that does not resolve is no controller that is not running.
+  auto unnamed = KvmonProcess::WithPipes(KVMON_PATH, {"-c", "no-such-host.invalid", "CAN1"});
+  EXPECT_EQ(unnamed.WaitForExit(kToolDeadline), 1);
+  EXPECT_NE(unnamed.err().find("cannot resolve 'no-such-host.invalid'"), std::string::npos)
+      << unnamed.err();
+  EXPECT_EQ(unnamed.err().find("is it running?"), std::string::npos) << unnamed.err();
 }
 
 }  // namespace

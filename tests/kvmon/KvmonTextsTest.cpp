@@ -12,6 +12,7 @@
 #include "host/kvmon/LiveTable.h"
 #include "host/kvmon/PlainLines.h"
 #include "host/kvmon/PlainWords.h"
+#include "host/kvmon/SourceModel.h"
 #include "host/kvmon/TerminalView.h"
 
 namespace kvmon {
@@ -110,10 +111,11 @@ std::string Visible(const std::string& line) {
 TEST(KvmonTerminalView, LongPayloadsAreCutToTheWindowWithTheCountOfHiddenBytes) {
   std::FILE* screen = std::fopen("/dev/null", "w");
   ASSERT_NE(screen, nullptr);
-  TerminalView view(Bus::kCan, "CAN5 on test", screen, nullptr);
+  SourceModel can5("CAN5", Bus::kCan, 3.0);
+  TerminalView view({&can5}, "CAN5 on test", ViewOptions{}, screen, nullptr);
   std::vector<uint8_t> ramp(64);
   for (size_t i = 0; i < ramp.size(); ++i) ramp[i] = static_cast<uint8_t>(i);
-  view.ShowRecords(Bus::kCan, {Record(0x200, ramp, 2)}, 0);
+  view.ShowRecords(can5, can5.TakeRecords({Record(0x200, ramp, 2)}, 0, 0));
   for (const int columns : {40, 60, 80, 96, 132, 240}) {
     const auto lines = view.Lines(TerminalSize{columns, 24});
     for (const auto& line : lines)
@@ -178,21 +180,30 @@ TEST(KvmonLines, RecordLinesCarryIdentifierTypePayloadCountAndPeriod) {
   extended.lastTimestamp =
       116444736000000000ULL + 10'000'000ULL * 5 + 1234567;          // 1970 + 5.1234567 s
   extended.previousTimestamp = extended.lastTimestamp - 1'000'000;  // 100 ms before
-  EXPECT_EQ(PlainLines::RecordLine("CAN1", Bus::kCan, extended),
+  SourceModel can1("CAN1", Bus::kCan, 3.0);
+  can1.TakeRecords({extended}, 0, extended.lastTimestamp);
+  const ShownRow row{&can1, &can1.table().rows()[0], Timing{}};
+  EXPECT_EQ(PlainLines::RecordLine(row, false),
             "5.123456 CAN1 18FEF100 data [2] 00 11 count=7 period=100.000ms");
-  EXPECT_EQ(JsonLines::RecordObject("CAN1", Bus::kCan, extended),
-            "{\"kind\":\"record\",\"interface\":\"CAN1\",\"bus\":\"CAN\",\"id\":419361024,"
-            "\"extended\":true,"
-            "\"type\":\"data\",\"type_code\":0,\"length\":2,\"data\":\"0011\",\"count\":7,\"period_"
-            "ms\":100.0000,"
-            "\"timestamp\":116444736051234567,\"echo\":false}");
+  EXPECT_EQ(JsonLines::RecordObject(row),
+            "{\"kind\":\"record\",\"timestamp\":5.123456,\"interface\":\"CAN1\",\"bus\":\"CAN\","
+            "\"id\":419361024,\"id_text\":\"18FEF100\",\"extended\":true,\"type\":\"data\","
+            "\"type_code\":0,\"length\":2,\"data\":\"0011\",\"count\":7,\"period_ms\":100.0000,"
+            "\"echo\":false,\"raw_timestamp\":116444736051234567,\"mean_period_ms\":null,"
+            "\"jitter_ms\":null,\"min_gap_ms\":null,\"max_gap_ms\":null,\"overdue\":false}");
 
   auto slot = Record(40, {0x40}, 1);
   slot.type = 0x20;
   slot.channel = 1;
   slot.cycle = 5;
-  const std::string object = JsonLines::RecordObject("Fr\"1", Bus::kFlexRay, slot);
+  SourceModel flexRay("Fr\"1", Bus::kFlexRay, 3.0);
+  flexRay.TakeRecords({slot}, 0, 0);
+  const ShownRow slotRow{&flexRay, &flexRay.table().rows()[0], Timing{}};
+  EXPECT_EQ(PlainLines::RecordLine(slotRow, false),
+            "0.000000 Fr\"1 slot 40 B data [1] 40 count=1 cycle=5");
+  const std::string object = JsonLines::RecordObject(slotRow);
   EXPECT_NE(object.find("\"interface\":\"Fr\\\"1\""), std::string::npos) << object;
+  EXPECT_NE(object.find("\"id\":40,\"id_text\":\"slot 40 B\""), std::string::npos) << object;
   EXPECT_NE(object.find("\"period_ms\":null"), std::string::npos) << object;
   EXPECT_NE(object.find("\"channel\":\"B\",\"cycle\":5"), std::string::npos) << object;
 }
