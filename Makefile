@@ -12,7 +12,7 @@ DEBIAN_PACKAGES := cmake g++ make pkg-config libgtest-dev libgmock-dev libbenchm
 
 SUDO := $(shell [ "$$(id -u)" = 0 ] || echo sudo)
 
-.PHONY: all deps build test sanitize tsan run fuzz bench clean
+.PHONY: all deps build build-run test sanitize tsan run fuzz bench clean
 
 all: build
 
@@ -39,6 +39,14 @@ SANITIZER_ENV = LSAN_OPTIONS=suppressions=$(CURDIR)/fuzz/lsan.supp \
 build: deps
 	$(call flavour,build,RelWithDebInfo,)
 
+# What `make run` needs: the module and the controller, the simulated driver, the measurement-data
+# library and the host tools; the test programs are left to `make test`.
+RUN_TARGETS := kelvanert kelvanert-controller tarvix vora kvmon kvlog voradump
+
+build-run: deps
+	cmake -S . -B build -DCMAKE_BUILD_TYPE=RelWithDebInfo $(CMAKE_FLAGS)
+	cmake --build build -j $(JOBS) --target $(RUN_TARGETS)
+
 test: build
 	ctest --test-dir build -j $(CTEST_JOBS) --output-on-failure
 
@@ -62,7 +70,7 @@ SERVICE_DIR = $(DRIVE_C)/QV-RT/tarvix/kelvane
 # Where the controller looks for the measurement-data library of type 2 logs by default.
 VORA_DLL = $(DRIVE_C)/Program Files/Quovera/Shared/vora/vora.dll
 
-run: build
+run: build-run
 	@mkdir -p "$(SERVICE_DIR)"
 	@install -D -m 755 build/vora/vora.dll "$(VORA_DLL)" && echo "kelvanert: measurement-data library $(VORA_DLL)"
 	@echo "kelvanert: service directory $(SERVICE_DIR)"

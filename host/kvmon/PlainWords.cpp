@@ -150,7 +150,8 @@ std::string ExplainKnownText(const std::string& inner, const std::string& interf
   if (inner == "unknown command") return "the controller does not know this command";
   if (inner == "unknown SETPROP command") return "the controller does not know this setting";
   if (inner == "no valid file name, file name KelvaneLog will be used") {
-    return "no log file name was given; the controller names the log KelvaneLog";
+    return "the controller took no log file name (empty, or not a plain file name) and logs to "
+           "KelvaneLog";
   }
   return "";
 }
@@ -184,8 +185,10 @@ std::string ExplainError(const std::string& reply, const std::string& interfaceN
     return known;
   long long number = 0;
   if (ReadNumber(inner, number)) {
+    constexpr int32_t kOutOfRange = static_cast<int32_t>(0xBFF63033);
+    const std::string hint = number == kOutOfRange ? " (is a bit rate missing? --baud)" : "";
     return "the controller could not open the session on " + interfaceName + ": " +
-           DescribeStatus(static_cast<int32_t>(number)) + "; it closed the connection";
+           DescribeStatus(static_cast<int32_t>(number)) + hint + "; it closed the connection";
   }
   if (inner.rfind("LOG FILE:", 0) == 0 && ReadNumber(Inner(inner.substr(9)), number)) {
     return "logging failed on the controller: " + DescribeStatus(static_cast<int32_t>(number)) +

@@ -24,6 +24,8 @@ TEST(KvmonPlainWords, ControllerErrorsAreToldInPlainWords) {
       {"<ERROR: -1074384832>\n",
        "could not open the session on ETH1: no such interface (status 0xBFF63040)"},
       {"<ERROR: -1074384374>\n", "J1939 address could not be claimed"},
+      {"<ERROR: -1074384845>\n", "a value is out of range (status 0xBFF63033) (is a bit rate"},
+      {"<ERROR: no valid file name, file name KelvaneLog will be used>\n", "logs to KelvaneLog"},
       {"<ERROR: CMD_SESSION_START: no Alias and Cluster defined>\n", "give --alias and --cluster"},
       {"<ERROR: CAN session is already started>\n", "already has a session"},
       {"<ERROR: Heartbeat message missing| TCP Client disconnect> \n",
