@@ -36,8 +36,6 @@ std::string Milliseconds(const char* name, const std::optional<double>& value) {
 
 }  // namespace
 
-std::string HostTimeText(uint64_t hostTime) { return UnixTimeText(hostTime); }
-
 std::string PlainLines::RecordLine(const ShownRow& shown, bool withTiming) {
   const SourceModel& source = *shown.source;
   const kvhost::IdentifierRecord& r = shown.row->record;
@@ -83,7 +81,7 @@ void PlainLines::ShowRecords(const SourceModel& source, size_t firstRow) {
 
 void PlainLines::ShowStatistics(const SourceModel& source) {
   if (!source.report()) return;
-  Write(StatisticsLine(source.interfaceName(), HostTimeText(clock_()), *source.report()));
+  Write(StatisticsLine(source.interfaceName(), UnixTimeText(clock_()), *source.report()));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 

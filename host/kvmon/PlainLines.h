@@ -45,7 +45,4 @@ class PlainLines : public Display {
   bool failed_ = false;
 };
 
-// A host time in TimingHealth.h units as "1700000000.123456".
-std::string HostTimeText(uint64_t hostTime);
-
 }  // namespace kvmon
