@@ -10,6 +10,9 @@ namespace {
 
 constexpr double kUnitsPerMs = 10000.0;
 constexpr uint64_t kUnixEpochIn1601Units = 116444736000000000ULL;
+// The host clock only speaks for a silent bus: a report that reaches the host late (a busy host,
+// a slow network) must not look like silence.
+constexpr int64_t kHostClockSlack = 500 * 10000;
 
 double Ms(uint64_t units) { return static_cast<double>(units) / kUnitsPerMs; }
 
@@ -64,7 +67,8 @@ void TimingTracker::Update(Bus bus, const std::vector<kvhost::IdentifierRecord>&
   if (newest == 0) return;
   const int64_t ahead = static_cast<int64_t>(newest - receivedAt);
   busAhead_ = busAhead_ ? std::max(*busAhead_, ahead) : ahead;
-  const uint64_t byHostClock = static_cast<uint64_t>(static_cast<int64_t>(receivedAt) + *busAhead_);
+  const uint64_t byHostClock =
+      static_cast<uint64_t>(static_cast<int64_t>(receivedAt) + *busAhead_ - kHostClockSlack);
   reportTime_ = std::max({reportTime_, newest, byHostClock});
 }
 

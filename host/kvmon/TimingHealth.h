@@ -36,8 +36,9 @@ class TimingTracker {
   // The health of `record`'s row as of the last report.
   Timing Of(Bus bus, const kvhost::IdentifierRecord& record) const;
   // The bus time of the last report: its newest time stamp, or later when the host clock says so
-  // (carried on from the report that was least behind it), so that a bus that falls silent while
-  // the controller goes on reporting still ages. 0 before the first report.
+  // by more than half a second (carried on from the report that was least behind it), so that a
+  // bus that falls silent while the controller goes on reporting still ages. 0 before the first
+  // report.
   uint64_t ReportTime() const { return reportTime_; }
   void Clear();
 
