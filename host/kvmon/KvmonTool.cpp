@@ -108,7 +108,7 @@ void Summarise(const Options& options, const SessionGroup& group) {
   for (const auto& name : options.interfaces) {
     const SourceModel* model = group.ModelOf(name);
     if (model != nullptr && !model->seenFrames())
-      std::fprintf(stderr, "kvmon: no frame was seen on %s\n", name.c_str());
+      std::fprintf(stderr, "kvmon: %s reported no identifier (a quiet bus)\n", name.c_str());
   }
   if (!options.transmit) return;
   const auto [identifier, type] = EchoKey(*options.transmit);
