@@ -117,7 +117,7 @@ TEST_F(KvmonSession, JsonLinesShowTheDefaultTrafficOfEachBus) {
     const auto latest = LatestRecords(kvmon.out());
     EXPECT_EQ(latest.size(), c.keys.size()) << c.args.back();
     for (const auto& [key, record] : latest) {
-      if (record["bus"] == "LIN") EXPECT_TRUE(record["checksum"].is_number()) << key;
+      EXPECT_TRUE(record["bus"] != "LIN" || record["checksum"].is_number()) << key;
     }
     if (can1) {
       const json& counter = latest.at("CAN1 256/data");
