@@ -179,9 +179,14 @@ TEST_F(CanSessionTest, DatabaseModeTakesBaudRateAndIoModeFromTheDatabase) {
     s.baudRate = 125000;
     s.canIoMode = 1;
   });
-  const SessionSettings& settings = ConnectionAt(0).settings;
-  EXPECT_EQ(settings.baudRate.load(), 500000u);
-  EXPECT_EQ(settings.canIoMode.load(), 0u);
+  // Read back as a host reads them, not from the service's slots: a bit rate without digits keeps
+  // the stored one, and a refused I/O mode is acknowledged with the one kept.
+  ExpectReply(host, "SET_PROP_SESSION_BAUDRATE=?", "<ACK: SET_PROP_SESSION_BAUDRATE 500000> \n");
+  ExpectReply(host, "SET_PROP_SESSION_CAN_IOMODE=9",
+              "<ERROR: SET_PROP_SESSION_CAN_IOMODE: Value range error>\n", kvhost::kErrorText);
+  auto kept = NextMessage(
+      host, [](const kvhost::HostMessage& m) { return m.header.type == kvhost::kText; });
+  EXPECT_TRUE(kept && kept->text() == "<ACK: SET_PROP_SESSION_IOMODE 0> \n");
   EXPECT_TRUE(RecordsWhere(host, AllFour));
 }
 
