@@ -79,6 +79,11 @@ bool SetLogName(Collected& c, std::FILE* err, const char* text) {
                          "' is not a plain file name (the controller writes its logs in its "
                          "service directory: no /, \\, : or surrounding blanks)");
   }
+  // With several interfaces the name gets "-INTERFACE" (up to 65 characters), and the whole
+  // property message must stay within the 256 bytes the controller reads.
+  constexpr size_t kLongestLogName = 160;
+  if (name.size() > kLongestLogName)
+    return Fail(err, "--log-name needs a name of 1 to 160 characters");
   c.logName = name;
   return AddText(c, err, "log-name", "SET_PROP_LOGFILE_NAME", text);
 }
