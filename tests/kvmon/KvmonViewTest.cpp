@@ -147,9 +147,9 @@ TEST(KvmonTimingHealth, GapsMeanJitterAndOverdueFollowTheReports) {
     const Timing t = tracker.Of(Bus::kCan, Frame(0x100, last.count, kT0 + last.lastMs * kMs, 0));
     const Expected& e = c.expected;
     EXPECT_EQ(t.meanMs.has_value(), e.mean.has_value()) << c.name;
-    if (t.meanMs && e.mean) EXPECT_NEAR(*t.meanMs, *e.mean, 1e-9) << c.name;
+    EXPECT_NEAR(t.meanMs.value_or(0), e.mean.value_or(0), 1e-9) << c.name;
     EXPECT_EQ(t.jitterMs.has_value(), e.jitter.has_value()) << c.name;
-    if (t.jitterMs && e.jitter) EXPECT_NEAR(*t.jitterMs, *e.jitter, 1e-3) << c.name;
+    EXPECT_NEAR(t.jitterMs.value_or(0), e.jitter.value_or(0), 1e-3) << c.name;
     EXPECT_EQ(t.minGapMs, e.minGap) << c.name;
     EXPECT_EQ(t.maxGapMs, e.maxGap) << c.name;
     EXPECT_EQ(t.overdue, c.overdue) << c.name;
