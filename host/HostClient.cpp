@@ -49,7 +49,7 @@ bool HostClient::ConnectWithReceiveBuffer(const std::string& host, uint16_t port
   return ConnectSocket(host, port, bytes);
 }
 
-int HostClient::ConnectAddress(const void* addrinfoEntry, int32_t receiveBuffer) {
+int HostClient::connectAddress(const void* addrinfoEntry, int32_t receiveBuffer) {
   const auto* address = static_cast<const addrinfo*>(addrinfoEntry);
   const int fd = socket(address->ai_family, SOCK_STREAM | SOCK_CLOEXEC, 0);
   if (fd < 0) {
@@ -85,7 +85,7 @@ bool HostClient::ConnectSocket(const std::string& host, uint16_t port, int32_t r
   }
   for (const addrinfo* address = addresses; address != nullptr && socket_ < 0;
        address = address->ai_next) {
-    socket_ = ConnectAddress(address, receiveBuffer);
+    socket_ = connectAddress(address, receiveBuffer);
   }
   freeaddrinfo(addresses);
   return socket_ >= 0;

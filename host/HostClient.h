@@ -57,7 +57,7 @@ class HostClient {
  private:
   bool ConnectSocket(const std::string& host, uint16_t port, int32_t receiveBuffer);
   // One address of the name: a connected socket, or -1 with error_ set.
-  int ConnectAddress(const void* addrinfoEntry, int32_t receiveBuffer);
+  int connectAddress(const void* addrinfoEntry, int32_t receiveBuffer);
   // Reads what is there within the time left; false on time-out or end of stream.
   bool FillBuffer(std::chrono::steady_clock::time_point deadline);
 

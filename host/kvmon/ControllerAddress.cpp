@@ -20,7 +20,7 @@ bool ReadPort(const std::string& text, uint16_t& port) {
 
 }  // namespace
 
-std::string ControllerAddress::Text() const {
+std::string ControllerAddress::text() const {
   const bool ipv6 = host.find(':') != std::string::npos;
   return (ipv6 ? "[" + host + "]" : host) + ":" + std::to_string(port);
 }

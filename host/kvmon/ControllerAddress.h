@@ -16,7 +16,7 @@ struct ControllerAddress {
   uint16_t port = kDefaultControllerPort;
 
   // "host:port", with brackets around an IPv6 address.
-  std::string Text() const;
+  std::string text() const;
 };
 
 // nullopt with `error` in plain words when `text` names no host or no TCP port. A host without a

@@ -38,7 +38,7 @@ bool IsReply(const kvhost::HostMessage& message, ControllerLink::Reply reply) {
 }
 
 std::string Where(const std::string& host, uint16_t port) {
-  return ControllerAddress{host, port}.Text();
+  return ControllerAddress{host, port}.text();
 }
 
 }  // namespace

@@ -48,7 +48,7 @@ class ControllerLink {
   std::optional<kvhost::HostMessage> Receive(std::chrono::milliseconds timeout);
 
   // Waits up to `timeout` for the controller to close the connection, discarding what it sends.
-  bool WaitForClose(std::chrono::milliseconds timeout) { return client_.WaitForClose(timeout); }
+  bool waitForClose(std::chrono::milliseconds timeout) { return client_.WaitForClose(timeout); }
 
   bool closed() const { return client_.closed(); }
   int fd() const { return client_.fd(); }

@@ -14,13 +14,13 @@ class Display {
   virtual ~Display() = default;
   // An identifier-record message of `source`: its rows start at `firstRow` of the source's table
   // (the controller's whole table, or part of it when the table needs more than one message).
-  virtual void ShowRecords(const SourceModel& source, size_t firstRow) = 0;
+  virtual void showRecords(const SourceModel& source, size_t firstRow) = 0;
   // `source` received a statistics report.
-  virtual void ShowStatistics(const SourceModel& source) = 0;
+  virtual void showStatistics(const SourceModel& source) = 0;
   // Something the controller said during the session, in plain words.
-  virtual void ShowNotice(const std::string& words) = 0;
+  virtual void showNotice(const std::string& words) = 0;
   // The sessions are over; leave the terminal as it was.
-  virtual void Close() {}
+  virtual void close() {}
   // True once the output could not be written (a closed pipe): the tool ends the sessions.
   virtual bool failed() const = 0;
 };

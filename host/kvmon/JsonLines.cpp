@@ -67,7 +67,7 @@ std::string JsonString(const std::string& text) {
   return out + "\"";
 }
 
-std::string JsonLines::RecordObject(const ShownRow& shown) {
+std::string JsonLines::recordObject(const ShownRow& shown) {
   const SourceModel& source = *shown.source;
   const kvhost::IdentifierRecord& r = shown.row->record;
   const Bus bus = source.bus();
@@ -87,7 +87,7 @@ std::string JsonLines::RecordObject(const ShownRow& shown) {
   return object + BusFields(source, r) + TimingFields(shown.timing) + "}";
 }
 
-std::string JsonLines::StatisticsObject(const std::string& interfaceName, uint64_t when,
+std::string JsonLines::statisticsObject(const std::string& interfaceName, uint64_t when,
                                         const BusReport& report) {
   std::string object = "{\"kind\":\"statistics\"" + Field("timestamp", UnixTimeText(when)) +
                        Field("interface", JsonString(interfaceName)) +
@@ -102,22 +102,22 @@ std::string JsonLines::StatisticsObject(const std::string& interfaceName, uint64
   return object + Field("fault", std::to_string(report.faultCode)) + "}";
 }
 
-void JsonLines::ShowRecords(const SourceModel& source, size_t firstRow) {
-  for (const auto& shown : SelectMessageRows(source, firstRow, view_)) Write(RecordObject(shown));
+void JsonLines::showRecords(const SourceModel& source, size_t firstRow) {
+  for (const auto& shown : SelectMessageRows(source, firstRow, view_)) write(recordObject(shown));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 
-void JsonLines::ShowStatistics(const SourceModel& source) {
+void JsonLines::showStatistics(const SourceModel& source) {
   if (!source.report()) return;
-  Write(StatisticsObject(source.interfaceName(), clock_(), *source.report()));
+  write(statisticsObject(source.interfaceName(), clock_(), *source.report()));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 
-void JsonLines::ShowNotice(const std::string& words) {
+void JsonLines::showNotice(const std::string& words) {
   std::fprintf(err_, "kvmon: %s\n", words.c_str());
 }
 
-void JsonLines::Write(const std::string& line) {
+void JsonLines::write(const std::string& line) {
   if (failed_) return;
   if (std::fputs(line.c_str(), out_) < 0 || std::fputc('\n', out_) == EOF) failed_ = true;
 }

@@ -26,18 +26,18 @@ class JsonLines : public Display {
             std::function<uint64_t()> clock = HostNow)
       : view_(std::move(view)), out_(out), err_(err), clock_(std::move(clock)) {}
 
-  void ShowRecords(const SourceModel& source, size_t firstRow) override;
-  void ShowStatistics(const SourceModel& source) override;
-  void ShowNotice(const std::string& words) override;
+  void showRecords(const SourceModel& source, size_t firstRow) override;
+  void showStatistics(const SourceModel& source) override;
+  void showNotice(const std::string& words) override;
   bool failed() const override { return failed_; }
 
-  static std::string RecordObject(const ShownRow& row);
+  static std::string recordObject(const ShownRow& row);
   // `when`: the receipt time in TimingHealth.h units.
-  static std::string StatisticsObject(const std::string& interfaceName, uint64_t when,
+  static std::string statisticsObject(const std::string& interfaceName, uint64_t when,
                                       const BusReport& report);
 
  private:
-  void Write(const std::string& line);
+  void write(const std::string& line);
 
   ViewOptions view_;
   std::FILE* out_;

@@ -46,7 +46,7 @@ std::optional<bool> ApplyViewOption(int code, const char* arg, ViewOptions& view
   double number = 0;
   switch (code) {
     case 'f':
-      if (auto filter = RowFilter::Parse(arg ? arg : "", error)) {
+      if (auto filter = RowFilter::parse(arg ? arg : "", error)) {
         view.filter = std::move(*filter);
         return true;
       }

@@ -33,7 +33,7 @@ void OnStopSignal(int signal) {
     gStopRequested = 1;
     return;
   }
-  TerminalKeys::RestoreFromSignal();
+  TerminalKeys::restoreFromSignal();
   if (isatty(STDOUT_FILENO)) (void)!write(STDOUT_FILENO, kShowCursor, sizeof kShowCursor - 1);
   std::signal(signal, SIG_DFL);
   std::raise(signal);
@@ -79,7 +79,7 @@ int ListHardware(const Options& options) {
   if (options.output == OutputMode::kJson) {
     PrintHardwareJson(*entries, stdout);
   } else {
-    PrintHardwareTable(*entries, reply->header, options.controller.Text(), stdout);
+    PrintHardwareTable(*entries, reply->header, options.controller.text(), stdout);
   }
   return std::fflush(stdout) == 0 ? 0 : 1;
 }
@@ -87,7 +87,7 @@ int ListHardware(const Options& options) {
 std::string Title(const Options& options) {
   std::string names;
   for (const auto& name : options.interfaces) names += (names.empty() ? "" : ", ") + name;
-  return names + " on " + options.controller.Text();
+  return names + " on " + options.controller.text();
 }
 
 std::string TransmitText(const TransmitFrame& frame) {
@@ -106,13 +106,13 @@ std::pair<uint32_t, uint8_t> EchoKey(const TransmitFrame& frame) {
 // What a script should know at the end: quiet buses, and whether the --tx frame went out.
 void Summarise(const Options& options, const SessionGroup& group) {
   for (const auto& name : options.interfaces) {
-    const SourceModel* model = group.ModelOf(name);
+    const SourceModel* model = group.modelOf(name);
     if (model != nullptr && !model->seenFrames())
       std::fprintf(stderr, "kvmon: %s reported no identifier (a quiet bus)\n", name.c_str());
   }
   if (!options.transmit) return;
   const auto [identifier, type] = EchoKey(*options.transmit);
-  const auto sent = group.ModelOf(options.interfaces[0])->EchoCount(identifier, type);
+  const auto sent = group.modelOf(options.interfaces[0])->echoCount(identifier, type);
   const std::string what = options.interfaces[0] + " " + TransmitText(*options.transmit);
   if (sent) {
     std::fprintf(stderr, "kvmon: %s: %u sent\n", what.c_str(), *sent);
@@ -130,11 +130,11 @@ bool OnTerminal(const Options& options) {
 }
 
 std::unique_ptr<TerminalView> MakeTable(const Options& options, const SessionGroup& group) {
-  auto table = std::make_unique<TerminalView>(group.Models(), Title(options), options.view, stdout,
+  auto table = std::make_unique<TerminalView>(group.models(), Title(options), options.view, stdout,
                                               QueryTerminalSize);
   if (options.transmit) {
     const auto [identifier, type] = EchoKey(*options.transmit);
-    table->SetTransmit({group.Models()[0], identifier, type, TransmitText(*options.transmit)});
+    table->setTransmit({group.models()[0], identifier, type, TransmitText(*options.transmit)});
   }
   return table;
 }
@@ -142,12 +142,12 @@ std::unique_ptr<TerminalView> MakeTable(const Options& options, const SessionGro
 int RunSessions(const Options& options) {
   SessionGroup group(options);
   std::string error;
-  if (!group.Connect(error)) {
+  if (!group.connect(error)) {
     std::fprintf(stderr, "kvmon: %s\n", error.c_str());
     return 1;
   }
   const bool live = options.output != OutputMode::kJson && OnTerminal(options);
-  std::optional<TerminalKeys> keys = live ? TerminalKeys::Open() : std::nullopt;
+  std::optional<TerminalKeys> keys = live ? TerminalKeys::open() : std::nullopt;
   std::unique_ptr<Display> display;
   TerminalView* table = nullptr;
   if (options.output == OutputMode::kJson) {
@@ -159,12 +159,12 @@ int RunSessions(const Options& options) {
     table = made.get();
     display = std::move(made);
   }
-  group.Attach(*display);
-  const bool ok = group.SetUp(error) && group.Monitor(table, keys ? &*keys : nullptr, error);
+  group.attach(*display);
+  const bool ok = group.setUp(error) && group.monitor(table, keys ? &*keys : nullptr, error);
   std::string endError;
-  const bool ended = group.Terminate(endError);
+  const bool ended = group.terminate(endError);
   keys.reset();
-  display->Close();
+  display->close();
   if (!ok) std::fprintf(stderr, "kvmon: %s\n", error.c_str());
   if (ok && !ended) std::fprintf(stderr, "kvmon: %s\n", endError.c_str());
   if (ok && ended) Summarise(options, group);

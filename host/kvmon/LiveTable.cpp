@@ -11,7 +11,7 @@ constexpr size_t kFullMessage = 100000 - (28 + 2047);
 
 }  // namespace
 
-bool LiveRow::Changed() const {
+bool LiveRow::anyChange() const {
   if (fresh || resized) return true;
   for (const bool byte : changed) {
     if (byte) return true;
@@ -19,14 +19,14 @@ bool LiveRow::Changed() const {
   return false;
 }
 
-void LiveTable::Clear() {
+void LiveTable::clear() {
   rows_.clear();
   lastPayloads_.clear();
   payloads_.clear();
   lastMessageBytes_ = 0;
 }
 
-size_t LiveTable::Update(const std::vector<kvhost::IdentifierRecord>& records,
+size_t LiveTable::update(const std::vector<kvhost::IdentifierRecord>& records,
                          size_t payloadBytes) {
   const bool continues = lastMessageBytes_ >= kFullMessage && !rows_.empty() && !records.empty() &&
                          records.front().identifier >= rows_.back().record.identifier;

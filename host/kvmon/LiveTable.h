@@ -17,7 +17,7 @@ struct LiveRow {
   bool resized = false;       // the payload length differs from the previous report's
 
   // New, or its payload changed since the previous report.
-  bool Changed() const;
+  bool anyChange() const;
 };
 
 // Keeps the payloads of the last report per row key. Not thread-safe.
@@ -31,9 +31,9 @@ class LiveTable {
   // identifier order. A new report replaces the rows; identifiers missing from it (after a reset
   // on the controller) are forgotten.
   // Returns the index of the first row the message added.
-  size_t Update(const std::vector<kvhost::IdentifierRecord>& records, size_t payloadBytes = 0);
+  size_t update(const std::vector<kvhost::IdentifierRecord>& records, size_t payloadBytes = 0);
   // Forgets every row and payload, as if no report had come.
-  void Clear();
+  void clear();
 
   const std::vector<LiveRow>& rows() const { return rows_; }
   Bus bus() const { return bus_; }

@@ -36,7 +36,7 @@ std::string Milliseconds(const char* name, const std::optional<double>& value) {
 
 }  // namespace
 
-std::string PlainLines::RecordLine(const ShownRow& shown, bool withTiming) {
+std::string PlainLines::recordLine(const ShownRow& shown, bool withTiming) {
   const SourceModel& source = *shown.source;
   const kvhost::IdentifierRecord& r = shown.row->record;
   const Bus bus = source.bus();
@@ -60,7 +60,7 @@ std::string PlainLines::RecordLine(const ShownRow& shown, bool withTiming) {
   return shown.timing.overdue ? line + " overdue" : line;
 }
 
-std::string PlainLines::StatisticsLine(const std::string& interfaceName, const std::string& when,
+std::string PlainLines::statisticsLine(const std::string& interfaceName, const std::string& when,
                                        const BusReport& report) {
   std::string line = when + " " + interfaceName + " statistics";
   for (const auto& count : report.frames)
@@ -73,23 +73,23 @@ std::string PlainLines::StatisticsLine(const std::string& interfaceName, const s
   return line;
 }
 
-void PlainLines::ShowRecords(const SourceModel& source, size_t firstRow) {
+void PlainLines::showRecords(const SourceModel& source, size_t firstRow) {
   for (const auto& shown : SelectMessageRows(source, firstRow, view_))
-    Write(RecordLine(shown, view_.timing));
+    write(recordLine(shown, view_.timing));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 
-void PlainLines::ShowStatistics(const SourceModel& source) {
+void PlainLines::showStatistics(const SourceModel& source) {
   if (!source.report()) return;
-  Write(StatisticsLine(source.interfaceName(), UnixTimeText(clock_()), *source.report()));
+  write(statisticsLine(source.interfaceName(), UnixTimeText(clock_()), *source.report()));
   if (std::fflush(out_) != 0) failed_ = true;
 }
 
-void PlainLines::ShowNotice(const std::string& words) {
+void PlainLines::showNotice(const std::string& words) {
   std::fprintf(err_, "kvmon: %s\n", words.c_str());
 }
 
-void PlainLines::Write(const std::string& line) {
+void PlainLines::write(const std::string& line) {
   if (failed_) return;
   if (std::fputs(line.c_str(), out_) < 0 || std::fputc('\n', out_) == EOF) failed_ = true;
 }

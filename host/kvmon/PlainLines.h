@@ -24,19 +24,19 @@ class PlainLines : public Display {
              std::function<uint64_t()> clock = HostNow)
       : view_(std::move(view)), out_(out), err_(err), clock_(std::move(clock)) {}
 
-  void ShowRecords(const SourceModel& source, size_t firstRow) override;
-  void ShowStatistics(const SourceModel& source) override;
-  void ShowNotice(const std::string& words) override;
+  void showRecords(const SourceModel& source, size_t firstRow) override;
+  void showStatistics(const SourceModel& source) override;
+  void showNotice(const std::string& words) override;
   bool failed() const override { return failed_; }
 
   // The line of one shown row, without its line end.
-  static std::string RecordLine(const ShownRow& row, bool withTiming);
+  static std::string recordLine(const ShownRow& row, bool withTiming);
   // The line of one statistics report, without its line end; `when` is its receipt time text.
-  static std::string StatisticsLine(const std::string& interfaceName, const std::string& when,
+  static std::string statisticsLine(const std::string& interfaceName, const std::string& when,
                                     const BusReport& report);
 
  private:
-  void Write(const std::string& line);
+  void write(const std::string& line);
 
   ViewOptions view_;
   std::FILE* out_;

@@ -41,7 +41,7 @@ bool ReadSlot(const std::string& text, uint32_t& slot, int& channel) {
 
 }  // namespace
 
-bool RowFilter::ReadTerm(const std::string& text, Term& term) {
+bool RowFilter::readTerm(const std::string& text, Term& term) {
   std::string body = text;
   term.exclude = !body.empty() && body[0] == '~';
   if (term.exclude) body.erase(0, 1);
@@ -60,7 +60,7 @@ bool RowFilter::ReadTerm(const std::string& text, Term& term) {
   return term.hasIdentifier || term.hasSlot;
 }
 
-std::optional<RowFilter> RowFilter::Parse(const std::string& text, std::string& error) {
+std::optional<RowFilter> RowFilter::parse(const std::string& text, std::string& error) {
   RowFilter filter;
   filter.text_ = text;
   size_t start = 0;
@@ -68,7 +68,7 @@ std::optional<RowFilter> RowFilter::Parse(const std::string& text, std::string& 
     const size_t comma = std::min(text.find(',', start), text.size());
     const std::string item = text.substr(start, comma - start);
     Term term;
-    if (!ReadTerm(item, term)) {
+    if (!readTerm(item, term)) {
       error = "'" + item +
               "' is no identifier (hex: 100, 18FEF100, 100:7F0) or FlexRay slot (decimal: 40, "
               "40A)";
@@ -80,7 +80,7 @@ std::optional<RowFilter> RowFilter::Parse(const std::string& text, std::string& 
   return filter;
 }
 
-bool RowFilter::Matches(const Term& term, Bus bus, const kvhost::IdentifierRecord& record) {
+bool RowFilter::matches(const Term& term, Bus bus, const kvhost::IdentifierRecord& record) {
   switch (bus) {
     case Bus::kFlexRay:
       return term.hasSlot && record.identifier == term.slot &&
@@ -88,17 +88,18 @@ bool RowFilter::Matches(const Term& term, Bus bus, const kvhost::IdentifierRecor
     case Bus::kLin:
       return term.hasIdentifier && (record.identifier & term.mask) == (term.identifier & term.mask);
     case Bus::kCan:
+    case Bus::kNone:
       break;
   }
   return term.hasIdentifier && IsExtended(bus, record) == term.extended &&
          (PlainIdentifier(bus, record) & term.mask) == (term.identifier & term.mask);
 }
 
-bool RowFilter::Accepts(Bus bus, const kvhost::IdentifierRecord& record) const {
+bool RowFilter::accepts(Bus bus, const kvhost::IdentifierRecord& record) const {
   bool anyInclude = false;
   bool included = false;
   for (const Term& term : terms_) {
-    const bool match = Matches(term, bus, record);
+    const bool match = matches(term, bus, record);
     if (term.exclude && match) return false;
     if (!term.exclude) {
       anyInclude = true;

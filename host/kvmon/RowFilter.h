@@ -23,9 +23,9 @@ class RowFilter {
  public:
   RowFilter() = default;
   // nullopt with `error` in plain words when a term is neither form.
-  static std::optional<RowFilter> Parse(const std::string& text, std::string& error);
+  static std::optional<RowFilter> parse(const std::string& text, std::string& error);
 
-  bool Accepts(Bus bus, const kvhost::IdentifierRecord& record) const;
+  bool accepts(Bus bus, const kvhost::IdentifierRecord& record) const;
   bool empty() const { return terms_.empty(); }
   const std::string& text() const { return text_; }
 
@@ -40,8 +40,8 @@ class RowFilter {
     uint32_t slot = 0;
     int channel = -1;  // 0 A, 1 B, -1 either
   };
-  static bool ReadTerm(const std::string& text, Term& term);
-  static bool Matches(const Term& term, Bus bus, const kvhost::IdentifierRecord& record);
+  static bool readTerm(const std::string& text, Term& term);
+  static bool matches(const Term& term, Bus bus, const kvhost::IdentifierRecord& record);
 
   std::vector<Term> terms_;
   std::string text_;

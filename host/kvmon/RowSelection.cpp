@@ -19,8 +19,8 @@ constexpr OrderName kOrderNames[] = {{SortOrder::kIdentifier, "id"},
 
 bool IsShown(const ViewOptions& view, const SourceModel& source, const LiveRow& row,
              uint64_t busNow) {
-  if (!view.filter.Accepts(source.bus(), row.record)) return false;
-  if (view.changedOnly && !row.Changed()) return false;
+  if (!view.filter.accepts(source.bus(), row.record)) return false;
+  if (view.changedOnly && !row.anyChange()) return false;
   if (!view.ageSeconds) return true;
   const uint64_t last = row.record.lastTimestamp;
   return busNow <= last || static_cast<double>(busNow - last) <= *view.ageSeconds * kUnitsPerSecond;
@@ -28,11 +28,11 @@ bool IsShown(const ViewOptions& view, const SourceModel& source, const LiveRow& 
 
 void Add(std::vector<ShownRow>& shown, const SourceModel& source, size_t firstRow,
          const ViewOptions& view) {
-  const uint64_t busNow = source.timing().ReportTime();
+  const uint64_t busNow = source.timing().reportTime();
   const auto& rows = source.table().rows();
   for (size_t i = firstRow; i < rows.size(); ++i) {
     if (!IsShown(view, source, rows[i], busNow)) continue;
-    shown.push_back({&source, &rows[i], source.timing().Of(source.bus(), rows[i].record)});
+    shown.push_back({&source, &rows[i], source.timing().of(source.bus(), rows[i].record)});
   }
 }
 

@@ -21,7 +21,7 @@ WatchedSession::WatchedSession(std::string name, ControllerLink connection, doub
       link(std::move(connection)),
       model(interfaceName, BusOfInterface(interfaceName).value_or(Bus::kCan), overdueFactor) {}
 
-bool SessionGroup::Connect(std::string& error) {
+bool SessionGroup::connect(std::string& error) {
   for (const auto& name : options_.interfaces) {
     auto link = ControllerLink::Open(options_.controller.host, options_.controller.port,
                                      options_.waitSeconds, error);
@@ -33,60 +33,60 @@ bool SessionGroup::Connect(std::string& error) {
   return true;
 }
 
-std::vector<const SourceModel*> SessionGroup::Models() const {
+std::vector<const SourceModel*> SessionGroup::models() const {
   std::vector<const SourceModel*> models;
   for (const auto& session : sessions_) models.push_back(&session->model);
   return models;
 }
 
-const SourceModel* SessionGroup::ModelOf(const std::string& interfaceName) const {
+const SourceModel* SessionGroup::modelOf(const std::string& interfaceName) const {
   for (const auto& session : sessions_) {
     if (session->interfaceName == interfaceName) return &session->model;
   }
   return nullptr;
 }
 
-MessageSink SessionGroup::SinkOf(WatchedSession& session) {
-  return [this, &session](const kvhost::HostMessage& message) { Handle(session, message); };
+MessageSink SessionGroup::sinkOf(WatchedSession& session) {
+  return [this, &session](const kvhost::HostMessage& message) { handle(session, message); };
 }
 
-void SessionGroup::HandleRecords(WatchedSession& session, const kvhost::HostMessage& message) {
+void SessionGroup::handleRecords(WatchedSession& session, const kvhost::HostMessage& message) {
   const Bus bus = *BusOfRecordType(message.header.type);
   const auto count = message.header.idCount;
   const auto records = bus == Bus::kCan   ? kvhost::DecodeCanRecords(message.payload, count)
                        : bus == Bus::kLin ? kvhost::DecodeLinRecords(message.payload, count)
                                           : kvhost::DecodeFlexRayRecords(message.payload, count);
   if (!records) {
-    display_->ShowNotice(session.interfaceName +
+    display_->showNotice(session.interfaceName +
                          ": a malformed identifier report of the controller was skipped");
     return;
   }
-  const size_t first = session.model.TakeRecords(*records, message.payload.size(), HostNow());
-  display_->ShowRecords(session.model, first);
+  const size_t first = session.model.takeRecords(*records, message.payload.size(), HostNow());
+  display_->showRecords(session.model, first);
 }
 
-void SessionGroup::Handle(WatchedSession& session, const kvhost::HostMessage& message) {
-  if (BusOfRecordType(message.header.type)) return HandleRecords(session, message);
+void SessionGroup::handle(WatchedSession& session, const kvhost::HostMessage& message) {
+  if (BusOfRecordType(message.header.type)) return handleRecords(session, message);
   if (message.header.type == kvhost::kStatistics) {
     if (const auto report = DecodeBusReport(message.payload)) {
-      session.model.TakeStatistics(*report);
-      display_->ShowStatistics(session.model);
+      session.model.takeStatistics(*report);
+      display_->showStatistics(session.model);
     } else {
-      display_->ShowNotice(session.interfaceName +
+      display_->showNotice(session.interfaceName +
                            ": a malformed statistics report of the controller was skipped");
     }
   } else if (message.header.type == kvhost::kErrorText) {
     session.lastError = ExplainError(message.text(), session.interfaceName);
-    display_->ShowNotice(sessions_.size() > 1 ? session.interfaceName + ": " + session.lastError
+    display_->showNotice(sessions_.size() > 1 ? session.interfaceName + ": " + session.lastError
                                               : session.lastError);
   }
 }
 
-bool SessionGroup::SetUp(std::string& error) {
+bool SessionGroup::setUp(std::string& error) {
   const TransmitFrame* transmit = options_.transmit ? &*options_.transmit : nullptr;
   for (auto& session : sessions_) {
     const auto properties = SessionProperties(options_, session->interfaceName);
-    if (!SetUpSession(session->link, properties, session->interfaceName, transmit, SinkOf(*session),
+    if (!SetUpSession(session->link, properties, session->interfaceName, transmit, sinkOf(*session),
                       error)) {
       if (sessions_.size() > 1) error = session->interfaceName + ": " + error;
       return false;
@@ -95,7 +95,7 @@ bool SessionGroup::SetUp(std::string& error) {
   return true;
 }
 
-bool SessionGroup::LimitReached(Clock::time_point start) const {
+bool SessionGroup::limitReached(Clock::time_point start) const {
   if (options_.reports) {
     bool all = true;
     for (const auto& session : sessions_)
@@ -106,21 +106,21 @@ bool SessionGroup::LimitReached(Clock::time_point start) const {
          Clock::now() - start >= std::chrono::duration<double>(*options_.durationSeconds);
 }
 
-void SessionGroup::WaitForInput(const TerminalKeys* keys) const {
+void SessionGroup::waitForInput(const TerminalKeys* keys) const {
   std::vector<pollfd> fds;
   for (const auto& session : sessions_) fds.push_back({session->link.fd(), POLLIN, 0});
   if (keys != nullptr) fds.push_back({keys->fd(), POLLIN, 0});
   poll(fds.data(), fds.size(), kLoopSliceMs);  // a signal or a time-out ends it as well
 }
 
-bool SessionGroup::ReceiveAll(std::string& error) {
+bool SessionGroup::receiveAll(std::string& error) {
   for (auto& session : sessions_) {
     if (!session->link.HeartbeatIfDue()) {
       error = session->interfaceName + ": " + session->link.error();
       return false;
     }
     while (auto message = session->link.Receive(std::chrono::milliseconds(0)))
-      Handle(*session, *message);
+      handle(*session, *message);
     if (session->link.closed()) {
       error =
           session->lastError.empty() ? "the controller ended the connection" : session->lastError;
@@ -131,43 +131,43 @@ bool SessionGroup::ReceiveAll(std::string& error) {
   return true;
 }
 
-bool SessionGroup::ClearAll(std::string& error) {
+bool SessionGroup::clearAll(std::string& error) {
   for (auto& session : sessions_) {
-    const auto reply = session->link.Request("CMD_SESSION_RESET", SinkOf(*session));
+    const auto reply = session->link.Request("CMD_SESSION_RESET", sinkOf(*session));
     if (!reply) {
       error = session->interfaceName + ": " + session->link.error();
       return false;
     }
-    session->model.Clear();
+    session->model.clear();
   }
   return true;
 }
 
-bool SessionGroup::HandleKeys(TerminalView& view, TerminalKeys& keys, std::string& error) {
-  for (const Key key : keys.Read()) {
-    const KeyAction action = view.HandleKey(key);
+bool SessionGroup::handleKeys(TerminalView& view, TerminalKeys& keys, std::string& error) {
+  for (const Key key : keys.read()) {
+    const KeyAction action = view.handleKey(key);
     if (action == KeyAction::kQuit) quit_ = true;
-    if (action == KeyAction::kClear && !ClearAll(error)) return false;
+    if (action == KeyAction::kClear && !clearAll(error)) return false;
   }
   return true;
 }
 
-bool SessionGroup::Monitor(TerminalView* view, TerminalKeys* keys, std::string& error) {
+bool SessionGroup::monitor(TerminalView* view, TerminalKeys* keys, std::string& error) {
   const auto start = Clock::now();
-  while (!gStopRequested && !quit_ && !LimitReached(start) && !display_->failed()) {
-    WaitForInput(view != nullptr ? keys : nullptr);
-    if (!ReceiveAll(error)) return false;
-    if (view != nullptr && keys != nullptr && !HandleKeys(*view, *keys, error)) return false;
+  while (!gStopRequested && !quit_ && !limitReached(start) && !display_->failed()) {
+    waitForInput(view != nullptr ? keys : nullptr);
+    if (!receiveAll(error)) return false;
+    if (view != nullptr && keys != nullptr && !handleKeys(*view, *keys, error)) return false;
   }
   return true;
 }
 
-bool SessionGroup::Terminate(std::string& error) {
+bool SessionGroup::terminate(std::string& error) {
   bool ok = true;
   for (auto& session : sessions_) {
     if (session->link.closed()) continue;  // ended already (and reported)
     std::string failure;
-    if (TerminateSession(session->link, SinkOf(*session), failure)) continue;
+    if (TerminateSession(session->link, sinkOf(*session), failure)) continue;
     if (ok) error = sessions_.size() > 1 ? session->interfaceName + ": " + failure : failure;
     ok = false;
   }

@@ -32,29 +32,29 @@ class SessionGroup {
   explicit SessionGroup(const Options& options) : options_(options) {}
 
   // Connects once per interface (waiting for the controller to listen). False with `error`.
-  bool Connect(std::string& error);
+  bool connect(std::string& error);
   // The models, for the display; valid once Connect succeeded, for the group's life.
-  std::vector<const SourceModel*> Models() const;
+  std::vector<const SourceModel*> models() const;
   // Where the sessions' messages are shown from SetUp on; it must outlive the group's use.
-  void Attach(Display& display) { display_ = &display; }
-  const SourceModel* ModelOf(const std::string& interfaceName) const;
+  void attach(Display& display) { display_ = &display; }
+  const SourceModel* modelOf(const std::string& interfaceName) const;
   // Sets up and starts every session. False at the first refusal, with `error`.
-  bool SetUp(std::string& error);
+  bool setUp(std::string& error);
   // Runs until Ctrl-C, q, a limit, a failed output or the end of a connection (false, `error`).
   // `view` and `keys` are the live table's, when there is one.
-  bool Monitor(TerminalView* view, TerminalKeys* keys, std::string& error);
+  bool monitor(TerminalView* view, TerminalKeys* keys, std::string& error);
   // Ends every session and waits for each connection to close. False with `error` when one did not.
-  bool Terminate(std::string& error);
+  bool terminate(std::string& error);
 
  private:
-  void Handle(WatchedSession& session, const kvhost::HostMessage& message);
-  void HandleRecords(WatchedSession& session, const kvhost::HostMessage& message);
-  MessageSink SinkOf(WatchedSession& session);
-  bool LimitReached(std::chrono::steady_clock::time_point start) const;
-  bool ReceiveAll(std::string& error);
-  bool HandleKeys(TerminalView& view, TerminalKeys& keys, std::string& error);
-  bool ClearAll(std::string& error);
-  void WaitForInput(const TerminalKeys* keys) const;
+  void handle(WatchedSession& session, const kvhost::HostMessage& message);
+  void handleRecords(WatchedSession& session, const kvhost::HostMessage& message);
+  MessageSink sinkOf(WatchedSession& session);
+  bool limitReached(std::chrono::steady_clock::time_point start) const;
+  bool receiveAll(std::string& error);
+  bool handleKeys(TerminalView& view, TerminalKeys& keys, std::string& error);
+  bool clearAll(std::string& error);
+  void waitForInput(const TerminalKeys* keys) const;
 
   const Options& options_;
   Display* display_ = nullptr;

@@ -77,7 +77,7 @@ bool TerminateSession(ControllerLink& link, const MessageSink& sink, std::string
       return false;
     }
     if (reply->header.type == kvhost::kText) {
-      if (link.WaitForClose(kCloseDeadline)) return true;
+      if (link.waitForClose(kCloseDeadline)) return true;
       error =
           "the controller acknowledged the end of the session but did not close the "
           "connection within " +

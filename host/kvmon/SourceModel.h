@@ -21,11 +21,11 @@ class SourceModel {
 
   // One identifier-record message received at host time `receivedAt` (TimingHealth.h units);
   // returns the index in table().rows() of the first row it added.
-  size_t TakeRecords(const std::vector<kvhost::IdentifierRecord>& records, size_t messageBytes,
+  size_t takeRecords(const std::vector<kvhost::IdentifierRecord>& records, size_t messageBytes,
                      uint64_t receivedAt);
-  void TakeStatistics(const BusReport& report);
+  void takeStatistics(const BusReport& report);
   // Forgets rows, timing and statistics (the controller's table was reset); counts stay.
-  void Clear();
+  void clear();
 
   const std::string& interfaceName() const { return interfaceName_; }
   Bus bus() const { return bus_; }
@@ -45,7 +45,7 @@ class SourceModel {
 
   // The count of the row of `identifier` (with the CAN extended bit) and frame `type` while its
   // last frame was sent by this interface (an echo): how often a transmitted frame went out.
-  std::optional<uint32_t> EchoCount(uint32_t identifier, uint8_t type) const;
+  std::optional<uint32_t> echoCount(uint32_t identifier, uint8_t type) const;
 
  private:
   std::string interfaceName_;

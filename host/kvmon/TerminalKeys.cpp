@@ -62,7 +62,7 @@ std::vector<Key> DecodeKeys(const std::string& bytes) {
   return keys;
 }
 
-std::optional<TerminalKeys> TerminalKeys::Open() {
+std::optional<TerminalKeys> TerminalKeys::open() {
   if (!isatty(STDIN_FILENO) || tcgetattr(STDIN_FILENO, &gSaved) != 0) return std::nullopt;
   struct termios keys = gSaved;
   keys.c_lflag &= ~static_cast<tcflag_t>(ICANON | ECHO);
@@ -81,15 +81,15 @@ TerminalKeys::~TerminalKeys() {
   gChanged = false;
 }
 
-void TerminalKeys::RestoreFromSignal() {
+void TerminalKeys::restoreFromSignal() {
   if (gChanged) tcsetattr(STDIN_FILENO, TCSANOW, &gSaved);
 }
 
-std::vector<Key> TerminalKeys::Read() {
+std::vector<Key> TerminalKeys::read() {
   std::string bytes;
   char chunk[64];
   ssize_t n = 0;
-  while ((n = read(fd_, chunk, sizeof chunk)) > 0) bytes.append(chunk, static_cast<size_t>(n));
+  while ((n = ::read(fd_, chunk, sizeof chunk)) > 0) bytes.append(chunk, static_cast<size_t>(n));
   return DecodeKeys(bytes);
 }
 

@@ -30,17 +30,17 @@ std::vector<Key> DecodeKeys(const std::string& bytes);
 class TerminalKeys {
  public:
   // nullopt when standard input is no terminal.
-  static std::optional<TerminalKeys> Open();
+  static std::optional<TerminalKeys> open();
   TerminalKeys(TerminalKeys&& other) noexcept;
   TerminalKeys& operator=(TerminalKeys&&) = delete;
   ~TerminalKeys();
 
   // The keys typed since the last call, without waiting.
-  std::vector<Key> Read();
+  std::vector<Key> read();
   int fd() const { return fd_; }
 
   // Puts the terminal back as it was; safe in a signal handler (the second Ctrl-C).
-  static void RestoreFromSignal();
+  static void restoreFromSignal();
 
  private:
   explicit TerminalKeys(int fd) : fd_(fd) {}

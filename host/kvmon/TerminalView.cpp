@@ -57,20 +57,20 @@ TerminalView::TerminalView(std::vector<const SourceModel*> sources, std::string 
       out_(out),
       size_(std::move(size)) {}
 
-int TerminalView::IdWidth() const {
+int TerminalView::idWidth() const {
   for (const SourceModel* source : sources_) {
     if (source->bus() == Bus::kFlexRay) return 11;  // "slot 2047 B"
   }
   return 9;
 }
 
-std::string TerminalView::TimingText(const ShownRow& row) const {
+std::string TerminalView::timingText(const ShownRow& row) const {
   const Timing& t = row.timing;
   return Ms(t.meanMs, 9) + " " + Ms(t.jitterMs, 9) + " " + Ms(t.minGapMs, 9) + " " +
          Ms(t.maxGapMs, 9) + (t.overdue ? " !" : "");
 }
 
-std::string TerminalView::PayloadText(const LiveRow& row, int room) const {
+std::string TerminalView::payloadText(const LiveRow& row, int room) const {
   const auto& payload = row.record.payload;
   const bool narrow = room < kMarkRoom + 2;  // not even one byte and the mark
   size_t shown = payload.size();
@@ -86,7 +86,7 @@ std::string TerminalView::PayloadText(const LiveRow& row, int room) const {
   return text;
 }
 
-std::string TerminalView::RowLine(const ShownRow& shown, int columns) const {
+std::string TerminalView::rowLine(const ShownRow& shown, int columns) const {
   const auto& r = shown.row->record;
   const Bus bus = shown.source->bus();
   std::string line;
@@ -98,8 +98,8 @@ std::string TerminalView::RowLine(const ShownRow& shown, int columns) const {
   }
   const std::string type = FrameTypeName(bus, r.type) + ((r.echo & 0x80) ? "*" : "");
   if (view_.timing) {
-    line += Columns(IdWidth(), IdentifierText(bus, r), type, std::to_string(r.payloadLength),
-                    std::to_string(r.count), TimingText(shown));
+    line += Columns(idWidth(), IdentifierText(bus, r), type, std::to_string(r.payloadLength),
+                    std::to_string(r.count), timingText(shown));
     return Fit(line, columns);
   }
   char periodText[48] = "-";
@@ -108,21 +108,21 @@ std::string TerminalView::RowLine(const ShownRow& shown, int columns) const {
   char periodColumn[64];
   std::snprintf(periodColumn, sizeof periodColumn, "%9s%c ", periodText,
                 shown.timing.overdue ? '!' : ' ');
-  line += Columns(IdWidth(), IdentifierText(bus, r), type, std::to_string(r.payloadLength),
+  line += Columns(idWidth(), IdentifierText(bus, r), type, std::to_string(r.payloadLength),
                   std::to_string(r.count), periodColumn);
   const int room = columns - 1 - static_cast<int>(line.size());
-  const std::string payload = PayloadText(*shown.row, room);
+  const std::string payload = payloadText(*shown.row, room);
   return room < kMarkRoom + 2 ? Fit(line + payload, columns) : line + payload;
 }
 
-std::string TerminalView::HeaderLine(int width) const {
+std::string TerminalView::headerLine(int width) const {
   std::string line = sources_.size() > 1 ? std::string("Interface ") : std::string();
   const std::string rest =
       view_.timing ? "  Mean ms Jitter ms    Min ms    Max ms" : " Period ms  Data";
-  return Fit(line + Columns(IdWidth(), "ID", "Type", "Len", "Count", rest), width);
+  return Fit(line + Columns(idWidth(), "ID", "Type", "Len", "Count", rest), width);
 }
 
-std::string TerminalView::TitleLine(size_t shown) const {
+std::string TerminalView::titleLine(size_t shown) const {
   size_t rows = 0;
   for (const SourceModel* source : sources_) rows += source->table().rows().size();
   std::string line = "kvmon  " + title_ + "   " + std::to_string(rows) + " identifiers";
@@ -132,7 +132,7 @@ std::string TerminalView::TitleLine(size_t shown) const {
   if (view_.sort != SortOrder::kIdentifier)
     line += std::string("   by ") + SortOrderName(view_.sort);
   if (transmit_) {
-    const auto sent = transmit_->source->EchoCount(transmit_->identifier, transmit_->type);
+    const auto sent = transmit_->source->echoCount(transmit_->identifier, transmit_->type);
     line += "   sending " + transmit_->text + ": " +
             (sent ? std::to_string(*sent) + " sent" : "no echo yet");
   }
@@ -140,7 +140,7 @@ std::string TerminalView::TitleLine(size_t shown) const {
   return line;
 }
 
-std::vector<std::string> TerminalView::StatisticsLines(int width) const {
+std::vector<std::string> TerminalView::statisticsLines(int width) const {
   std::vector<std::string> lines;
   for (const SourceModel* source : sources_) {
     const std::string prefix = sources_.size() > 1 ? source->interfaceName() + "  " : "";
@@ -166,28 +166,28 @@ std::vector<std::string> TerminalView::StatisticsLines(int width) const {
   return lines;
 }
 
-size_t TerminalView::RowRoom(TerminalSize size) const {
+size_t TerminalView::rowRoom(TerminalSize size) const {
   // Title, column names, two statistics lines per source, the notice line and one spare.
   const int around = 2 + 2 * static_cast<int>(sources_.size()) + 2;
   return static_cast<size_t>(std::max(size.rows - around, 1));
 }
 
-size_t TerminalView::LastScroll(size_t rows, TerminalSize size) const {
-  const size_t room = RowRoom(size);
+size_t TerminalView::lastScroll(size_t rows, TerminalSize size) const {
+  const size_t room = rowRoom(size);
   return rows > room ? rows - (room - 1) : 0;
 }
 
-std::vector<std::string> TerminalView::Lines(TerminalSize size) const {
+std::vector<std::string> TerminalView::lines(TerminalSize size) const {
   const auto rows = SelectRows(sources_, view_);
-  const auto statistics = StatisticsLines(size.columns);
+  const auto statistics = statisticsLines(size.columns);
   std::vector<std::string> lines;
-  lines.push_back(kBold + Fit(TitleLine(rows.size()), size.columns) + kReset);
-  lines.push_back(HeaderLine(size.columns));
-  const size_t room = RowRoom(size);
-  const size_t first = std::min(scroll_, LastScroll(rows.size(), size));
+  lines.push_back(kBold + Fit(titleLine(rows.size()), size.columns) + kReset);
+  lines.push_back(headerLine(size.columns));
+  const size_t room = rowRoom(size);
+  const size_t first = std::min(scroll_, lastScroll(rows.size(), size));
   const size_t shown = rows.size() - first <= room ? rows.size() - first : room - 1;
   if (first > 0) lines.back() += "   (" + std::to_string(first) + " above)";
-  for (size_t i = first; i < first + shown; ++i) lines.push_back(RowLine(rows[i], size.columns));
+  for (size_t i = first; i < first + shown; ++i) lines.push_back(rowLine(rows[i], size.columns));
   if (first + shown < rows.size())
     lines.push_back("... " + std::to_string(rows.size() - first - shown) + " more identifiers");
   if (rows.empty()) lines.push_back("waiting for the first identifier report");
@@ -196,25 +196,25 @@ std::vector<std::string> TerminalView::Lines(TerminalSize size) const {
   return lines;
 }
 
-void TerminalView::Draw(bool evenPaused) {
+void TerminalView::draw(bool evenPaused) {
   if (failed_ || (paused_ && !evenPaused)) return;
   std::string screen;
   if (!started_) screen = std::string(kHideCursor) + kClearScreen;
   started_ = true;
   screen += kHome;
-  const auto lines = Lines(size_ ? size_() : TerminalSize{});
-  for (size_t i = 0; i < lines.size(); ++i) {
-    screen += lines[i] + kClearLineEnd;
-    if (i + 1 < lines.size()) screen += '\n';
+  const auto shown = lines(size_ ? size_() : TerminalSize{});
+  for (size_t i = 0; i < shown.size(); ++i) {
+    screen += shown[i] + kClearLineEnd;
+    if (i + 1 < shown.size()) screen += '\n';
   }
   screen += kClearBelow;
   if (std::fwrite(screen.data(), 1, screen.size(), out_) != screen.size() || std::fflush(out_) != 0)
     failed_ = true;
 }
 
-KeyAction TerminalView::HandleKey(Key key) {
+KeyAction TerminalView::handleKey(Key key) {
   const TerminalSize size = size_ ? size_() : TerminalSize{};
-  const size_t page = std::max<size_t>(RowRoom(size) / 2, 1);
+  const size_t page = std::max<size_t>(rowRoom(size) / 2, 1);
   switch (key) {
     case Key::kQuit:
       return KeyAction::kQuit;
@@ -250,21 +250,21 @@ KeyAction TerminalView::HandleKey(Key key) {
       scroll_ = SIZE_MAX;
       break;
   }
-  scroll_ = std::min(scroll_, LastScroll(SelectRows(sources_, view_).size(), size));
-  Draw(true);  // a paused table shows that it is paused, and is scrolled as it stands
+  scroll_ = std::min(scroll_, lastScroll(SelectRows(sources_, view_).size(), size));
+  draw(true);  // a paused table shows that it is paused, and is scrolled as it stands
   return KeyAction::kNone;
 }
 
-void TerminalView::ShowRecords(const SourceModel&, size_t) { Draw(); }
+void TerminalView::showRecords(const SourceModel&, size_t) { draw(); }
 
-void TerminalView::ShowStatistics(const SourceModel&) { Draw(); }
+void TerminalView::showStatistics(const SourceModel&) { draw(); }
 
-void TerminalView::ShowNotice(const std::string& words) {
+void TerminalView::showNotice(const std::string& words) {
   notice_ = words;
-  Draw();
+  draw();
 }
 
-void TerminalView::Close() {
+void TerminalView::close() {
   if (!started_) return;
   std::fprintf(out_, "%s\n", kShowCursor);
   std::fflush(out_);

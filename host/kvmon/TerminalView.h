@@ -38,33 +38,33 @@ class TerminalView : public Display {
   TerminalView(std::vector<const SourceModel*> sources, std::string title, ViewOptions view,
                std::FILE* out, std::function<TerminalSize()> size);
 
-  void ShowRecords(const SourceModel& source, size_t firstRow) override;
-  void ShowStatistics(const SourceModel& source) override;
-  void ShowNotice(const std::string& words) override;
-  void Close() override;
+  void showRecords(const SourceModel& source, size_t firstRow) override;
+  void showStatistics(const SourceModel& source) override;
+  void showNotice(const std::string& words) override;
+  void close() override;
   bool failed() const override { return failed_; }
 
-  void SetTransmit(TransmitWatch watch) { transmit_ = std::move(watch); }
+  void setTransmit(TransmitWatch watch) { transmit_ = std::move(watch); }
   // Pause, sort, timing and scrolling are handled here (and redrawn); quit and clear are the
   // tool's.
-  KeyAction HandleKey(Key key);
+  KeyAction handleKey(Key key);
 
   // The screen's lines without escape sequences other than the highlighting, for `size`.
-  std::vector<std::string> Lines(TerminalSize size) const;
+  std::vector<std::string> lines(TerminalSize size) const;
 
  private:
   // Draws the screen; a paused view only when `evenPaused`.
-  void Draw(bool evenPaused = false);
-  size_t RowRoom(TerminalSize size) const;
+  void draw(bool evenPaused = false);
+  size_t rowRoom(TerminalSize size) const;
   // The largest scroll that still fills the rows' room.
-  size_t LastScroll(size_t rows, TerminalSize size) const;
-  std::string TitleLine(size_t shown) const;
-  std::string HeaderLine(int width) const;
-  std::string RowLine(const ShownRow& row, int columns) const;
-  std::string PayloadText(const LiveRow& row, int room) const;
-  std::string TimingText(const ShownRow& row) const;
-  std::vector<std::string> StatisticsLines(int width) const;
-  int IdWidth() const;
+  size_t lastScroll(size_t rows, TerminalSize size) const;
+  std::string titleLine(size_t shown) const;
+  std::string headerLine(int width) const;
+  std::string rowLine(const ShownRow& row, int columns) const;
+  std::string payloadText(const LiveRow& row, int room) const;
+  std::string timingText(const ShownRow& row) const;
+  std::vector<std::string> statisticsLines(int width) const;
+  int idWidth() const;
 
   std::vector<const SourceModel*> sources_;
   std::string title_;

@@ -25,26 +25,26 @@ uint64_t HostNow() {
   return kUnixEpochIn1601Units + static_cast<uint64_t>(micros) * 10;
 }
 
-void TimingTracker::Sample(Row& row, double gapMs) {
+void TimingTracker::sample(Row& row, double gapMs) {
   ++row.samples;
   row.sum += gapMs;
   row.sumOfSquares += gapMs * gapMs;
-  Bound(row, gapMs);
+  bound(row, gapMs);
 }
 
-void TimingTracker::Bound(Row& row, double gapMs) {
+void TimingTracker::bound(Row& row, double gapMs) {
   row.minGap = row.minGap ? std::min(*row.minGap, gapMs) : gapMs;
   row.maxGap = row.maxGap ? std::max(*row.maxGap, gapMs) : gapMs;
 }
 
-void TimingTracker::Take(Row& row, const kvhost::IdentifierRecord& r, bool fresh) {
+void TimingTracker::take(Row& row, const kvhost::IdentifierRecord& r, bool fresh) {
   const bool newFrames = fresh || (r.count > row.lastCount && r.lastTimestamp > row.lastStamp);
   if (!newFrames) return;
   // The gap between the last two frames is new whenever the last frame is.
   if (r.count >= 2 && r.lastTimestamp >= r.previousTimestamp)
-    Sample(row, Ms(r.lastTimestamp - r.previousTimestamp));
+    sample(row, Ms(r.lastTimestamp - r.previousTimestamp));
   // Between two reports: the mean of the gaps in between, which lies between their extremes.
-  if (!fresh) Bound(row, Ms(r.lastTimestamp - row.lastStamp) / (r.count - row.lastCount));
+  if (!fresh) bound(row, Ms(r.lastTimestamp - row.lastStamp) / (r.count - row.lastCount));
   if (fresh) {
     row.firstCount = r.count;
     row.firstStamp = r.lastTimestamp;
@@ -53,7 +53,7 @@ void TimingTracker::Take(Row& row, const kvhost::IdentifierRecord& r, bool fresh
   row.lastStamp = r.lastTimestamp;
 }
 
-void TimingTracker::Update(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
+void TimingTracker::update(Bus bus, const std::vector<kvhost::IdentifierRecord>& records,
                            uint64_t receivedAt) {
   uint64_t newest = 0;
   for (const auto& record : records) {
@@ -61,7 +61,7 @@ void TimingTracker::Update(Bus bus, const std::vector<kvhost::IdentifierRecord>&
     auto found = rows_.find(key);
     const bool fresh = found == rows_.end() || record.count < found->second.lastCount;
     if (fresh) found = rows_.insert_or_assign(key, Row{}).first;
-    Take(found->second, record, fresh);
+    take(found->second, record, fresh);
     newest = std::max(newest, record.lastTimestamp);
   }
   if (newest == 0) return;
@@ -72,7 +72,7 @@ void TimingTracker::Update(Bus bus, const std::vector<kvhost::IdentifierRecord>&
   reportTime_ = std::max({reportTime_, newest, byHostClock});
 }
 
-Timing TimingTracker::Of(Bus bus, const kvhost::IdentifierRecord& record) const {
+Timing TimingTracker::of(Bus bus, const kvhost::IdentifierRecord& record) const {
   Timing timing;
   const auto found = rows_.find(KeyOf(bus, record));
   if (found == rows_.end()) return timing;
@@ -94,7 +94,7 @@ Timing TimingTracker::Of(Bus bus, const kvhost::IdentifierRecord& record) const 
   return timing;
 }
 
-void TimingTracker::Clear() {
+void TimingTracker::clear() {
   rows_.clear();
   busAhead_.reset();
   reportTime_ = 0;

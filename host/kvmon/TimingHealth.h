@@ -32,15 +32,15 @@ class TimingTracker {
 
   // One report's records, received at host time `receivedAt`. An identifier whose count went
   // down (a reset on the controller) starts again.
-  void Update(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, uint64_t receivedAt);
+  void update(Bus bus, const std::vector<kvhost::IdentifierRecord>& records, uint64_t receivedAt);
   // The health of `record`'s row as of the last report.
-  Timing Of(Bus bus, const kvhost::IdentifierRecord& record) const;
+  Timing of(Bus bus, const kvhost::IdentifierRecord& record) const;
   // The bus time of the last report: its newest time stamp, or later when the host clock says so
   // by more than half a second (carried on from the report that was least behind it), so that a
   // bus that falls silent while the controller goes on reporting still ages. 0 before the first
   // report.
-  uint64_t ReportTime() const { return reportTime_; }
-  void Clear();
+  uint64_t reportTime() const { return reportTime_; }
+  void clear();
 
  private:
   struct Row {
@@ -50,9 +50,9 @@ class TimingTracker {
     double sum = 0, sumOfSquares = 0;  // of the sampled gaps, in ms
     std::optional<double> minGap, maxGap;
   };
-  void Take(Row& row, const kvhost::IdentifierRecord& record, bool fresh);
-  static void Sample(Row& row, double gapMs);
-  static void Bound(Row& row, double gapMs);
+  void take(Row& row, const kvhost::IdentifierRecord& record, bool fresh);
+  static void sample(Row& row, double gapMs);
+  static void bound(Row& row, double gapMs);
 
   double overdueFactor_;
   std::map<RowKey, Row> rows_;

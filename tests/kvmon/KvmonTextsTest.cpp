@@ -62,14 +62,14 @@ kvhost::IdentifierRecord Record(uint32_t id, std::vector<uint8_t> payload, uint3
 
 TEST(KvmonLiveTable, ChangedBytesAreMarkedAgainstThePreviousReportOfTheSameRow) {
   LiveTable table(Bus::kCan);
-  table.Update({Record(0x100, {1, 2, 3}), Record(0x200, {9})});
+  table.update({Record(0x100, {1, 2, 3}), Record(0x200, {9})});
   ASSERT_EQ(table.rows().size(), 2u);
   EXPECT_TRUE(table.rows()[0].fresh);
   EXPECT_EQ(table.rows()[0].changed, (std::vector<bool>{false, false, false}));
 
   auto remote = Record(0x100, {});
   remote.type = 1;  // a remote frame of the same identifier is a row of its own
-  table.Update({Record(0x100, {1, 7, 3, 4}), remote, Record(0x200, {9})});
+  table.update({Record(0x100, {1, 7, 3, 4}), remote, Record(0x200, {9})});
   ASSERT_EQ(table.rows().size(), 3u);
   EXPECT_FALSE(table.rows()[0].fresh);
   EXPECT_EQ(table.rows()[0].changed, (std::vector<bool>{false, true, false, true}));
@@ -80,19 +80,19 @@ TEST(KvmonLiveTable, ChangedBytesAreMarkedAgainstThePreviousReportOfTheSameRow) 
 TEST(KvmonLiveTable, AFullMessageIsContinuedByTheNextInIdentifierOrder) {
   constexpr size_t kFullMessageBytes = 100000;
   LiveTable table(Bus::kCan);
-  table.Update({Record(0x100, {1}), Record(0x200, {2})}, kFullMessageBytes);
-  table.Update({Record(0x300, {3})}, 40);  // the rest of the same report
+  table.update({Record(0x100, {1}), Record(0x200, {2})}, kFullMessageBytes);
+  table.update({Record(0x300, {3})}, 40);  // the rest of the same report
   ASSERT_EQ(table.rows().size(), 3u);
   EXPECT_EQ(table.rows()[2].record.identifier, 0x300u);
 
-  table.Update({Record(0x100, {9}), Record(0x200, {2})}, kFullMessageBytes);  // the next report
-  table.Update({Record(0x300, {4})}, 40);
+  table.update({Record(0x100, {9}), Record(0x200, {2})}, kFullMessageBytes);  // the next report
+  table.update({Record(0x300, {4})}, 40);
   ASSERT_EQ(table.rows().size(), 3u);
   EXPECT_EQ(table.rows()[0].changed, (std::vector<bool>{true}));
   EXPECT_EQ(table.rows()[2].changed, (std::vector<bool>{true}));
 
-  table.Update({Record(0x100, {9})}, 40);  // after a short message every message is a new report
-  table.Update({Record(0x300, {4})}, 40);
+  table.update({Record(0x100, {9})}, 40);  // after a short message every message is a new report
+  table.update({Record(0x300, {4})}, 40);
   ASSERT_EQ(table.rows().size(), 1u);
   EXPECT_EQ(table.rows()[0].record.identifier, 0x300u);
 }
@@ -117,9 +117,9 @@ TEST(KvmonTerminalView, LongPayloadsAreCutToTheWindowWithTheCountOfHiddenBytes) 
   TerminalView view({&can5}, "CAN5 on test", ViewOptions{}, screen, nullptr);
   std::vector<uint8_t> ramp(64);
   for (size_t i = 0; i < ramp.size(); ++i) ramp[i] = static_cast<uint8_t>(i);
-  view.ShowRecords(can5, can5.TakeRecords({Record(0x200, ramp, 2)}, 0, 0));
+  view.showRecords(can5, can5.takeRecords({Record(0x200, ramp, 2)}, 0, 0));
   for (const int columns : {40, 60, 80, 96, 132, 240}) {
-    const auto lines = view.Lines(TerminalSize{columns, 24});
+    const auto lines = view.lines(TerminalSize{columns, 24});
     for (const auto& line : lines)
       EXPECT_LT(Visible(line).size(), static_cast<size_t>(columns)) << Visible(line);
     const std::string row = Visible(lines[2]);
@@ -128,7 +128,7 @@ TEST(KvmonTerminalView, LongPayloadsAreCutToTheWindowWithTheCountOfHiddenBytes) 
       EXPECT_NE(row.find(" +"), std::string::npos) << row;
     }
   }
-  const std::string whole = Visible(view.Lines(TerminalSize{240, 24})[2]);
+  const std::string whole = Visible(view.lines(TerminalSize{240, 24})[2]);
   EXPECT_NE(whole.find("3D 3E 3F"), std::string::npos) << whole;
   std::fclose(screen);
 }
@@ -183,11 +183,11 @@ TEST(KvmonLines, RecordLinesCarryIdentifierTypePayloadCountAndPeriod) {
       116444736000000000ULL + 10'000'000ULL * 5 + 1234567;          // 1970 + 5.1234567 s
   extended.previousTimestamp = extended.lastTimestamp - 1'000'000;  // 100 ms before
   SourceModel can1("CAN1", Bus::kCan, 3.0);
-  can1.TakeRecords({extended}, 0, extended.lastTimestamp);
+  can1.takeRecords({extended}, 0, extended.lastTimestamp);
   const ShownRow row{&can1, &can1.table().rows()[0], Timing{}};
-  EXPECT_EQ(PlainLines::RecordLine(row, false),
+  EXPECT_EQ(PlainLines::recordLine(row, false),
             "5.123456 CAN1 18FEF100 data [2] 00 11 count=7 period=100.000ms");
-  EXPECT_EQ(JsonLines::RecordObject(row),
+  EXPECT_EQ(JsonLines::recordObject(row),
             "{\"kind\":\"record\",\"timestamp\":5.123456,\"interface\":\"CAN1\",\"bus\":\"CAN\","
             "\"id\":419361024,\"id_text\":\"18FEF100\",\"extended\":true,\"type\":\"data\","
             "\"type_code\":0,\"length\":2,\"data\":\"0011\",\"count\":7,\"period_ms\":100.0000,"
@@ -199,11 +199,11 @@ TEST(KvmonLines, RecordLinesCarryIdentifierTypePayloadCountAndPeriod) {
   slot.channel = 1;
   slot.cycle = 5;
   SourceModel flexRay("Fr\"1", Bus::kFlexRay, 3.0);
-  flexRay.TakeRecords({slot}, 0, 0);
+  flexRay.takeRecords({slot}, 0, 0);
   const ShownRow slotRow{&flexRay, &flexRay.table().rows()[0], Timing{}};
-  EXPECT_EQ(PlainLines::RecordLine(slotRow, false),
+  EXPECT_EQ(PlainLines::recordLine(slotRow, false),
             "0.000000 Fr\"1 slot 40 B data [1] 40 count=1 cycle=5");
-  const std::string object = JsonLines::RecordObject(slotRow);
+  const std::string object = JsonLines::recordObject(slotRow);
   EXPECT_NE(object.find("\"interface\":\"Fr\\\"1\""), std::string::npos) << object;
   EXPECT_NE(object.find("\"id\":40,\"id_text\":\"slot 40 B\""), std::string::npos) << object;
   EXPECT_NE(object.find("\"period_ms\":null"), std::string::npos) << object;

@@ -66,15 +66,15 @@ TEST(KvmonRowFilter, TermsAreReadByTheBusOfTheRow) {
   };
   for (const auto& c : cases) {
     std::string error;
-    const auto filter = RowFilter::Parse(c.filter, error);
+    const auto filter = RowFilter::parse(c.filter, error);
     ASSERT_TRUE(filter) << c.filter << ": " << error;
-    EXPECT_EQ(filter->Accepts(c.bus, Frame(c.identifier, 1, 0, 0, c.channel)), c.shown)
+    EXPECT_EQ(filter->accepts(c.bus, Frame(c.identifier, 1, 0, 0, c.channel)), c.shown)
         << c.filter << " on " << BusName(c.bus) << " " << std::hex << c.identifier;
   }
   // Neither a hex identifier nor a decimal slot.
   for (const char* bad : {"", "100,", "G1", "100:", "123456789", "~", "40G", "1:2:3", "20000000"}) {
     std::string error;
-    EXPECT_FALSE(RowFilter::Parse(bad, error)) << bad;
+    EXPECT_FALSE(RowFilter::parse(bad, error)) << bad;
     EXPECT_FALSE(error.empty()) << bad;
   }
 }
@@ -141,10 +141,10 @@ TEST(KvmonTimingHealth, GapsMeanJitterAndOverdueFollowTheReports) {
         records.push_back(Frame(0x200, 1, kT0 + c.busyUntilMs * kMs, kT0 + c.busyUntilMs * kMs));
       const uint64_t received =
           r.receivedMs != 0 ? r.receivedMs : std::max(r.lastMs, c.busyUntilMs);
-      tracker.Update(Bus::kCan, records, kT0 + (last ? received : r.lastMs) * kMs);
+      tracker.update(Bus::kCan, records, kT0 + (last ? received : r.lastMs) * kMs);
     }
     const auto& last = c.reports.back();
-    const Timing t = tracker.Of(Bus::kCan, Frame(0x100, last.count, kT0 + last.lastMs * kMs, 0));
+    const Timing t = tracker.of(Bus::kCan, Frame(0x100, last.count, kT0 + last.lastMs * kMs, 0));
     const Expected& e = c.expected;
     EXPECT_EQ(t.meanMs.has_value(), e.mean.has_value()) << c.name;
     EXPECT_NEAR(t.meanMs.value_or(0), e.mean.value_or(0), 1e-9) << c.name;
@@ -161,11 +161,11 @@ TEST(KvmonTimingHealth, ReportTimeGoesOnWithTheHostClockWhenTheBusFallsSilent) {
   // The controller's clock is 5 s ahead of the host's; the first report reaches the host at once.
   constexpr uint64_t kAhead = 5000 * kMs;
   const auto row = Frame(0x100, 100, kT0 + 1000 * kMs, kT0 + 990 * kMs);
-  tracker.Update(Bus::kCan, {row}, kT0 + 1000 * kMs - kAhead);
-  EXPECT_EQ(tracker.ReportTime(), kT0 + 1000 * kMs);
-  tracker.Update(Bus::kCan, {row}, kT0 + 2000 * kMs - kAhead);  // the same row a second later
-  EXPECT_EQ(tracker.ReportTime(), kT0 + 1500 * kMs);            // half a second of slack
-  EXPECT_TRUE(tracker.Of(Bus::kCan, row).overdue);
+  tracker.update(Bus::kCan, {row}, kT0 + 1000 * kMs - kAhead);
+  EXPECT_EQ(tracker.reportTime(), kT0 + 1000 * kMs);
+  tracker.update(Bus::kCan, {row}, kT0 + 2000 * kMs - kAhead);  // the same row a second later
+  EXPECT_EQ(tracker.reportTime(), kT0 + 1500 * kMs);            // half a second of slack
+  EXPECT_TRUE(tracker.of(Bus::kCan, row).overdue);
 }
 
 TEST(KvmonKeys, TerminalBytesBecomeKeys) {
@@ -191,10 +191,10 @@ std::vector<uint32_t> Shown(const SourceModel& source, const ViewOptions& view) 
 TEST(KvmonRowSelection, ChangedOnlyAgeAndSortOrderPickTheRows) {
   SourceModel can("CAN1", Bus::kCan, 3.0);
   const uint64_t now = kT0 + 2000 * kMs;
-  can.TakeRecords({Frame(0x100, 100, kT0 + 1000 * kMs, kT0 + 990 * kMs, 0, {1}),
+  can.takeRecords({Frame(0x100, 100, kT0 + 1000 * kMs, kT0 + 990 * kMs, 0, {1}),
                    Frame(0x200, 5, kT0 + 1000 * kMs, kT0 + 800 * kMs, 0, {2})},
                   0, kT0 + 1000 * kMs);
-  can.TakeRecords({Frame(0x100, 200, now, now - 10 * kMs, 0, {9}),
+  can.takeRecords({Frame(0x100, 200, now, now - 10 * kMs, 0, {9}),
                    Frame(0x200, 5, kT0 + 1000 * kMs, kT0 + 800 * kMs, 0, {2}),
                    Frame(0x300, 900, now - 1 * kMs, now - 2 * kMs, 0, {3})},
                   0, now);
