@@ -4,6 +4,8 @@
 #include <poll.h>
 
 #include <chrono>
+#include <cstdlib>
+#include <string_view>
 
 #include "host/kvmon/PlainWords.h"
 #include "host/kvmon/SessionSetup.h"
@@ -13,8 +15,26 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 constexpr int kLoopSliceMs = 200;
+constexpr uint32_t kDefaultTableCapacity = 1000;  // the controller's SET_PROP_DATA_LOG_IDS_MAX
+constexpr std::string_view kTableSize = "SET_PROP_DATA_LOG_IDS_MAX=";
+
+std::string TableFullText(uint32_t capacity) {
+  return "identifier table full (" + std::to_string(capacity) +
+         "): new identifiers are counted in the statistics but not listed; --table-size raises "
+         "it (up to 65535)";
+}
 
 }  // namespace
+
+uint32_t AskedTableCapacity(const Options& options) {
+  uint32_t capacity = kDefaultTableCapacity;
+  for (const auto& property : options.properties) {
+    if (property.starts_with(kTableSize))
+      capacity =
+          static_cast<uint32_t>(std::strtoul(property.c_str() + kTableSize.size(), nullptr, 10));
+  }
+  return capacity;
+}
 
 WatchedSession::WatchedSession(std::string name, ControllerLink connection, double overdueFactor)
     : interfaceName(std::move(name)),
@@ -65,9 +85,26 @@ void SessionGroup::handleRecords(WatchedSession& session, const kvhost::HostMess
   display_->showRecords(session.model, first);
 }
 
+void SessionGroup::notice(const WatchedSession& session, const std::string& words) {
+  display_->showNotice(sessions_.size() > 1 ? session.interfaceName + ": " + words : words);
+}
+
+// Statistics carry the table's size; a record message reaches the capacity only when it holds the
+// whole table. Said once each time the table fills.
+void SessionGroup::watchTableSize(WatchedSession& session,
+                                  const kvhost::MessageHeaderView& header) {
+  const bool full = header.idCount >= tableCapacity_;
+  if (full && !session.tableFull) notice(session, TableFullText(tableCapacity_));
+  session.tableFull = full;
+}
+
 void SessionGroup::handle(WatchedSession& session, const kvhost::HostMessage& message) {
-  if (BusOfRecordType(message.header.type)) return handleRecords(session, message);
+  if (BusOfRecordType(message.header.type)) {
+    watchTableSize(session, message.header);
+    return handleRecords(session, message);
+  }
   if (message.header.type == kvhost::kStatistics) {
+    watchTableSize(session, message.header);
     if (const auto report = DecodeBusReport(message.payload)) {
       session.model.takeStatistics(*report);
       display_->showStatistics(session.model);
@@ -77,8 +114,7 @@ void SessionGroup::handle(WatchedSession& session, const kvhost::HostMessage& me
     }
   } else if (message.header.type == kvhost::kErrorText) {
     session.lastError = ExplainError(message.text(), session.interfaceName);
-    display_->showNotice(sessions_.size() > 1 ? session.interfaceName + ": " + session.lastError
-                                              : session.lastError);
+    notice(session, session.lastError);
   }
 }
 
@@ -121,6 +157,8 @@ bool SessionGroup::receiveAll(std::string& error) {
     }
     while (auto message = session->link.Receive(std::chrono::milliseconds(0)))
       handle(*session, *message);
+    if (const uint32_t skipped = session->link.TakeSkipped())
+      notice(*session, "host too slow: " + std::to_string(skipped) + " reports skipped");
     if (session->link.closed()) {
       error =
           session->lastError.empty() ? "the controller ended the connection" : session->lastError;

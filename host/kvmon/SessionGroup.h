@@ -16,6 +16,10 @@
 
 namespace kvmon {
 
+// The capacity of the identifier table that kvmon asks for (--table-size), else the controller's
+// default.
+uint32_t AskedTableCapacity(const Options& options);
+
 // One interface's connection, session and model.
 struct WatchedSession {
   WatchedSession(std::string interfaceName, ControllerLink link, double overdueFactor);
@@ -23,7 +27,8 @@ struct WatchedSession {
   std::string interfaceName;
   ControllerLink link;
   SourceModel model;
-  std::string lastError;  // the last error text of the controller, in plain words
+  std::string lastError;   // the last error text of the controller, in plain words
+  bool tableFull = false;  // the identifier table reached the capacity kvmon asked for
 };
 
 // Used by the tool's one thread.
@@ -49,6 +54,8 @@ class SessionGroup {
  private:
   void handle(WatchedSession& session, const kvhost::HostMessage& message);
   void handleRecords(WatchedSession& session, const kvhost::HostMessage& message);
+  void watchTableSize(WatchedSession& session, const kvhost::MessageHeaderView& header);
+  void notice(const WatchedSession& session, const std::string& words);
   MessageSink sinkOf(WatchedSession& session);
   bool limitReached(std::chrono::steady_clock::time_point start) const;
   bool receiveAll(std::string& error);
@@ -57,6 +64,7 @@ class SessionGroup {
   void waitForInput(const TerminalKeys* keys) const;
 
   const Options& options_;
+  const uint32_t tableCapacity_ = AskedTableCapacity(options_);
   Display* display_ = nullptr;
   std::vector<std::unique_ptr<WatchedSession>> sessions_;
   bool quit_ = false;
