@@ -1,4 +1,5 @@
-// The test-control interface: injected statuses and the recorded call sequence.
+// The test-control interface: injected statuses and resets (recording is used by every over-TCP
+// test).
 #include <gtest/gtest.h>
 
 #include "driver/Properties.h"
@@ -33,32 +34,6 @@ TEST_F(ControlTest, AlwaysFaultStaysUntilCleared) {
     EXPECT_EQ(kxReadFrame(s, buffer, sizeof buffer, 0.0, &bytes), kInjected);
   ClearInjections();
   EXPECT_NE(kxReadFrame(s, buffer, sizeof buffer, 0.0, &bytes), kInjected);
-}
-
-TEST_F(ControlTest, RecordingKeepsOperationsArgumentsAndResults) {
-  StartRecording();
-  const kxRef s = Open(driver::kDatabaseCan, "CAN1@qv_corle_tarvix");
-  ASSERT_EQ(kxStop(s, driver::kScopeInterfaceOnly), 0);
-  ASSERT_EQ(Set<uint64_t>(s, driver::kPropBaudRate, 500000), 0);
-  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
-  EXPECT_EQ(Set<uint32_t>(s, 0x12345678, 1), driver::kUnknownProperty);
-  StopRecording();
-  EXPECT_EQ(kxClear(s), 0);
-  const auto calls = RecordedCalls();
-  ASSERT_EQ(calls.size(), 5u) << "the clear came after recording stopped";
-  EXPECT_EQ(calls[0].operation, "kxCreateSession");
-  EXPECT_EQ(calls[0].texts, (std::vector<std::string>{":can:", "", "", "CAN1@qv_corle_tarvix"}));
-  EXPECT_EQ(calls[0].id, driver::kModeReceiveStream);
-  EXPECT_EQ(calls[0].result, s);
-  EXPECT_EQ(calls[0].interfaceName, "CAN1");
-  EXPECT_EQ(calls[1].operation, "kxStop");
-  EXPECT_EQ(calls[1].id, driver::kScopeInterfaceOnly);
-  EXPECT_EQ(calls[2].id, driver::kPropBaudRate);
-  EXPECT_EQ(calls[2].size, 8u);
-  EXPECT_EQ(calls[2].reference, s);
-  EXPECT_EQ(calls[3].value, (std::vector<uint8_t>{1, 0}));
-  EXPECT_EQ(calls[4].status, driver::kUnknownProperty);
-  EXPECT_EQ(calls[4].interfaceName, "CAN1");
 }
 
 TEST_F(ControlTest, ResetClosesSessionsAndRestoresDefaults) {

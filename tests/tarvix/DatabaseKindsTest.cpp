@@ -127,28 +127,6 @@ TEST_F(DatabaseKindsTest, SameNameOpenedTwiceStaysUntilTheLastClose) {
 
 using HardwareListingTest = TarvixTest;
 
-TEST_F(HardwareListingTest, DefaultHardwareListsTenInterfacesInDeviceOrderWithDefaultVersions) {
-  const std::vector<Listed> expected = {
-      {"CAN1", 1, 0, 0},     {"CAN2", 2, 0, 0},     {"CAN3", 3, 0, 1}, {"CAN4", 4, 0, 1},
-      {"CAN5", 5, 0, 1},     {"CAN6", 6, 0, 1},     {"LIN1", 1, 2, 0}, {"LIN2", 2, 2, 0},
-      {"FlexRay1", 1, 1, 0}, {"FlexRay2", 2, 1, 0},
-  };
-  const std::vector<Listed> got = ListInterfaces();
-  ASSERT_EQ(got.size(), expected.size());
-  for (size_t i = 0; i < got.size(); ++i) {
-    EXPECT_EQ(got[i].name, expected[i].name);
-    EXPECT_EQ(std::tie(got[i].port, got[i].protocol, got[i].canFd),
-              std::tie(expected[i].port, expected[i].protocol, expected[i].canFd))
-        << got[i].name;
-  }
-  const std::pair<uint32_t, uint32_t> versions[] = {{driver::kPropSystemVersionMajor, 21},
-                                                    {driver::kPropSystemVersionMinor, 5},
-                                                    {driver::kPropSystemVersionUpdate, 0},
-                                                    {driver::kPropSystemVersionPhase, 3},
-                                                    {driver::kPropSystemVersionPacked, 0x15503000}};
-  for (const auto& [id, value] : versions) EXPECT_EQ(SystemValue(id), value) << std::hex << id;
-}
-
 TEST_F(HardwareListingTest, ListReadsCheckRoomReferencesAndTerminators) {
   kxRef system = 0;
   ASSERT_EQ(kxSystemOpen(&system), 0);

@@ -1,5 +1,5 @@
-// Receive sessions on CAN buses: default traffic, frame layout, time stamps, bus time, arbitration,
-// wrong bit rate, read time-out, the bounded queue, and poll threads sharing the driver.
+// Receive sessions as only the driver shows them (what a host sees is tested over TCP): time
+// stamps, bus time, arbitration, undecodable frames, reads, the bounded queue, shared poll threads.
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -26,28 +26,6 @@ uint64_t NowAsFileTime() {
   return kUnixEpochAsFileTime + static_cast<uint64_t>(ns / 100);
 }
 
-TEST_F(ReceiveSessionTest, SubordinateSessionSeesTheBodyBusTraffic) {
-  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN2@qv_corle_tarvix");
-  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
-  const auto frames = ReadUntil(s, [](const auto& f) {
-    return CountId(f, 0, driver::kFrameCanBusError) >= 1 && CountId(f, 0x100, 0) >= 3;
-  });
-  ASSERT_GE(CountId(frames, 0x100, 0), 3u);
-  ASSERT_GE(CountId(frames, 0, driver::kFrameCanBusError), 1u);
-  EXPECT_EQ(First(frames, 0x1A0, 0).payload, (std::vector<uint8_t>{0xAA, 0xBB, 0xCC}));
-  EXPECT_EQ(First(frames, 0x321, driver::kFrameCanRemote).length, 0u);
-  EXPECT_EQ(First(frames, 0x18FEF100 | kExtendedIdFlag, 0).payload,
-            (std::vector<uint8_t>{0x00, 0x11, 0x22, 0x33, 0x44, 0x55, 0x66, 0x77}));
-  std::vector<uint8_t> counters;
-  for (const Frame& f : frames) {
-    if (f.identifier != 0x100) continue;
-    EXPECT_EQ(std::vector<uint8_t>(f.payload.begin() + 1, f.payload.end()),
-              (std::vector<uint8_t>{1, 2, 3, 4, 5, 6, 7}));
-    counters.push_back(f.payload[0]);
-  }
-  for (size_t i = 1; i < counters.size(); ++i) EXPECT_EQ(uint8_t(counters[i - 1] + 1), counters[i]);
-}
-
 TEST_F(ReceiveSessionTest, TimeStampsAreWallClockTimesInOrder) {
   const uint64_t before = NowAsFileTime();
   const kxRef s = Open(driver::kDatabaseSubordinate, "CAN1");
@@ -65,7 +43,7 @@ TEST_F(ReceiveSessionTest, TimeStampsAreWallClockTimesInOrder) {
   }
 }
 
-TEST_F(ReceiveSessionTest, ReadWithZeroTimeoutOnQuietBusReturnsAtOnce) {
+TEST_F(ReceiveSessionTest, ReadsOnAQuietBusReturnAtOnceAndBadArgumentsAreRefused) {
   const kxRef s = Open(driver::kDatabaseSubordinate, "CAN3");
   uint8_t buffer[64];
   uint32_t bytes = 99;
@@ -74,6 +52,11 @@ TEST_F(ReceiveSessionTest, ReadWithZeroTimeoutOnQuietBusReturnsAtOnce) {
   EXPECT_EQ(kxReadFrame(s, buffer, sizeof buffer, 0.01, &bytes), driver::kReadTimeout);
   EXPECT_EQ(kxReadFrame(s, nullptr, sizeof buffer, 0.0, &bytes), driver::kBufferMissing);
   EXPECT_EQ(kxReadFrame(0x04FFFFFF, buffer, sizeof buffer, 0.0, &bytes), driver::kInvalidReference);
+  uint64_t state = 0;
+  uint32_t fault = 0;
+  const kxRef lin = Open(driver::kDatabaseSubordinate, "LIN1");
+  EXPECT_EQ(kxReadState(lin, driver::kStateLin, 4, &state, &fault), driver::kWrongStateSize);
+  EXPECT_EQ(kxReadState(lin, driver::kStateCan, 4, &state, &fault), driver::kUnknownState);
 }
 
 TEST_F(ReceiveSessionTest, SmallBufferGetsWholeFramesOnly) {
@@ -93,22 +76,6 @@ TEST_F(ReceiveSessionTest, SmallBufferGetsWholeFramesOnly) {
   }
   EXPECT_EQ(st, driver::kBufferTooSmall);
   EXPECT_EQ(bytes, 0u);
-}
-
-TEST_F(ReceiveSessionTest, FdBusCarriesItsFourFrames) {
-  const kxRef s = Open(driver::kDatabaseSubordinate, "CAN6");
-  const auto frames = ReadUntil(s, [](const auto& f) { return CountId(f, 0x080, 0) >= 2; });
-  const Frame brs = First(frames, 0x200, driver::kFrameCanFdBrsData);
-  ASSERT_EQ(brs.length, 64u);
-  for (uint32_t i = 0; i < 64; ++i) EXPECT_EQ(brs.payload[i], i);
-  const Frame fd = First(frames, 0x201, driver::kFrameCanFdData);
-  ASSERT_EQ(fd.length, 12u);
-  EXPECT_EQ(fd.payload[0], 0xA0);
-  EXPECT_EQ(fd.payload[11], 0xAB);
-  const Frame ext = First(frames, 0x1ABCDE00 | kExtendedIdFlag, driver::kFrameCanFdBrsData);
-  ASSERT_EQ(ext.length, 16u);
-  EXPECT_EQ(ext.payload[15], 0xFF);
-  EXPECT_EQ(First(frames, 0x080, 0).length, 8u);
 }
 
 TEST_F(ReceiveSessionTest, SaturatedBusCarriesWhatBitLengthsAllowAndNoMore) {
@@ -151,27 +118,22 @@ TEST_F(ReceiveSessionTest, CompetingFramesGoOutByIdentifierPriority) {
   EXPECT_EQ(frames[start + 4].identifier, 0x1FFFFFFF | kExtendedIdFlag);
 }
 
-TEST_F(ReceiveSessionTest, SessionsThatCannotDecodeTheBusSeeBusErrorFrames) {
+// A host sees the wrong bit rate over TCP; the receive error counter and a classic session on an FD
+// bus are seen only here.
+TEST_F(ReceiveSessionTest, SessionsThatCannotDecodeTheBusCountErrorsAndSeeErrorFrames) {
   const kxRef s = Open(driver::kDatabaseCan, "CAN1");
   ASSERT_EQ(kxStop(s, driver::kScopeInterfaceOnly), 0);
   ASSERT_EQ(Set<uint64_t>(s, driver::kPropBaudRate, 250000), 0);
   ASSERT_EQ(kxStart(s, driver::kScopeNormal), 0);
-  const kxRef classic = Open(driver::kDatabaseCan, "CAN5");
-  for (const kxRef r : {s, classic})
-    ASSERT_EQ(kxSetProperty(r, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
-  const auto frames = ReadUntil(s, [](const auto& f) { return f.size() >= 20; });
-  ASSERT_GE(frames.size(), 20u);
-  for (const Frame& f : frames) {
-    EXPECT_EQ(std::tie(f.type, f.identifier, f.length),
-              std::make_tuple(driver::kFrameCanBusError, 0u, 0u))
-        << "wrong bit rate";
-  }
+  ASSERT_EQ(kxSetProperty(s, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
+  ASSERT_FALSE(ReadUntil(s, [](const auto& f) { return !f.empty(); }).empty());
   uint32_t state = 0;
   uint32_t fault = 1;
   ASSERT_EQ(kxReadState(s, driver::kStateCan, 4, &state, &fault), 0);
   EXPECT_GT(state >> 24, 0u) << "receive errors are counted";
   EXPECT_EQ(fault, 0u);
-  // A classic session on an FD bus sees the FD frames as errors.
+  const kxRef classic = Open(driver::kDatabaseCan, "CAN5");
+  ASSERT_EQ(kxSetProperty(classic, driver::kPropBusErrorFrames, 2, kErrorsOn), 0);
   const auto mixed = ReadUntil(classic, [](const auto& f) { return CountId(f, 0x080, 0) >= 2; });
   EXPECT_EQ(CountId(mixed, 0x200, driver::kFrameCanFdBrsData), 0u);
   EXPECT_GT(CountId(mixed, 0, driver::kFrameCanBusError), 0u);
@@ -225,9 +187,10 @@ TEST_F(ReceiveSessionTest, PollThreadsAndAServiceThreadShareTheDriver) {
     });
   }
   // Meanwhile the service thread lists the hardware and opens and closes sessions.
+  // EXPECT only: an ASSERT here would return while the pollers still run.
   while (finished.load() < 4) {
     kxRef system = 0;
-    ASSERT_EQ(kxSystemOpen(&system), 0);
+    EXPECT_EQ(kxSystemOpen(&system), 0);
     uint32_t devices[64] = {};
     EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, devices), 0);
     EXPECT_EQ(kxSystemClose(system), 0);
