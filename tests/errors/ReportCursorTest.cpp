@@ -31,13 +31,6 @@ INSTANTIATE_TEST_SUITE_P(
                       Escape{"\x7f", "\\u007f"}, Escape{"\xc3\xa9\xff", "\xc3\xa9\xff"},
                       Escape{"a/b", "a/b"}, Escape{"C:\\QV-RT", "C:\\\\QV-RT"}));
 
-TEST(ReportCursorTest, StringWithEveryClassIsWrittenEscaped) {
-  Status status;
-  ReportCursor cursor(status);
-  cursor.addString("s", "\t\"\\\x01\xc3");
-  EXPECT_STREQ(status.report, "{\"s\":\"\\t\\\"\\\\\\u0001\xc3\"}");
-}
-
 TEST(ReportCursorTest, FirstMemberHasNoCommaSecondHasOne) {
   Status status;
   ReportCursor cursor(status);

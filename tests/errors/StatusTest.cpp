@@ -52,14 +52,6 @@ TEST(StatusTest, FirstErrorAndItsReportStay) {
   EXPECT_STREQ(status.report, kSiteReport);
 }
 
-TEST(StatusTest, SetErrorWritesLocationMembersInOrder) {
-  Status status;
-  ASSERT_TRUE(setError(status, kError, kSite));
-  EXPECT_STREQ(status.report, kSiteReport);
-  EXPECT_EQ(status.capacity, kFirstBuffer);
-  expectInvariant(status);
-}
-
 TEST(StatusTest, SetErrorWithoutComponentLeavesItOut) {
   Status status;
   setError(status, -52000, {"qvhtl/err/Allocator", 32, nullptr, "qvapalerr_memoryFull"});

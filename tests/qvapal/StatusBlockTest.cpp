@@ -69,28 +69,22 @@ TEST(SetStatusTest, ShortStructSizeGetsCodeButNoDetails) {
   EXPECT_EQ(status.line, 0u);
 }
 
-TEST(SetStatusTest, PathOfHundredCharactersIsKeptWhole) {
-  const std::string path(100, 'p');
-  StatusBlock status;
-  setStatus(status, kError, path.c_str(), 1);
-  EXPECT_EQ(std::string(status.file), path);
-}
-
-TEST(SetStatusTest, LongPathKeepsFirstAndLastFortyNine) {
-  std::string path;
-  for (int i = 0; i < 120; ++i) path += static_cast<char>('A' + i % 26);
-  StatusBlock status;
-  setStatus(status, kError, path.c_str(), 1);
-  EXPECT_EQ(std::string(status.file), path.substr(0, 49) + ".." + path.substr(120 - 49));
-  EXPECT_EQ(std::string(status.file).size(), 100u);
-}
-
-TEST(SetStatusTest, NullFileIsRecordedEmpty) {
-  StatusBlock status;
-  std::snprintf(status.file, sizeof status.file, "stale");
-  setStatus(status, kError, nullptr, 4);
-  EXPECT_STREQ(status.file, "");
-  EXPECT_EQ(status.line, 4u);
+// The file is kept whole up to 100 characters, longer ones keep their first and last 49.
+TEST(SetStatusTest, FileIsRecordedWholeCutInTheMiddleOrEmpty) {
+  std::string longPath;
+  for (int i = 0; i < 120; ++i) longPath += static_cast<char>('A' + i % 26);
+  const std::string hundred(100, 'p');
+  const std::pair<const char*, std::string> rows[] = {
+      {hundred.c_str(), hundred},
+      {longPath.c_str(), longPath.substr(0, 49) + ".." + longPath.substr(120 - 49)},
+      {nullptr, ""}};
+  for (const auto& [file, recorded] : rows) {
+    StatusBlock status;
+    std::snprintf(status.file, sizeof status.file, "stale");
+    setStatus(status, kError, file, 4);
+    EXPECT_EQ(std::string(status.file), recorded);
+    EXPECT_EQ(status.line, 4u);
+  }
 }
 
 }  // namespace

@@ -92,12 +92,6 @@ class FaultyThreads final : public platform::ThreadSystem {
   std::string lastName;
 };
 
-TEST(tThreadControllerTest, NewControllerIsIdle) {
-  tThreadController controller;
-  EXPECT_FALSE(controller.isRunning());
-  EXPECT_FALSE(controller.ownsThreadHandle());
-}
-
 TEST(tThreadControllerTest, StartRunsBodyNamedKelvanertAndJoinWaitsForIt) {
   FaultyThreads threads;
   tThreadController controller(threads);
@@ -125,7 +119,6 @@ TEST(tThreadControllerTest, SecondStartWhileRunningLeavesBusyStatus) {
   StatusBlock status;
   controller.start(&second, status);
   EXPECT_EQ(status.code, qvapalerr_threadRunning);
-  EXPECT_EQ(status.code, -52016);
   EXPECT_STREQ(status.file, "qvapal\\protons\\thread\\tThreadController");
   EXPECT_EQ(status.line, 56u);
   EXPECT_TRUE(controller.isRunning());
@@ -234,12 +227,6 @@ TEST(tThreadControllerTest, DestroyingRunningControllerDoesNotWaitForThread) {
   EXPECT_FALSE(body.hasFinished());
   body.release();
   EXPECT_TRUE(body.waitFinished());
-}
-
-TEST(tThreadControllerTest, JoinWithoutStartReturns) {
-  tThreadController controller;
-  controller.join();
-  EXPECT_FALSE(controller.isRunning());
 }
 
 }  // namespace

@@ -3,14 +3,12 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <chrono>
 #include <cstdint>
 #include <cstring>
 #include <functional>
 #include <string>
 #include <thread>
-#include <tuple>
 #include <vector>
 
 #include "driver/Properties.h"
@@ -80,15 +78,6 @@ inline size_t CountId(const std::vector<Frame>& frames, uint32_t id, uint8_t typ
   return n;
 }
 
-// The first frame with this identifier and type; an empty frame (and a failure) when there is none.
-inline Frame First(const std::vector<Frame>& frames, uint32_t id, uint8_t type) {
-  const auto it = std::find_if(frames.begin(), frames.end(), [&](const Frame& f) {
-    return f.identifier == id && f.type == type;
-  });
-  EXPECT_NE(it, frames.end()) << std::hex << id;
-  return it == frames.end() ? Frame{} : *it;
-}
-
 inline constexpr uint8_t kErrorsOn[2] = {1, 0};
 
 inline void Load(const std::string& json, const std::string& dir = ".") {
@@ -96,40 +85,14 @@ inline void Load(const std::string& json, const std::string& dir = ".") {
   ASSERT_TRUE(LoadConfiguration(json, dir, &error)) << error;
 }
 
-struct Listed {
-  std::string name;
-  uint32_t port;
-  uint32_t protocol;
-  uint32_t canFd;
-};
-
-// The listing a host's hardware table is built from: devices in order, interfaces in order.
-inline std::vector<Listed> ListInterfaces() {
-  std::vector<Listed> out;
+// The first device a freshly opened system object lists; 0 when there is no hardware.
+inline uint32_t FirstDevice() {
   kxRef system = 0;
-  EXPECT_EQ(kxSystemOpen(&system), 0);
   uint32_t devices[64] = {};
+  EXPECT_EQ(kxSystemOpen(&system), 0);
   EXPECT_EQ(kxGetProperty(system, driver::kPropSystemDevices, sizeof devices, devices), 0);
-  for (uint32_t d = 0; d < 64 && devices[d] != 0; ++d) {
-    uint32_t interfaces[16] = {};
-    EXPECT_EQ(
-        kxGetProperty(devices[d], driver::kPropDeviceInterfaces, sizeof interfaces, interfaces), 0);
-    for (uint32_t i = 0; i < 16 && interfaces[i] != 0; ++i) {
-      char name[16] = {};
-      uint8_t port[16] = {};
-      Listed l{};
-      EXPECT_EQ(kxGetProperty(interfaces[i], driver::kPropInterfaceName, 16, name), 0);
-      EXPECT_EQ(kxGetProperty(interfaces[i], driver::kPropInterfacePort, 16, port), 0);
-      EXPECT_EQ(kxGetProperty(interfaces[i], driver::kPropInterfaceProtocol, 4, &l.protocol), 0);
-      EXPECT_EQ(kxGetProperty(interfaces[i], driver::kPropInterfaceCanFd, 4, &l.canFd), 0);
-      for (int b = 4; b < 16; ++b) EXPECT_EQ(port[b], 0) << "bytes after the port are zero";
-      l.name = name;
-      std::memcpy(&l.port, port, 4);
-      out.push_back(l);
-    }
-  }
   EXPECT_EQ(kxSystemClose(system), 0);
-  return out;
+  return devices[0];
 }
 
 // A 4-byte property of a freshly opened system object.

@@ -9,21 +9,13 @@ namespace {
 
 constexpr uint64_t kTicksPerMs = 1000000;  // nanosecond counter
 
-TEST(StopwatchTest, NeverRestartedReportsZero) {
+TEST(StopwatchTest, NeverRestartedOrJustRestartedReportsZero) {
   FakeClock clock;
   clock.ticks = 123456789;
-  const Stopwatch watch;
-  EXPECT_EQ(watch.ElapsedMilliseconds(), 0u);
-}
-
-TEST(StopwatchTest, RestartedAndReadAtOnceReportsZero) {
-  FakeClock clock;
-  clock.ticks = 5 * kTicksPerMs;
   Stopwatch watch;
+  EXPECT_EQ(watch.ElapsedMilliseconds(), 0u);
   watch.Restart();
   EXPECT_EQ(watch.ElapsedMilliseconds(), 0u);
-  EXPECT_TRUE(watch.isRunning);
-  EXPECT_EQ(watch.accumulatedPs, 0u);
 }
 
 TEST(StopwatchTest, ReportsWholeMillisecondsSinceRestart) {
