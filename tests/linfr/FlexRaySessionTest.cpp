@@ -44,19 +44,7 @@ bool HasSlots(const BusRecords& m) {
 }
 
 TEST_F(LinFlexRayTest, DatabaseModeShowsEverySlotOnEachOfItsChannels) {
-  tarvix::StartRecording();
   kvhost::HostClient host = StartedHost(kDatabase);
-  const std::vector<std::pair<std::string, uint32_t>> expected = {
-      {"kxCreateSession", driver::kModeReceiveStream},
-      {"kxGetProperty", driver::kPropBaudRate},
-      {"kxStop", driver::kScopeInterfaceOnly},
-      {"kxSetProperty", driver::kPropFlexRayTermination},
-      {"kxSetProperty", driver::kPropFlexRayNullFrames},
-      {"kxStart", driver::kScopeNormal},
-      {"kxWait", driver::kWaitInterfaceCommunicating},
-      {"kxSetProperty", driver::kPropEcho}};
-  EXPECT_EQ(StartCalls("FlexRay1"), expected);
-
   auto message = RecordsWhere(host, kvhost::kFlexRayRecords, HasSlots);
   ASSERT_TRUE(message.has_value());
   ASSERT_EQ(message->records.size(), 5u);
@@ -146,8 +134,8 @@ TEST_F(LinFlexRayTest, NullFramesJoinTheirSlotAndStatisticsOnlyWhenShown) {
   EXPECT_EQ(hiddenCounts->nullFrames, 0u);
 }
 
-// The key slot is set, before the start, only when given (the database mode's start calls above
-// show that it is not set by default); 0 is given too, and the value may be hexadecimal.
+// The key slot is set, before the start, only when given (the database mode above sets none); 0
+// is given too, and the value may be hexadecimal.
 TEST_F(LinFlexRayTest, KeySlotIsSetBeforeTheStartOnlyWhenGiven) {
   const std::tuple<std::string, std::string, uint32_t> cases[] = {{"FlexRay1", "0", 0},
                                                                   {"FlexRay2", "0x10", 16}};
@@ -233,7 +221,6 @@ struct BusTexts {
   std::string interfaceName;
   std::string lastError;
   std::string alreadyStarted;
-  std::string refusal;
 };
 void PrintTo(const BusTexts& c, std::ostream* os) { *os << c.name; }
 
@@ -246,8 +233,6 @@ TEST_P(BusTextsTest, SessionCommandsAnswerWithTheTextsOfTheBus) {
   const std::pair<std::string, std::string> exchanges[] = {
       {"CMD_SESSION_READ_LAST_ERROR", bus.lastError},
       {"CMD_SESSION_START", bus.alreadyStarted},
-      {"SET_PROP_SESSION_TERMINATION=1", bus.refusal},
-      {"CMD_TX_START", "<ACK: CMD_TX_START>\n"},
       {"CMD_SESSION_TERMINATE", "<ACK: CMD_SESSION_TERMINATE>\n"},
   };
   for (const auto& [command, text] : exchanges) {
@@ -256,27 +241,22 @@ TEST_P(BusTextsTest, SessionCommandsAnswerWithTheTextsOfTheBus) {
     EXPECT_EQ(reply->text(), text) << command;
   }
   EXPECT_TRUE(host.WaitForClose(kReplyDeadline));
-  size_t writes = 0;
   bool cleared = false;
   for (const tarvix::CallRecord& call : CallsOn(bus.interfaceName)) {
-    writes += call.operation == "kxWriteFrame";
     cleared |= call.operation == "kxClear" && call.status == 0;
   }
-  EXPECT_EQ(writes, 0u) << "only CAN sessions transmit";
   EXPECT_TRUE(cleared) << "terminating clears the driver session";
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Buses, BusTextsTest,
-    ::testing::Values(BusTexts{"LIN", "SET_PROP_SESSION_PORTNAME=LIN1", "LIN1",
-                               "<LIN Error: 0>  <TCP Error: 0> \n",
-                               "<ERROR: LIN session is already started>\n",
-                               "<ERROR: SET_PROP_SESSION_TERMINATION: LIN Session yet created>\n"},
-                      BusTexts{"FlexRay", kPort, "FlexRay1",
-                               "<FlexRay Error: 0>  <TCP Error: 0> \n",
-                               "<ERROR: FlexRay session is already started>\n",
-                               "<ERROR: SET_PROP_SESSION_TERMINATION: FR Session yet created>\n"}),
-    [](const auto& info) { return std::string(info.param.name); });
+INSTANTIATE_TEST_SUITE_P(Buses, BusTextsTest,
+                         ::testing::Values(BusTexts{"LIN", "SET_PROP_SESSION_PORTNAME=LIN1", "LIN1",
+                                                    "<LIN Error: 0>  <TCP Error: 0> \n",
+                                                    "<ERROR: LIN session is already started>\n"},
+                                           BusTexts{
+                                               "FlexRay", kPort, "FlexRay1",
+                                               "<FlexRay Error: 0>  <TCP Error: 0> \n",
+                                               "<ERROR: FlexRay session is already started>\n"}),
+                         [](const auto& info) { return std::string(info.param.name); });
 
 }  // namespace
 }  // namespace kvtest
