@@ -13,19 +13,6 @@ TEST(HostMessageTest, HeaderNeedsAll28Bytes) {
   EXPECT_TRUE(DecodeHeader(bytes.data(), bytes.size()));
 }
 
-TEST(HostMessageTest, HeaderFieldsAreLittleEndian) {
-  std::vector<uint8_t> bytes = {1, 0, 0,    0,    7,    0,    0, 0,    0xB8, 1, 0,  0, 2, 0,
-                                0, 0, 0xEC, 0xFF, 0xFF, 0xFF, 0, 0x0F, 0,    0, 21, 5, 0, 3};
-  auto header = DecodeHeader(bytes.data(), bytes.size());
-  ASSERT_TRUE(header);
-  EXPECT_EQ(header->sequence, 1u);
-  EXPECT_EQ(header->type, kHardwareTable);
-  EXPECT_EQ(header->payloadLength, 440u);
-  EXPECT_EQ(header->idCount, 2u);
-  EXPECT_EQ(header->lastStatus, -20);
-  EXPECT_EQ(header->version[0], 21);
-}
-
 TEST(HostMessageTest, HardwareTableMustBeWholeRecords) {
   EXPECT_FALSE(DecodeHardwareTable(std::vector<uint8_t>(45)));
   auto empty = DecodeHardwareTable({});

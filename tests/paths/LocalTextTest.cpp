@@ -10,44 +10,29 @@ namespace {
 using kxpath::mbsToUtf8;
 using kxpath::utf8ToMbs;
 
-TEST(LocalTextTest, NullAndEmptySucceedWithEmptyOutput) {
-  std::string out = "stale";
-  EXPECT_EQ(mbsToUtf8(nullptr, out), 0);
-  EXPECT_TRUE(out.empty());
-  out = "stale";
-  EXPECT_EQ(utf8ToMbs("", out), 0);
-  EXPECT_TRUE(out.empty());
-}
-
-TEST(LocalTextTest, HighCharactersRoundTrip) {
-  std::string utf8;
-  ASSERT_EQ(mbsToUtf8("M\xfc"
-                      "ller \x80",
-                      utf8),
-            0);
-  EXPECT_EQ(utf8, "M\xc3\xbcller \xe2\x82\xac");
-  std::string local;
-  ASSERT_EQ(utf8ToMbs(utf8.c_str(), local), 0);
-  EXPECT_EQ(local,
-            "M\xfc"
-            "ller \x80");
-}
-
-TEST(LocalTextTest, InvalidCodePageByteFails) {
-  std::string out;
-  EXPECT_EQ(mbsToUtf8("bad\x8d", out), qverr::kConversionFailed);
-}
-
-TEST(LocalTextTest, IllFormedUtf8Fails) {
-  std::string out;
-  EXPECT_EQ(utf8ToMbs("\xed\xa0\x80", out), qverr::kConversionFailed);
-  EXPECT_EQ(utf8ToMbs("ok\xc3", out), qverr::kConversionFailed);
-}
-
-TEST(LocalTextTest, UnrepresentableCharacterBecomesDefaultCharacter) {
-  std::string out;
-  EXPECT_EQ(utf8ToMbs("\xd0\x96x", out), 0);  // Cyrillic Zhe
-  EXPECT_EQ(out, "?x");
+// The code page itself is tested in platform/; here the codes and outputs of the two directions.
+TEST(LocalTextTest, ConversionsGiveTheirTextOrTheConversionCode) {
+  const struct {
+    bool toUtf8;
+    const char* input;
+    int32_t code;
+    std::string output;  // "" after a failure
+  } rows[] = {
+      {true, nullptr, 0, ""},
+      {true, "M\xfcller \x80", 0, "M\xc3\xbcller \xe2\x82\xac"},
+      {true, "bad\x8d", qverr::kConversionFailed, ""},
+      {false, "", 0, ""},
+      {false, "M\xc3\xbcller \xe2\x82\xac", 0, "M\xfcller \x80"},
+      {false, "\xed\xa0\x80", qverr::kConversionFailed, ""},
+      {false, "ok\xc3", qverr::kConversionFailed, ""},
+      {false, "\xd0\x96x", 0, "?x"},  // Cyrillic Zhe has no byte: the default character
+  };
+  for (const auto& row : rows) {
+    std::string out = "stale";
+    const int32_t code = row.toUtf8 ? mbsToUtf8(row.input, out) : utf8ToMbs(row.input, out);
+    EXPECT_EQ(code, row.code) << (row.input ? row.input : "null");
+    if (code == 0) EXPECT_EQ(out, row.output) << (row.input ? row.input : "null");
+  }
 }
 
 TEST(LocalTextTest, ConversionErrorIsThrownWithItsSite) {

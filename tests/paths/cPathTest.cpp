@@ -65,12 +65,8 @@ TEST(cPathTest, AppendLocalStoresUtf8AndGetLocalGivesBytesBack) {
   EXPECT_EQ(path.getLocal(),
             "C:\\logs\\M\xfc"
             "ller.txt");
-}
-
-TEST(cPathTest, AppendLocalTrimsLeadingBlanksKeepsInnerTrailing) {
-  cPath path("C:\\logs");
-  path.appendLocal("  name  .txt");
-  EXPECT_EQ(path.getUtf8(), "C:\\logs\\name  .txt");
+  path.appendLocal("  name  .txt");  // leading blanks go, inner and trailing ones stay
+  EXPECT_EQ(path.getUtf8(), "C:\\logs\\M\xc3\xbcller.txt\\name  .txt");
 }
 
 TEST(cPathTest, AppendLocalWithInvalidByteThrowsTranslatedConversionError) {
@@ -85,34 +81,33 @@ TEST(cPathTest, AppendLocalWithInvalidByteThrowsTranslatedConversionError) {
   EXPECT_EQ(path.getUtf8(), "C:\\logs");
 }
 
-TEST(cPathTest, CopyUtf8IntoExactBufferSucceedsOneLessFails) {
+// A missing buffer is refused (size 0 is too small even without one); the size holds the
+// terminator too.
+TEST(cPathTest, CopyIntoAMissingOrTooSmallBufferThrowsAndExactSizeSucceeds) {
   const cPath path("C:\\QV-RT");
   std::vector<char> exact(path.getUtf8().size() + 1, 'x');
+  const struct {
+    char* buffer;
+    uint32_t size;
+    int32_t code;
+    uint32_t line;
+  } rows[] = {
+      {exact.data(), static_cast<uint32_t>(exact.size() - 1), nENSPAN000::kDriverBufferTooSmall,
+       76},
+      {nullptr, 10, nENSPAN000::kDriverBufferMissing, 71},
+      {nullptr, 0, nENSPAN000::kDriverBufferTooSmall, 76},
+  };
+  for (const auto& row : rows) {
+    try {
+      path.copyLocal(row.buffer, row.size);
+      ADD_FAILURE() << "no exception for size " << row.size;
+    } catch (const cExceptionBase& e) {
+      EXPECT_EQ(e.errorCode(), row.code) << row.size;
+      EXPECT_EQ(e.locationWord(), locationOf(ErrorKind::DriverStatus, row.line)) << row.size;
+    }
+  }
   path.copyUtf8(exact.data(), static_cast<uint32_t>(exact.size()));
   EXPECT_STREQ(exact.data(), "C:\\QV-RT");
-  try {
-    path.copyUtf8(exact.data(), static_cast<uint32_t>(exact.size() - 1));
-    FAIL();
-  } catch (const cExceptionBase& e) {
-    EXPECT_EQ(e.errorCode(), nENSPAN000::kDriverBufferTooSmall);
-    EXPECT_EQ(e.locationWord(), locationOf(ErrorKind::DriverStatus, 76));
-  }
-}
-
-TEST(cPathTest, CopyToMissingBufferThrowsLine71) {
-  const cPath path("C:\\QV-RT");
-  try {
-    path.copyLocal(nullptr, 10);
-    FAIL();
-  } catch (const cExceptionBase& e) {
-    EXPECT_EQ(e.errorCode(), nENSPAN000::kDriverBufferMissing);
-    EXPECT_EQ(e.locationWord(), locationOf(ErrorKind::DriverStatus, 71));
-  }
-}
-
-TEST(cPathTest, CopyWithSizeZeroIsTooSmallEvenForNullBuffer) {
-  const cPath path;
-  EXPECT_THROW(path.copyUtf8(nullptr, 0), cExceptionBase);
 }
 
 TEST(cPathTest, CopyLocalWritesCodePageBytes) {

@@ -1,19 +1,9 @@
-// The fixed answers of the system queries.
+// Temporary file names of the system queries.
 #include <gtest/gtest.h>
 
 #include "qvsysq/cSysqWrapper.h"
 
 namespace {
-
-TEST(SysqWrapperTest, AnswersFixedDirectories) {
-  kxpath::cSysqWrapper wrapper;
-  EXPECT_EQ(wrapper.getRootDir(), "C:\\QV-RT");
-  EXPECT_EQ(wrapper.getSharedDir(), "C:\\QV-RT");
-  EXPECT_EQ(wrapper.getSystemDir(), "C:\\QV-RT\\SYSTEM");
-  EXPECT_EQ(wrapper.getErrorFilesDir(), "C:\\QV-RT\\SYSTEM");
-  EXPECT_EQ(wrapper.getTempDir(), "c:\\temp");
-  EXPECT_EQ(wrapper.getDataDir(0), "C:\\QV-RT");
-}
 
 TEST(SysqWrapperTest, TempFileNamesAreUniqueUnderTempDir) {
   qvsysq::SysqWrapper wrapper;
