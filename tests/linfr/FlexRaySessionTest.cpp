@@ -1,27 +1,26 @@
-// A host monitors the simulated FlexRay bus over TCP: modes, slots per channel, null frames, start
-// failures and statistics; with the commands' texts of LIN and FlexRay sessions.
+// A host monitors the simulated FlexRay bus over TCP: null frames, the key slot, start failures and
+// statistics.
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstdlib>
-#include <cstring>
 #include <tuple>
 
 #include "driver/Properties.h"
 #include "driver/Sessions.h"
 #include "driver/Status.h"
-#include "tests/linfr/LinFlexRayFixture.h"
+#include "tests/support/BusSessionFixture.h"
 
 namespace kvtest {
 namespace {
 
 using Payload = std::vector<uint8_t>;
 using Record = kvhost::IdentifierRecord;
+using LinFlexRayTest = BusSessionTest;
+using FlexRayStatistics = kvhost::FlexRayStatisticsView;
 
 constexpr uint8_t kFlexRayData = 0x20;
 constexpr uint8_t kFlexRayNull = 0x21;
-constexpr uint8_t kChannelA = 0;
-constexpr uint8_t kChannelB = 1;
 
 const std::string kPort = "SET_PROP_SESSION_PORTNAME=FlexRay1";
 const std::vector<std::string> kDatabase = {kPort, "SET_PROP_SESSION_RUNMODE=NORMAL",
@@ -33,53 +32,6 @@ std::vector<std::string> With(std::vector<std::string> properties, const std::st
   return properties;
 }
 
-Payload Ramp(uint8_t first, size_t length) {
-  Payload bytes(length);
-  for (size_t i = 0; i < length; ++i) bytes[i] = static_cast<uint8_t>(first + i);
-  return bytes;
-}
-
-bool HasSlots(const BusRecords& m) {
-  return m.all(1).size() == 2 && m.find(2) && m.find(3) && m.find(40);
-}
-
-TEST_F(LinFlexRayTest, DatabaseModeShowsEverySlotOnEachOfItsChannels) {
-  kvhost::HostClient host = StartedHost(kDatabase);
-  auto message = RecordsWhere(host, kvhost::kFlexRayRecords, HasSlots);
-  ASSERT_TRUE(message.has_value());
-  ASSERT_EQ(message->records.size(), 5u);
-  EXPECT_EQ(message->header.idCount, 5u);
-  const uint32_t sorted[] = {1, 1, 2, 3, 40};
-  for (size_t i = 0; i < 5; ++i) EXPECT_EQ(message->records[i].identifier, sorted[i]);
-
-  const auto slot1 = message->all(1);
-  EXPECT_NE(slot1[0]->channel, slot1[1]->channel);
-  for (const Record* r : slot1) {
-    EXPECT_EQ(r->startup, 1);
-    EXPECT_EQ(r->sync, 1);
-    EXPECT_EQ(r->preamble, 0);
-    EXPECT_EQ(r->payload, Ramp(0x10, 16));
-  }
-  const Record& slot2 = *message->find(2);
-  EXPECT_EQ(slot2.channel, kChannelA);
-  EXPECT_EQ(slot2.startup + slot2.sync, 0);
-  ASSERT_EQ(slot2.payloadLength, 16u);
-  EXPECT_EQ(Payload(slot2.payload.begin() + 1, slot2.payload.end()), Payload(15, 0));
-  const Record& slot40 = *message->find(40);
-  EXPECT_EQ(slot40.channel, kChannelB);
-  EXPECT_EQ(slot40.payload, Ramp(0x40, 32));
-  // Without null frames slot 3 is seen only in the even cycles that carry its data.
-  const Record& slot3 = *message->find(3);
-  EXPECT_EQ(slot3.type, kFlexRayData);
-  EXPECT_EQ(slot3.cycle % 2, 0);
-  EXPECT_EQ(slot3.payload, Ramp(0x30, 8));
-  for (const Record& r : message->records) {
-    EXPECT_LT(r.cycle, 64);
-    EXPECT_EQ(r.echo, 0);
-    EXPECT_GE(r.lastTimestamp, r.previousTimestamp);
-  }
-}
-
 // Slot 3 carries data in even cycles and null frames in odd ones. Shown, they share its entry: the
 // count follows every cycle and the type stays that of the entry's first frame while the cycle
 // number follows the last frame.
@@ -89,7 +41,7 @@ TEST_F(LinFlexRayTest, NullFramesJoinTheirSlotAndStatisticsOnlyWhenShown) {
       StartedHost({"SET_PROP_SESSION_PORTNAME=FlexRay2", "SET_PROP_SESSION_RUNMODE=NORMAL",
                    "SET_PROP_SESSION_ALIAS=SimDB", "SET_PROP_SESSION_CLUSTER=FlexRay"});
 
-  auto mixed = RecordsWhere(shown, kvhost::kFlexRayRecords, [](const BusRecords& m) {
+  auto mixed = RecordsWhere(shown, [](const RecordMessage& m) {
     const Record* slot3 = m.find(3);
     const Record* slot2 = m.find(2);
     if (slot3 == nullptr || slot2 == nullptr || slot2->count < 20) return false;
@@ -99,7 +51,7 @@ TEST_F(LinFlexRayTest, NullFramesJoinTheirSlotAndStatisticsOnlyWhenShown) {
   });
   EXPECT_TRUE(mixed.has_value()) << "slot 3 always showed the type of its last frame";
 
-  auto dataOnly = RecordsWhere(hidden, kvhost::kFlexRayRecords, [](const BusRecords& m) {
+  auto dataOnly = RecordsWhere(hidden, [](const RecordMessage& m) {
     const Record* slot3 = m.find(3);
     const Record* slot2 = m.find(2);
     return slot3 != nullptr && slot2 != nullptr && slot2->count >= 20;
@@ -112,10 +64,11 @@ TEST_F(LinFlexRayTest, NullFramesJoinTheirSlotAndStatisticsOnlyWhenShown) {
 
   // Per 5 ms cycle: slot 1 on A and B, slots 2 and 40, and slot 3 with data in every other cycle
   // and a null frame in the others: 900 data and 100 null frames a second.
-  auto statistics = FlexRayStatisticsWhere(shown, [](const kvhost::FlexRayStatisticsView& s) {
-    return s.dataFramesPerSecond >= 855 && s.dataFramesPerSecond <= 945 &&
-           s.nullFramesPerSecond >= 95 && s.nullFramesPerSecond <= 105;
-  });
+  auto statistics = StatisticsWhere<FlexRayStatistics>(
+      shown, kvhost::DecodeFlexRayStatistics, [](const FlexRayStatistics& s) {
+        return s.dataFramesPerSecond >= 855 && s.dataFramesPerSecond <= 945 &&
+               s.nullFramesPerSecond >= 95 && s.nullFramesPerSecond <= 105;
+      });
   ASSERT_TRUE(statistics.has_value());
   EXPECT_GE(statistics->dataFrames, statistics->dataFramesPerSecond / 2);
   EXPECT_EQ(statistics->faultCode, 0u);
@@ -128,8 +81,9 @@ TEST_F(LinFlexRayTest, NullFramesJoinTheirSlotAndStatisticsOnlyWhenShown) {
   EXPECT_GT(statistics->statisticsWords[1], statistics->statisticsWords[2]) << "data over null";
   EXPECT_LT(statistics->statisticsWords[5], 64u) << "current cycle";
   EXPECT_EQ(statistics->lastStateWord, 3u) << "channels A and B active";
-  auto hiddenCounts = FlexRayStatisticsWhere(
-      hidden, [](const kvhost::FlexRayStatisticsView& s) { return s.dataFrames > 0; });
+  auto hiddenCounts = StatisticsWhere<FlexRayStatistics>(
+      hidden, kvhost::DecodeFlexRayStatistics,
+      [](const FlexRayStatistics& s) { return s.dataFrames > 0; });
   ASSERT_TRUE(hiddenCounts.has_value());
   EXPECT_EQ(hiddenCounts->nullFrames, 0u);
 }
@@ -148,29 +102,17 @@ TEST_F(LinFlexRayTest, KeySlotIsSetBeforeTheStartOnlyWhenGiven) {
     const auto set = SetPropertyCalls(port, driver::kPropKeySlot);
     ASSERT_EQ(set.size(), 1u);
     ASSERT_EQ(set[0].value.size(), sizeof value);
-    uint32_t written = 0;
-    std::memcpy(&written, set[0].value.data(), sizeof written);
-    EXPECT_EQ(written, value);
-    const auto calls = StartCalls(port);
-    const auto at = [&](const std::pair<std::string, uint32_t>& call) {
-      return std::find(calls.begin(), calls.end(), call) - calls.begin();
+    EXPECT_EQ(ValueOf(set[0]), value);
+    const auto calls = CallsOn(port);
+    const auto at = [&](const std::string& operation, uint32_t id) {
+      return std::find_if(calls.begin(), calls.end(),
+                          [&](const tarvix::CallRecord& c) {
+                            return c.operation == operation && c.id == id;
+                          }) -
+             calls.begin();
     };
-    EXPECT_LT(at({"kxSetProperty", driver::kPropKeySlot}), at({"kxStart", driver::kScopeNormal}));
+    EXPECT_LT(at("kxSetProperty", driver::kPropKeySlot), at("kxStart", driver::kScopeNormal));
   }
-}
-
-TEST_F(LinFlexRayTest, SubordinateFlexRaySessionSetsOnlyTheEchoProperty) {
-  tarvix::StartRecording();
-  kvhost::HostClient host = StartedHost({kPort});
-  const std::vector<std::pair<std::string, uint32_t>> expected = {
-      {"kxCreateSession", driver::kModeReceiveStream}, {"kxSetProperty", driver::kPropEcho}};
-  EXPECT_EQ(StartCalls("FlexRay1"), expected);
-  for (const tarvix::CallRecord& call : CallsOn("FlexRay1")) {
-    if (call.operation == "kxCreateSession") {
-      EXPECT_EQ(call.texts.at(0), driver::kDatabaseSubordinate);
-    }
-  }
-  EXPECT_TRUE(RecordsWhere(host, kvhost::kFlexRayRecords, HasSlots));
 }
 
 TEST_F(LinFlexRayTest, NormalFlexRayStartWithoutAliasAndClusterIsRefused) {
@@ -180,7 +122,7 @@ TEST_F(LinFlexRayTest, NormalFlexRayStartWithoutAliasAndClusterIsRefused) {
   ASSERT_TRUE(reply.has_value());
   EXPECT_EQ(reply->header.type, kvhost::kErrorText);
   EXPECT_EQ(reply->text(), "<ERROR: CMD_SESSION_START: no Alias and Cluster defined>\n");
-  EXPECT_TRUE(StartCalls("FlexRay1").empty()) << "no driver session is opened";
+  EXPECT_TRUE(SetPropertyCalls("FlexRay1", driver::kPropEcho).empty()) << "no session is opened";
   // The connection stays open and has no session.
   auto lastError = Command(host, "CMD_SESSION_READ_LAST_ERROR");
   ASSERT_TRUE(lastError.has_value());
@@ -214,49 +156,6 @@ TEST_F(LinFlexRayTest, FlexRayStartFailsWhenTheBusNeverCommunicates) {
   EXPECT_TRUE(waited);
   EXPECT_TRUE(cleared) << "the driver session of a failed start is closed";
 }
-
-struct BusTexts {
-  const char* name;
-  std::string port;
-  std::string interfaceName;
-  std::string lastError;
-  std::string alreadyStarted;
-};
-void PrintTo(const BusTexts& c, std::ostream* os) { *os << c.name; }
-
-class BusTextsTest : public LinFlexRayTest, public ::testing::WithParamInterface<BusTexts> {};
-
-TEST_P(BusTextsTest, SessionCommandsAnswerWithTheTextsOfTheBus) {
-  const BusTexts& bus = GetParam();
-  tarvix::StartRecording();
-  kvhost::HostClient host = StartedHost({bus.port});
-  const std::pair<std::string, std::string> exchanges[] = {
-      {"CMD_SESSION_READ_LAST_ERROR", bus.lastError},
-      {"CMD_SESSION_START", bus.alreadyStarted},
-      {"CMD_SESSION_TERMINATE", "<ACK: CMD_SESSION_TERMINATE>\n"},
-  };
-  for (const auto& [command, text] : exchanges) {
-    auto reply = Command(host, command);
-    ASSERT_TRUE(reply.has_value()) << command;
-    EXPECT_EQ(reply->text(), text) << command;
-  }
-  EXPECT_TRUE(host.WaitForClose(kReplyDeadline));
-  bool cleared = false;
-  for (const tarvix::CallRecord& call : CallsOn(bus.interfaceName)) {
-    cleared |= call.operation == "kxClear" && call.status == 0;
-  }
-  EXPECT_TRUE(cleared) << "terminating clears the driver session";
-}
-
-INSTANTIATE_TEST_SUITE_P(Buses, BusTextsTest,
-                         ::testing::Values(BusTexts{"LIN", "SET_PROP_SESSION_PORTNAME=LIN1", "LIN1",
-                                                    "<LIN Error: 0>  <TCP Error: 0> \n",
-                                                    "<ERROR: LIN session is already started>\n"},
-                                           BusTexts{
-                                               "FlexRay", kPort, "FlexRay1",
-                                               "<FlexRay Error: 0>  <TCP Error: 0> \n",
-                                               "<ERROR: FlexRay session is already started>\n"}),
-                         [](const auto& info) { return std::string(info.param.name); });
 
 }  // namespace
 }  // namespace kvtest

@@ -1,19 +1,17 @@
-// A host monitors the simulated LIN bus over TCP: its modes, records, checksums and statistics.
+// A host monitors the simulated LIN bus over TCP: no-response frames, checksums and statistics.
 #include <gtest/gtest.h>
 
-#include <algorithm>
-#include <cstring>
 #include <set>
 
-#include "driver/Properties.h"
-#include "driver/Sessions.h"
-#include "tests/linfr/LinFlexRayFixture.h"
+#include "tests/support/BusSessionFixture.h"
 
 namespace kvtest {
 namespace {
 
 using Payload = std::vector<uint8_t>;
 using Record = kvhost::IdentifierRecord;
+using LinFlexRayTest = BusSessionTest;
+using LinStatistics = kvhost::LinStatisticsView;
 
 constexpr uint8_t kLinData = 0x40;
 constexpr uint8_t kLinNoResponse = 0x42;
@@ -27,89 +25,17 @@ constexpr uint32_t kChecksum0x13 = 0xF0;
 const std::string kPort = "SET_PROP_SESSION_PORTNAME=LIN1";
 const std::string kNormal = "SET_PROP_SESSION_RUNMODE=NORMAL";
 
-bool Has(const BusRecords& m, std::initializer_list<uint32_t> identifiers) {
+bool Has(const RecordMessage& m, std::initializer_list<uint32_t> identifiers) {
   for (uint32_t identifier : identifiers) {
     if (m.find(identifier) == nullptr) return false;
   }
   return true;
 }
 
-// The database each mode opens its session on, and the baud rate it sets (0: none, the bus's own).
-struct LinMode {
-  const char* name;
-  std::vector<std::string> properties;
-  std::string database;
-  uint64_t baudRateSet;
-};
-void PrintTo(const LinMode& m, std::ostream* os) { *os << m.name; }
-
-const LinMode kModes[] = {
-    {"Subordinate", {kPort}, driver::kDatabaseSubordinate, 0},
-    {"BuiltIn",
-     {kPort, kNormal, "SET_PROP_SESSION_BAUDRATE=19200"},
-     driver::kDatabaseMemory,
-     19200},
-    {"Database",
-     {kPort, kNormal, "SET_PROP_SESSION_ALIAS=SimDB", "SET_PROP_SESSION_CLUSTER=LIN"},
-     "SimDB",
-     0},
-};
-
-class LinModeTest : public LinFlexRayTest, public ::testing::WithParamInterface<LinMode> {};
-
-TEST_P(LinModeTest, ScheduleShowsOneEntryPerAnsweredIdentifier) {
-  tarvix::StartRecording();
-  kvhost::HostClient host = StartedHost(GetParam().properties);
-  auto message = RecordsWhere(host, kvhost::kLinRecords, [](const BusRecords& m) {
-    return Has(m, {0x10, 0x11, 0x13});
-  });
-  ASSERT_TRUE(message.has_value());
-  const auto calls = CallsOn("LIN1");
-  const auto created = std::find_if(calls.begin(), calls.end(), [](const auto& call) {
-    return call.operation == "kxCreateSession";
-  });
-  ASSERT_NE(created, calls.end());
-  EXPECT_EQ(created->texts.at(0), GetParam().database);
-  std::vector<uint64_t> ratesSet;
-  for (const tarvix::CallRecord& call : SetPropertyCalls("LIN1", driver::kPropBaudRate)) {
-    uint64_t rate = 0;
-    std::memcpy(&rate, call.value.data(), std::min(call.value.size(), sizeof rate));
-    ratesSet.push_back(rate);
-  }
-  EXPECT_EQ(ratesSet, GetParam().baudRateSet ? std::vector<uint64_t>{GetParam().baudRateSet}
-                                             : std::vector<uint64_t>{});
-
-  // Without the no-response property 0x12 never appears; the table is sorted by identifier.
-  ASSERT_EQ(message->records.size(), 3u);
-  EXPECT_EQ(message->header.idCount, 3u);
-  const std::vector<Payload> payloads = {{0x12, 0x34}, {}, {0xDE, 0xAD, 0xBE, 0xEF}};
-  const uint32_t identifiers[] = {0x10, 0x11, 0x13};
-  for (size_t i = 0; i < 3; ++i) {
-    const Record& r = message->records[i];
-    SCOPED_TRACE(r.identifier);
-    EXPECT_EQ(r.identifier, identifiers[i]);
-    EXPECT_EQ(r.type, kLinData);
-    EXPECT_EQ(r.flag, kEnhancedChecksumFlag);
-    EXPECT_EQ(r.checksum, 0u) << "the info byte holds the checksum only when asked for";
-    EXPECT_EQ(r.echo, 0);
-    EXPECT_GE(r.count, 1u);
-    if (!payloads[i].empty()) {
-      EXPECT_EQ(r.payload, payloads[i]);
-    }
-  }
-  const Record& counter = message->records[1];
-  ASSERT_EQ(counter.payloadLength, 8u);
-  EXPECT_EQ(Payload(counter.payload.begin() + 1, counter.payload.end()),
-            (Payload{1, 2, 3, 4, 5, 6, 7}));
-}
-
-INSTANTIATE_TEST_SUITE_P(Modes, LinModeTest, ::testing::ValuesIn(kModes),
-                         [](const auto& info) { return std::string(info.param.name); });
-
 TEST_F(LinFlexRayTest, NoResponseFramesChecksumsAndStatisticsAsTheDriverSendsThem) {
   kvhost::HostClient host = StartedHost(
       {kPort, "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1", "SET_PROP_SESSION_LOG_CHECKSUM=1"});
-  auto message = RecordsWhere(host, kvhost::kLinRecords, [](const BusRecords& m) {
+  auto message = RecordsWhere(host, [](const RecordMessage& m) {
     return Has(m, {0x10, 0x11, 0x12, 0x13});
   });
   ASSERT_TRUE(message.has_value());
@@ -123,10 +49,11 @@ TEST_F(LinFlexRayTest, NoResponseFramesChecksumsAndStatisticsAsTheDriverSendsThe
 
   // 100 slots per second: 75 answered, 25 without response. A window on a busy machine may be
   // cut short, so a report within a few frames of the schedule is waited for.
-  auto statistics = LinStatisticsWhere(host, [](const kvhost::LinStatisticsView& s) {
-    return s.dataFramesPerSecond >= 70 && s.dataFramesPerSecond <= 80 &&
-           s.noResponseFramesPerSecond >= 22 && s.noResponseFramesPerSecond <= 28;
-  });
+  auto statistics =
+      StatisticsWhere<LinStatistics>(host, kvhost::DecodeLinStatistics, [](const LinStatistics& s) {
+        return s.dataFramesPerSecond >= 70 && s.dataFramesPerSecond <= 80 &&
+               s.noResponseFramesPerSecond >= 22 && s.noResponseFramesPerSecond <= 28;
+      });
   ASSERT_TRUE(statistics.has_value());
   EXPECT_EQ(statistics->errorFrames, 0u);
   EXPECT_EQ(statistics->errorFramesPerSecond, 0u);
@@ -156,7 +83,7 @@ TEST_F(LinFlexRayTest, IdentifierOfBothTypesKeepsOneEntryOfItsLastFrame) {
   kvhost::HostClient host = StartedHost({kPort, "SET_PROP_SESSION_NO_RESPONSE_FRAMES=1"});
 
   std::set<uint8_t> typesSeen;
-  auto message = RecordsWhere(host, kvhost::kLinRecords, [&](const BusRecords& m) {
+  auto message = RecordsWhere(host, [&](const RecordMessage& m) {
     EXPECT_EQ(m.records.size(), 1u);
     const Record& r = m.records.front();
     if (r.type == kLinData) {
@@ -169,9 +96,9 @@ TEST_F(LinFlexRayTest, IdentifierOfBothTypesKeepsOneEntryOfItsLastFrame) {
     return typesSeen.size() == 2;
   });
   EXPECT_TRUE(message.has_value()) << "the entry never showed both types";
-  auto statistics = LinStatisticsWhere(host, [](const kvhost::LinStatisticsView& s) {
-    return s.dataFrames > 0 && s.noResponseFrames > 0;
-  });
+  auto statistics = StatisticsWhere<LinStatistics>(
+      host, kvhost::DecodeLinStatistics,
+      [](const LinStatistics& s) { return s.dataFrames > 0 && s.noResponseFrames > 0; });
   EXPECT_TRUE(statistics.has_value());
 }
 
@@ -182,18 +109,18 @@ TEST_F(LinFlexRayTest, BuiltInModeAtTheWrongBaudRateSeesOnlyBusErrors) {
   kvhost::HostClient errors =
       StartedHost({"SET_PROP_SESSION_PORTNAME=LIN2", kNormal, "SET_PROP_SESSION_BAUDRATE=9600",
                    "SET_PROP_SESSION_LOG_BUS_ERROR_FRAMES=1"});
-  auto message = RecordsWhere(errors, kvhost::kLinRecords,
-                              [](const BusRecords& m) { return !m.records.empty(); });
+  auto message = RecordsWhere(errors, [](const RecordMessage& m) { return !m.records.empty(); });
   ASSERT_TRUE(message.has_value());
   ASSERT_EQ(message->records.size(), 1u);
   EXPECT_EQ(message->records[0].type, kLinBusError);
-  auto counted = LinStatisticsWhere(
-      errors, [](const kvhost::LinStatisticsView& s) { return s.errorFrames > 0; });
+  auto counted =
+      StatisticsWhere<LinStatistics>(errors, kvhost::DecodeLinStatistics,
+                                     [](const LinStatistics& s) { return s.errorFrames > 0; });
   ASSERT_TRUE(counted.has_value());
   EXPECT_EQ(counted->dataFrames, 0u);
 
   // The quiet host gets statistics with nothing counted and never a record message.
-  auto first = LinStatisticsWhere(quiet, [](const kvhost::LinStatisticsView&) { return true; });
+  auto first = StatisticsWhere<LinStatistics>(quiet, kvhost::DecodeLinStatistics);
   auto second = NextMessage(quiet, [](const kvhost::HostMessage& m) {
     EXPECT_NE(m.header.type, kvhost::kLinRecords);
     return m.header.type == kvhost::kStatistics;

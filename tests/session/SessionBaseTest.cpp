@@ -77,17 +77,6 @@ class SessionBaseTest : public ::testing::Test {
   std::unique_ptr<MinimalSession> session;
 };
 
-TEST_F(SessionBaseTest, PollThreadFoldsTheBusTrafficIntoTheTableAndStopAfterStopClearsNothing) {
-  session->startPollThread();
-  // 0x100, 0x1A0, 0x321 and 0x18FEF100 run on the body bus.
-  EXPECT_TRUE(WaitUntil([&] { return session->idCount.load() == 4; }));
-  EXPECT_EQ(session->stop(), 0);
-  EXPECT_EQ(session->driverSession, 0u);
-  tarvix::StartRecording();
-  EXPECT_EQ(session->stop(), 0);
-  EXPECT_EQ(CallsOf("kxClear"), 0u);
-}
-
 // The driver buffers frames from the creation on; a slow start (a J1939 address claim) must not
 // squeeze them into the first second of the statistics.
 TEST_F(SessionBaseTest, FirstStatisticsPeriodStartsWhenTheSessionWasCreated) {
@@ -108,27 +97,6 @@ TEST_F(SessionBaseTest, FailingClearKeepsTheReferenceAndRecordsTheCode) {
   EXPECT_EQ(session->lastStatus.load(), driver::kInvalidReference);
   EXPECT_EQ(session->clearDriverSession(), 0);  // the reference is still there to be cleared
   EXPECT_EQ(session->driverSession, 0u);
-}
-
-TEST_F(SessionBaseTest, PausedSessionReturnsAtOnceWithoutReading) {
-  session->pollActive.store(false);
-  tarvix::StartRecording();
-  EXPECT_EQ(session->pollOnce(), 0);
-  EXPECT_EQ(CallsOf("kxReadFrame"), 0u);
-}
-
-TEST_F(SessionBaseTest, StoppedPollingEndsTheLoopAndKeepsTheThreadAndDriverSession) {
-  session->startPollThread();
-  ASSERT_TRUE(WaitUntil([&] { return session->idCount.load() > 0; }));
-  session->pollActive.store(false);  // what CMD_SESSION_STOP does
-  // The loop ends after its current pass; the thread goes on calling pollOnce, which reads nothing.
-  ASSERT_TRUE(WaitUntil([&] { return session->loopsEnded.load() == 1; }));
-  tarvix::StartRecording();
-  EXPECT_EQ(CallsOf("kxReadFrame"), 0u);
-  EXPECT_EQ(session->loopsEnded.load(), 1);
-  EXPECT_TRUE(session->threadRunning.load());
-  EXPECT_NE(session->driverSession, 0u);
-  EXPECT_EQ(session->stop(), 0);
 }
 
 TEST_F(SessionBaseTest, TableThatCannotBeAllocatedLeavesTheLoopIdleWithMinus22) {
@@ -157,19 +125,6 @@ TEST_F(SessionBaseTest, NothingToReadIsNeverRecorded) {
   // Neither while polling nor when the loop ends (a paused or stopped session) is it a failure.
   EXPECT_EQ(session->stop(), 0);
   EXPECT_EQ(session->lastStatus.load(), 0);
-}
-
-TEST_F(SessionBaseTest, DestroyingARunningSessionEndsItsThreadAndClearsTheDriverSession) {
-  const uint32_t reference = session->driverSession;
-  session->startPollThread();
-  ASSERT_TRUE(WaitUntil([&] { return session->idCount.load() > 0; }));
-  tarvix::StartRecording();
-  session.reset();
-  bool cleared = false;
-  for (const tarvix::CallRecord& call : tarvix::RecordedCalls()) {
-    cleared |= call.operation == "kxClear" && call.reference == reference;
-  }
-  EXPECT_TRUE(cleared);
 }
 
 }  // namespace

@@ -8,24 +8,19 @@
 #include "driver/Status.h"
 #include "hostlink/HostLink.h"
 #include "tarvix/TarvixControl.h"
-#include "tests/session/CanSessionFixture.h"
+#include "tests/support/BusSessionFixture.h"
 
 namespace kvtest {
 namespace {
 
-using nKV_DLL300::SessionSettings;
+using CanSessionTest = BusSessionTest;
+
+const std::string kCan1 = "SET_PROP_SESSION_PORTNAME=CAN1";
 
 std::string Formatted(const char* format, int32_t a, int32_t b = 0) {
   char text[128];
   std::snprintf(text, sizeof text, format, a, b);
   return text;
-}
-
-bool Cleared(uint32_t reference) {
-  for (const tarvix::CallRecord& call : tarvix::RecordedCalls()) {
-    if (call.operation == "kxClear" && call.reference == reference && call.status == 0) return true;
-  }
-  return false;
 }
 
 bool IsRecords(const kvhost::HostMessage& m) { return m.header.type == kvhost::kCanRecords; }
@@ -68,7 +63,7 @@ TEST_F(CanSessionTest, CommandsWithoutASessionAnswerWithTheirTexts) {
 TEST_F(CanSessionTest, CommandsOnARunningSessionAnswerWithTheirTexts) {
   const std::string canRefusal = "<ERROR: SET_PROP_SESSION_LISTEN_ONLY: CAN Session yet created>\n";
   const std::string started = "<ERROR: CAN session is already started>\n";
-  kvhost::HostClient host = StartedHost(0, "CAN1");
+  kvhost::HostClient host = StartedHost({kCan1});
   // Records are in the table before the commands, so each command's header shows them; of the
   // property replies only the refusal by the session does.
   ASSERT_TRUE(RecordsWhere(host, AllFour));
@@ -80,9 +75,6 @@ TEST_F(CanSessionTest, CommandsOnARunningSessionAnswerWithTheirTexts) {
   expect("CMD_SESSION_READ_LAST_ERROR", "<CAN Error: 0>  <TCP Error: 0> \n", kvhost::kText, 4);
   expect("SET_PROP_SESSION_PORTNAME=LIN1", "<ACK: SET_PROP_SESSION_PORTNAME LIN1>", kvhost::kText,
          0);
-  EXPECT_EQ(ConnectionAt(0).busType.load(), driver::BusKind::kLin)
-      << "the port is kept for the next session";
-  EXPECT_EQ(ConnectionAt(0).settings.interfaceName.get(), "LIN1@qv_corle_tarvix");
   expect("SET_PROP_SESSION_LISTEN_ONLY=1", canRefusal, kvhost::kErrorText, 4);
   expect("CMD_SESSION_START", started, kvhost::kErrorText, 4);
   expect("CMD_TX_START", "<ACK: CMD_TX_START>\n", kvhost::kText, 4);
@@ -92,8 +84,27 @@ TEST_F(CanSessionTest, CommandsOnARunningSessionAnswerWithTheirTexts) {
   expect("CMD_SESSION_START", started, kvhost::kErrorText, 4);
 }
 
+// Each bus answers with its own texts, and terminating clears its driver session.
+TEST_F(CanSessionTest, SessionCommandsAnswerWithTheTextsOfTheBus) {
+  const struct {
+    std::string port;
+    std::string bus;
+  } buses[] = {{"CAN1", "CAN"}, {"LIN1", "LIN"}, {"FlexRay1", "FlexRay"}};
+  for (const auto& b : buses) {
+    SCOPED_TRACE(b.port);
+    tarvix::StartRecording();
+    kvhost::HostClient host = StartedHost({"SET_PROP_SESSION_PORTNAME=" + b.port});
+    ExpectReply(host, "CMD_SESSION_READ_LAST_ERROR", "<" + b.bus + " Error: 0>  <TCP Error: 0> \n");
+    ExpectReply(host, "CMD_SESSION_START", "<ERROR: " + b.bus + " session is already started>\n",
+                kvhost::kErrorText);
+    ExpectReply(host, "CMD_SESSION_TERMINATE", "<ACK: CMD_SESSION_TERMINATE>\n");
+    EXPECT_TRUE(host.WaitForClose(kReplyDeadline));
+    EXPECT_TRUE(WaitUntil([&] { return ClearedOn(b.port); }));
+  }
+}
+
 TEST_F(CanSessionTest, StoppedSessionSendsNothingMoreUntilItIsReset) {
-  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) { s.txTimeData = 50; });
+  kvhost::HostClient host = StartedHost({kCan1, "SET_PROP_TX_TIME_DATA=50"});
   ASSERT_TRUE(NextRecords(host).has_value());
   ExpectReply(host, "CMD_SESSION_STOP", "<ACK: CMD_SESSION_STOP>\n");
   // The loop may finish the pass it was in; the reply to this command comes after that pass.
@@ -104,7 +115,7 @@ TEST_F(CanSessionTest, StoppedSessionSendsNothingMoreUntilItIsReset) {
 }
 
 TEST_F(CanSessionTest, ResetEmptiesTheTableAtTheNextSend) {
-  kvhost::HostClient host = StartedHost(0, "CAN1", [](SessionSettings& s) { s.txTimeData = 200; });
+  kvhost::HostClient host = StartedHost({kCan1, "SET_PROP_TX_TIME_DATA=200"});
   ASSERT_TRUE(RecordsWhere(host, [](const RecordMessage& m) {
     const auto* r = m.find(0x100);
     return r != nullptr && r->count > 60;
@@ -138,18 +149,17 @@ TEST_F(CanSessionTest, EveryEndOfTheConnectionClearsTheDriverSession) {
   };
   for (size_t i = 0; i < std::size(endings); ++i) {
     SCOPED_TRACE(i);
-    kvhost::HostClient host = StartedHost(0, "CAN1");
-    const uint32_t reference = ConnectionAt(0).session->driverSession;
     tarvix::StartRecording();
+    kvhost::HostClient host = StartedHost({kCan1});
     endings[i](host);
-    EXPECT_TRUE(WaitUntil([&] { return Cleared(reference); }));
+    EXPECT_TRUE(WaitUntil([&] { return ClearedOn("CAN1"); }));
     EXPECT_TRUE(WaitUntil([&] { return service().statistics().connectionsEnded.load() == i + 1; }));
   }
 }
 
 TEST_F(CanSessionTest, LastErrorShowsTheSessionsFailingStateRead) {
   tarvix::InjectStatus("kxReadState", "CAN1", driver::kUnknownState, true);
-  kvhost::HostClient host = StartedHost(0, "CAN1");
+  kvhost::HostClient host = StartedHost({kCan1});
   auto statistics = NextMessage(
       host, [](const kvhost::HostMessage& m) { return m.header.type == kvhost::kStatistics; });
   ASSERT_TRUE(statistics.has_value());
@@ -160,9 +170,8 @@ TEST_F(CanSessionTest, LastErrorShowsTheSessionsFailingStateRead) {
 
 TEST_F(CanSessionTest, DriverFailureAtStartIsReportedAndEndsTheConnection) {
   tarvix::InjectStatus("kxCreateSession", "CAN1", driver::kInterfaceNotFound, true);
-  kvhost::HostClient host = ConnectHost();
-  UsePort(ConnectionAt(0), "CAN1");
-  auto reply = Command(host, "CMD_SESSION_START");
+  std::optional<kvhost::HostMessage> reply;
+  kvhost::HostClient host = HostWith({kCan1}, &reply);
   ASSERT_TRUE(reply.has_value());
   EXPECT_EQ(reply->text(), Formatted("<ERROR: %d>\n", driver::kInterfaceNotFound));
   EXPECT_EQ(reply->header.type, kvhost::kErrorText);
@@ -171,10 +180,9 @@ TEST_F(CanSessionTest, DriverFailureAtStartIsReportedAndEndsTheConnection) {
 }
 
 TEST_F(CanSessionTest, RejectedBaudRateFailsTheStart) {
-  kvhost::HostClient host = ConnectHost();
-  UsePort(ConnectionAt(0), "CAN1");
-  ConnectionAt(0).settings.runMode.set("NORMAL");  // built-in database at the host's rate: 0
-  ExpectStartFails(host, Formatted("<ERROR: %d>\n", driver::kInvalidPropertyValue));
+  // The built-in database at the host's rate: 0.
+  ExpectStartFails({kCan1, "SET_PROP_SESSION_RUNMODE=NORMAL"},
+                   Formatted("<ERROR: %d>\n", driver::kInvalidPropertyValue));
 }
 
 }  // namespace

@@ -8,18 +8,17 @@
 #include <vector>
 
 #include "tarvix/TarvixControl.h"
-#include "tests/session/CanSessionFixture.h"
+#include "tests/support/BusSessionFixture.h"
 
 namespace kvtest {
 namespace {
 
 using Bytes = std::vector<uint8_t>;
-using nKV_DLL300::SessionSettings;
 
 constexpr uint32_t kTxId = 0x123;
 constexpr uint8_t kTypeFdBrs = 0x18;
 constexpr uint8_t kEchoFlag = 0x80;
-constexpr uint32_t kRecordPeriodMs = 100;
+const std::string kRecordPeriod = "SET_PROP_TX_TIME_DATA=100";
 constexpr double kUnitsPerSecond = 1e7;  // record time stamps count 100 ns
 // Record messages that pass while a stopped frame must not be counted again (at 100 ms each,
 // far longer than the 50 ms repetition).
@@ -40,24 +39,21 @@ bool AnyTransmitCall() {
   return false;
 }
 
-class TransmitTest : public CanSessionTest {
+class TransmitTest : public BusSessionTest {
  protected:
   // Slot 0: a CAN session on CAN3 at the test bus's rates, classic unless `canIoMode` says FD.
   kvhost::HostClient Transmitter(uint32_t canIoMode = 0, uint8_t logTransmitted = 0) {
-    return StartedHost(0, "CAN3", [&](SessionSettings& s) {
-      s.runMode.set("NORMAL");
-      s.baudRate.store(500000);
-      s.canFdBaudRate.store(2000000);
-      s.canIoMode.store(canIoMode);
-      s.logTransmittedFrames.store(logTransmitted);
-      s.txTimeData.store(kRecordPeriodMs);
-    });
+    return StartedHost({"SET_PROP_SESSION_PORTNAME=CAN3", "SET_PROP_SESSION_RUNMODE=NORMAL",
+                        "SET_PROP_SESSION_BAUDRATE=500000",
+                        "SET_PROP_SESSION_CANFD_BAUDRATE=2000000",
+                        "SET_PROP_SESSION_CAN_IOMODE=" + std::to_string(canIoMode),
+                        "SET_PROP_SESSION_LOG_TRANSMITTED_FRAMES=" + std::to_string(logTransmitted),
+                        kRecordPeriod});
   }
 
   // Watches CAN4 as the bus runs, with a record message every 100 ms.
-  kvhost::HostClient Monitor(size_t slot = 1) {
-    return StartedHost(slot, "CAN4",
-                       [](SessionSettings& s) { s.txTimeData.store(kRecordPeriodMs); });
+  kvhost::HostClient Monitor() {
+    return StartedHost({"SET_PROP_SESSION_PORTNAME=CAN4", kRecordPeriod});
   }
 
   // Sends each property message and checks its acknowledgement, "<ACK: NAME>\n".
@@ -308,7 +304,7 @@ TEST_F(TransmitTest, EndingTheSessionStopsACyclicFrame) {
       EXPECT_EQ(farewell->text(), "<ERROR: Heartbeat message missing| TCP Client disconnect> \n");
       ASSERT_TRUE(WaitUntil([&] { return service().statistics().connectionsEnded.load() >= 1; }));
       EXPECT_EQ(service().statistics().connectionsEnded.load(), 1u) << "the active host was ended";
-      kvhost::HostClient watcher = Monitor(0);
+      kvhost::HostClient watcher = Monitor();
       for (int i = 0; i < kQuietMessages; ++i) {
         SendAndWaitDispatched(watcher, "CMD_HEARTBEAT");
         EXPECT_EQ(NextCount(watcher), 0u);
@@ -320,7 +316,7 @@ TEST_F(TransmitTest, EndingTheSessionStopsACyclicFrame) {
 }
 
 TEST_F(TransmitTest, TransmitPropertiesAreAcknowledgedOnlyOnACanSession) {
-  kvhost::HostClient host = StartedHost(0, "CAN3");
+  kvhost::HostClient host = StartedHost({"SET_PROP_SESSION_PORTNAME=CAN3"});
   Define(host, kTxProperties);
   kvhost::HostClient portOnly = HostOnPort("CAN2");  // a CAN port, but no session yet
   ExpectTxPropertiesDropped(portOnly, "<TCP Error: ");
