@@ -61,16 +61,6 @@ TEST_F(DatabaseKindsTest, SessionsOpenOnTheirDatabasesAndReportItsSettings) {
   }
 }
 
-TEST_F(DatabaseKindsTest, UnknownModeAndMissingNamesAreRefused) {
-  kxRef s = 0;
-  EXPECT_EQ(kxCreateSession(":can:", "", "", "CAN1", 7, &s), driver::kInvalidMode);
-  EXPECT_EQ(kxCreateSession(nullptr, "", "", "CAN1", 6, &s), driver::kInvalidName);
-  EXPECT_EQ(kxCreateSession(":can:", "", "", "CAN1", 6, nullptr), driver::kBufferMissing);
-  EXPECT_EQ(kxCreateSession(":can:", "", "", "CAN1", driver::kModeOutputQueued, &s),
-            driver::kFrameNotFound)
-      << "an output session needs frames";
-}
-
 TEST_F(DatabaseKindsTest, InMemoryDatabaseHoldsClustersAndFrames) {
   kxRef db = 0;
   kxRef cluster = 0;
@@ -108,21 +98,6 @@ TEST_F(DatabaseKindsTest, InMemoryDatabaseHoldsClustersAndFrames) {
   EXPECT_EQ(
       kxCreateSession(":memory123", "Cluster", "TxFrame", "CAN3", driver::kModeOutputQueued, &s),
       driver::kDatabaseNotFound);
-}
-
-TEST_F(DatabaseKindsTest, SameNameOpenedTwiceStaysUntilTheLastClose) {
-  kxRef a = 0;
-  kxRef b = 0;
-  ASSERT_EQ(kxdbOpenDatabase(":memory7", &a), 0);
-  ASSERT_EQ(kxdbOpenDatabase(":memory7", &b), 0);
-  EXPECT_EQ(a, b);
-  kxRef cluster = 0;
-  ASSERT_EQ(kxdbCreateObject(a, driver::kClassCluster, "Cluster", &cluster), 0);
-  EXPECT_EQ(kxdbCloseDatabase(a, 0), 0);
-  kxRef again = 0;
-  EXPECT_EQ(kxdbCreateObject(b, driver::kClassCluster, "Cluster", &again), 0);
-  EXPECT_EQ(again, cluster);
-  EXPECT_EQ(kxdbCloseDatabase(b, 0), 0);
 }
 
 using HardwareListingTest = TarvixTest;
