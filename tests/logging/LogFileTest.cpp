@@ -45,21 +45,6 @@ TEST(LogFileNameTest, OnlyPlainNamesAreFileNames) {
 
 using LogFileTest = LogSessionTest;
 
-// An empty name is a file of the bare extension; a run without frames leaves the header alone.
-TEST_F(LogFileTest, EmptyRunLeavesTheHeaderOfItsType) {
-  const std::string binaryHeader(reinterpret_cast<const char*>(kBinaryLogFileHeaderBytes.data()),
-                                 12);
-  for (const auto& [type, file, expected] :
-       {std::tuple{kLogTypeText, ".txt", std::string(kHeader) + "\n"},
-        std::tuple{kLogTypeBinary, ".zfl", binaryHeader}}) {
-    settings().logFileType.store(type);
-    OpenLogFile(log(), kHeader);
-    CloseLogFile(log());
-    EXPECT_EQ(ReadLog(file), expected);
-  }
-  EXPECT_TRUE(SentMessages().empty());
-}
-
 TEST_F(LogFileTest, SecondRunWithTheSameNameKeepsOnlyItsOwnFrames) {
   for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
     settings().logFileType.store(type);
@@ -174,6 +159,27 @@ TEST_F(LogFileTest, TypeChangedDuringTheRunKeepsTheFileItsFormat) {
   ASSERT_TRUE(contents);
   EXPECT_EQ(*contents,
             std::string(kHeader) + "\n09:05:03,042\t100\t07  01  02  03  04  05  06  07  \t8\tS\n");
+}
+
+// A J1939 message far longer than a CAN FD frame is written whole, as a line and as a record.
+TEST_F(LogFileTest, LongJ1939MessagesAreWrittenWhole) {
+  settings().applicationProtocol.store(1);
+  const std::vector<uint8_t> batch = Batch({{.identifier = 0x2000'0000 | 0x18EF00FE,
+                                             .type = 0xC0,
+                                             .info = 1785 / 256,
+                                             .payload = Counting(1785),
+                                             .lengthByte = 1785 % 256}});
+  for (uint8_t type : {kLogTypeText, kLogTypeBinary}) {
+    settings().logFileType.store(type);
+    settings().logFileName.set("j1939");
+    OpenLogFile(log(), kHeader);
+    WriteCanLog(log(), batch.data(), static_cast<uint32_t>(batch.size()), 1);
+    CloseLogFile(log());
+  }
+  const std::string text = ReadLog("j1939.txt").value_or("");
+  EXPECT_NE(text.find("\t1785\tE\n"), std::string::npos);
+  EXPECT_EQ(text.size(), kHeader.size() + 1 + 13 + 9 + 4 * 1785 + 6 + 2);
+  EXPECT_EQ(ReadLog("j1939.zfl").value_or("").size(), 12u + 16u + 1792u);
 }
 
 // A file size limit stands for a full disk: writes beyond it fail (EFBIG), for root too.

@@ -199,14 +199,5 @@ TEST(TextLogFormat, LinLengthAboveEightPrintsOnlyTheFrameBytes) {
             "09:05:03,042\t10\t01  02  03  04  05  06  07  08  \t200\tS\n");
 }
 
-TEST(TextLogFormat, HeaderLinesNameTheColumns) {
-  EXPECT_EQ(kCanTextLogHeader, "Timestamp\tID\tPayload\tPayload Length\tType\tName");
-  EXPECT_EQ(LinTextLogHeader(1), "Timestamp\tID\tPayload\tPayload Length\tChecksum\tType\t");
-  EXPECT_EQ(LinTextLogHeader(0), "Timestamp\tID\tPayload\tPayload Length\tType\t");
-  EXPECT_EQ(kFlexRayTextLogHeader,
-            "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle "
-            "Number\tChannel\tStartup\tSync\tPreamble");
-}
-
 }  // namespace
 }  // namespace nKV_DLL300

@@ -93,23 +93,6 @@ inline std::optional<std::vector<uint8_t>> ReadBytes(const std::string& file,
   return bytes;
 }
 
-// Reads an integer attribute of an object; nullopt when missing.
-inline std::optional<int64_t> ReadIntAttribute(const std::string& file, const std::string& object,
-                                               const std::string& name) {
-  H5Eset_auto2(H5E_DEFAULT, nullptr, nullptr);
-  const hid_t f = H5Fopen(file.c_str(), H5F_ACC_RDONLY, H5P_DEFAULT);
-  if (f < 0) return std::nullopt;
-  std::optional<int64_t> value;
-  if (H5Aexists_by_name(f, object.c_str(), name.c_str(), H5P_DEFAULT) > 0) {
-    const hid_t a = H5Aopen_by_name(f, object.c_str(), name.c_str(), H5P_DEFAULT, H5P_DEFAULT);
-    int64_t v = 0;
-    if (a >= 0 && H5Aread(a, H5T_NATIVE_INT64, &v) >= 0) value = v;
-    if (a >= 0) H5Aclose(a);
-  }
-  H5Fclose(f);
-  return value;
-}
-
 // Makes a channel claim `size` bytes (without writing them); false when that fails.
 inline bool SetExtent(const std::string& file, const std::string& dataset, hsize_t size) {
   H5Eset_auto2(H5E_DEFAULT, nullptr, nullptr);

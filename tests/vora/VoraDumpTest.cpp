@@ -78,30 +78,32 @@ TEST_F(VoraDump, ListsGroupsChannelsAndTheirProperties) {
             "    \"QV_network_protocol\" = 1\n");
 }
 
-TEST_F(VoraDump, DecodesOneChannelToTheTextLogOfItsBus) {
-  AddChannel("/'Bus'/'CAN1'", 0, kCanFrames, BinaryRecordLayout::kCanVariable);
-  AddChannel("/'Bus'/'LIN1'", 2, kLinFrames, BinaryRecordLayout::kFixed24);
-  const auto run = Dump("--decode -g Bus -c CAN1");
-  EXPECT_EQ(run.exitCode, 0) << run.err;
-  EXPECT_EQ(run.out,
-            "Timestamp\tID\tPayload\tPayload Length\tType\tName\n"
-            "09:05:03,042\t321\t\t0\tS/R\n"
-            "09:05:03,042\t201\t01  02  03  04  05  06  07  08  09  \t9\tFD\n");
-}
-
-TEST_F(VoraDump, DecodesEveryChannelUnderItsOwnBanner) {
+// One channel named by group and channel is decoded alone; without names every channel is, each
+// under its own banner.
+TEST_F(VoraDump, DecodesChannelsToTheTextLogOfTheirBus) {
+  AddChannel("/'G'/'CAN1'", 0, kCanFrames, BinaryRecordLayout::kCanVariable);
   AddChannel("/'G'/'FR'", 1, kFlexRayFrames, BinaryRecordLayout::kFlexRayVariable);
   AddChannel("/'G'/'LIN1'", 2, kLinFrames, BinaryRecordLayout::kFixed24);
-  const auto run = Dump("-d --lin-checksum");
-  EXPECT_EQ(run.exitCode, 0) << run.err;
-  EXPECT_EQ(run.out,
-            "== group \"G\" channel \"FR\" ==\n"
-            "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle "
-            "Number\tChannel\tStartup\tSync\tPreamble\n"
-            "09:05:03,042\t28\t07  \t1\t9\tB\t-\t-\t-\n"
-            "== group \"G\" channel \"LIN1\" ==\n"
-            "Timestamp\tID\tPayload\tPayload Length\tChecksum\tType\t\n"
-            "09:05:03,042\t13\tde  ad  00  00  00  00  00  00  \t2\t3c\tS\n");
+  const std::string can =
+      "Timestamp\tID\tPayload\tPayload Length\tType\tName\n"
+      "09:05:03,042\t321\t\t0\tS/R\n"
+      "09:05:03,042\t201\t01  02  03  04  05  06  07  08  09  \t9\tFD\n";
+  const std::pair<const char*, std::string> cases[] = {
+      {"--decode -g G -c CAN1", can},
+      {"-d --lin-checksum", "== group \"G\" channel \"CAN1\" ==\n" + can +
+                                "== group \"G\" channel \"FR\" ==\n"
+                                "Timestamp\tSlot ID\tPayload\tPayload Length\tCycle "
+                                "Number\tChannel\tStartup\tSync\tPreamble\n"
+                                "09:05:03,042\t28\t07  \t1\t9\tB\t-\t-\t-\n"
+                                "== group \"G\" channel \"LIN1\" ==\n"
+                                "Timestamp\tID\tPayload\tPayload Length\tChecksum\tType\t\n"
+                                "09:05:03,042\t13\tde  ad  00  00  00  00  00  00  \t2\t3c\tS\n"},
+  };
+  for (const auto& [arguments, expected] : cases) {
+    const auto run = Dump(arguments);
+    EXPECT_EQ(run.exitCode, 0) << run.err;
+    EXPECT_EQ(run.out, expected) << arguments;
+  }
 }
 
 TEST_F(VoraDump, ChannelsWithoutAKnownBusOrFilesOfOtherKindsFail) {

@@ -72,10 +72,7 @@ TEST_F(VoraLogTest, NamesEchoFramesAndRepeatedRuns) {
       Batch({{.identifier = 0x100, .payload = Counting(8)},
              {.identifier = 0x7FF, .flags = 0x80, .payload = Counting(8)}});
   for (const auto& [group, channel, logTransmitted] :
-       std::vector<std::tuple<std::string, std::string, uint8_t>>{{"", "", 0},
-                                                                  {"Body bus", "CAN1 @ 500k", 1},
-                                                                  {"a/b", "50%", 0},
-                                                                  {"it's", ".hidden", 1}}) {
+       std::vector<std::tuple<std::string, std::string, uint8_t>>{{"", "", 0}, {"a/b", "50%", 1}}) {
     settings().voraGroupName.set(group);
     settings().voraChannelName.set(channel);
     settings().logTransmittedFrames.store(logTransmitted);
@@ -86,7 +83,6 @@ TEST_F(VoraLogTest, NamesEchoFramesAndRepeatedRuns) {
     EXPECT_EQ(contents->channel.name, channel);
     EXPECT_EQ(contents->bytes.size(), logTransmitted ? 48u : 24u) << group;
   }
-  EXPECT_EQ(VoraChannelPath("", ""), "/''/''");
 }
 
 // A file the library cannot create (its directory is a file) is silent: the run logs nothing.
