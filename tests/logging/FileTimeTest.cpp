@@ -20,16 +20,10 @@ struct DateCase {
 };
 void PrintTo(const DateCase& c, std::ostream* os) { *os << c.name; }
 
+// The calendar rules themselves are swept below; here: the ends of the range and truncation.
 const DateCase kDates[] = {
     {"Epoch1601IsMonday", 0, {1601, 1, 1, 1, 0, 0, 0, 0}},
     {"LastTickOfFirstDay", kFileTimeTicksPerDay - 1, {1601, 1, 1, 1, 23, 59, 59, 999}},
-    {"UnixEpochThursday", kFileTimeUnixEpoch, {1970, 1, 4, 1, 0, 0, 0, 0}},
-    {"CenturyLeapDay2000",
-     kFileTimeUnixEpoch + 951'782'400ull * kFileTimeTicksPerSecond,
-     {2000, 2, 2, 29, 0, 0, 0, 0}},
-    {"Year1900HasNoLeapDay",
-     kFileTimeUnixEpoch - 2'203'891'200ull * kFileTimeTicksPerSecond,
-     {1900, 3, 4, 1, 0, 0, 0, 0}},
     {"MillisecondsTruncated", 133'604'103'030'429'999ull, {2024, 5, 5, 17, 9, 5, 3, 42}},
     {"LargestConvertible", 0x7FFF'FFFF'FFFF'FFFFull, {30828, 9, 4, 14, 2, 48, 5, 477}},
 };

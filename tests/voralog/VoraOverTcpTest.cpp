@@ -48,7 +48,7 @@ class VoraBusTest : public VoraOverTcpTest, public ::testing::WithParamInterface
 
 // The channel holds exactly the records of the binary log of the bus, under the names and with the
 // properties that the host gave (vora-dump and vora.dll's own tests read such files with HDF5).
-TEST_P(VoraBusTest, LogHoldsTheBusRecordsReadableByEveryReader) {
+TEST_P(VoraBusTest, LogHoldsTheBusRecordsUnderTheGivenNames) {
   const BusCase& c = GetParam();
   InstallLibrary(drive_);
   std::vector<std::string> properties = c.properties;
