@@ -8,6 +8,7 @@
 #include "hostlink/LinkedSession.h"
 #include "logging/LogFileName.h"
 #include "logging/VoraLog.h"
+#include "vora/VoraApi.h"
 
 namespace nKV_DLL300 {
 
@@ -53,6 +54,11 @@ void OpenLogFile(SessionLog& log, std::string_view headerLine) {
       CanBinaryRecordLayout(settings.canIoMode.load(), settings.applicationProtocol.load()));
   log.setLinChecksum(settings.logChecksum.load());
   const std::string path = NameLogFile(log, logType);
+  if (!path.empty() && !log.claimFile(path)) {
+    // Another session logs to this file: it is not opened a second time, and that log stays whole.
+    log.fail(kLogOpenFailed);
+    return;
+  }
   switch (logType) {
     case kLogTypeText:
       OpenTextLog(log, path, headerLine);
@@ -66,6 +72,7 @@ void OpenLogFile(SessionLog& log, std::string_view headerLine) {
     default:
       break;  // named nothing (reported above) and opens nothing
   }
+  if (!log.isOpen() && log.voraFile == kVorNoHandle) log.releaseFile();
 }
 
 void CloseLogFile(SessionLog& log) {
@@ -82,6 +89,7 @@ void CloseLogFile(SessionLog& log) {
     default:
       break;
   }
+  log.releaseFile();
   log.setOpenedType(-1);
 }
 

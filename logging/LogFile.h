@@ -15,12 +15,16 @@ namespace nKV_DLL300 {
 //   2 measurement data: the library file and channel of OpenVoraLog (logging/VoraLog.h)
 // Failures are reported at once and the session goes on: a name or directory failure reports
 // -20 and the open that follows fails and reports -20 again (two reports); an open failure -20;
-// a header not written whole -21 (the file stays open). The header line is used by type 0 only.
+// a header not written whole -21 (the file stays open). A file that another session's log has open
+// (LogNameRegistry) is not opened: -20 once, for every log type, and the other log stays as it is.
+// The file stays claimed while it is open; a failed open releases it at once. The header line is
+// used by type 0 only.
 // Poll thread. Never throws.
 void OpenLogFile(SessionLog& log, std::string_view headerLine);
 
 // Called by the session's stop, every time, after the poll thread has ended: closes what the run
-// opened, if anything, and reports nothing unless buffered lines could not be written (-21).
+// opened, if anything, releases its file for other sessions, and reports nothing unless buffered
+// lines could not be written (-21).
 // Stopping thread. Never throws.
 void CloseLogFile(SessionLog& log);
 

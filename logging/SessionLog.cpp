@@ -2,10 +2,12 @@
 #include "logging/SessionLog.h"
 
 #include <cstdio>
+#include <utility>
 
 #include "hostlink/LinkedSession.h"
 #include "hostlink/MessageHeader.h"
 #include "hostlink/SendReply.h"
+#include "logging/LogNameRegistry.h"
 #include "platform/Drive.h"
 
 namespace nKV_DLL300 {
@@ -24,6 +26,22 @@ void SendLogError(const LinkedSession& session, int32_t code) {
 
 SessionLog::~SessionLog() {
   if (logFile_ != nullptr) std::fclose(logFile_);
+  releaseFile();
+}
+
+bool SessionLog::claimFile(const std::string& runtimePath) {
+  releaseFile();
+  std::string file = platform::ResolvedNativePath(runtimePath);
+  if (file.empty()) return true;
+  if (!TheLogNameRegistry().claim(file)) return false;
+  claimedFile_ = std::move(file);
+  return true;
+}
+
+void SessionLog::releaseFile() {
+  if (claimedFile_.empty()) return;
+  TheLogNameRegistry().release(claimedFile_);
+  claimedFile_.clear();
 }
 
 bool SessionLog::openStream(const std::string& runtimePath, const char* mode) {

@@ -31,7 +31,8 @@ inline constexpr char kLogErrorFormat[] = "<ERROR:LOG FILE: %d> \n";
 class SessionLog {
  public:
   explicit SessionLog(LinkedSession& session) : session_(session) {}
-  // A stream still open (a session destroyed without stop) is closed without a report.
+  // A stream still open (a session destroyed without stop) is closed without a report, and the
+  // file it claimed is released.
   ~SessionLog();
   SessionLog(const SessionLog&) = delete;
   SessionLog& operator=(const SessionLog&) = delete;
@@ -67,6 +68,13 @@ class SessionLog {
   void flushIfDue();
   static constexpr uint64_t kFlushPeriodMs = 1000;
 
+  // Claims the file `runtimePath` reaches for this session (LogNameRegistry); false when another
+  // session's log holds it. A path that cannot be resolved claims nothing and returns true: its
+  // open fails by itself. A file claimed before is released first.
+  [[nodiscard]] bool claimFile(const std::string& runtimePath);
+  // Releases the claimed file, if any.
+  void releaseFile();
+
   // Stores `code` in the session's lastStatus and sends it to the host at once, if the host can
   // take it now (SendTextWithoutWaiting).
   void fail(int32_t code);
@@ -85,6 +93,7 @@ class SessionLog {
   bool unflushed_ = false;  // bytes were written since the last flush
   Stopwatch flushWatch_;    // since the last flush (or the open)
   int32_t openedType_ = -1;
+  std::string claimedFile_;  // the resolved path claimed in the registry; "" when none
   BinaryRecordLayout canLayout_ = BinaryRecordLayout::kFixed24;
   uint8_t linChecksum_ = 0;
   char line_[kLineBufferSize];

@@ -2,6 +2,7 @@
 #include "platform/Drive.h"
 
 #include <cerrno>
+#include <climits>
 #include <cstdlib>
 #include <vector>
 
@@ -34,6 +35,12 @@ bool ResolveComponents(std::string_view rest, std::vector<std::string_view>& par
   return true;
 }
 
+// realpath(3) of `path`; empty when it does not exist or cannot be resolved.
+std::string RealPath(const std::string& path) {
+  char resolved[PATH_MAX];
+  return ::realpath(path.c_str(), resolved) != nullptr ? std::string(resolved) : std::string();
+}
+
 }  // namespace
 
 std::string DriveDirectory() {
@@ -61,6 +68,17 @@ std::optional<std::string> MapRuntimePath(std::string_view runtimePath) {
     native += part;
   }
   return native;
+}
+
+std::string ResolvedNativePath(const std::string& runtimePath) {
+  const std::optional<std::string> native = MapRuntimePath(runtimePath);
+  if (!native) return {};
+  if (std::string file = RealPath(*native); !file.empty()) return file;
+  const size_t slash = native->rfind('/');
+  if (slash == std::string::npos) return {};
+  const std::string directory = RealPath(slash == 0 ? "/" : native->substr(0, slash));
+  if (directory.empty()) return {};
+  return (directory == "/" ? "" : directory) + native->substr(slash);
 }
 
 std::FILE* OpenFile(const std::string& runtimePath, const char* mode) {

@@ -18,6 +18,13 @@ std::string DriveDirectory();
 // embedded NUL, or ".." that would climb above the drive's root. "." and ".." are resolved.
 std::optional<std::string> MapRuntimePath(std::string_view runtimePath);
 
+// The one native name of the file a runtime path reaches: the mapped path with every symbolic
+// link, "." and ".." resolved (realpath of the file when it exists, else of its directory followed
+// by the file's own name), so that drive letters in either case, separators and links that reach
+// one file give one string. Empty when the path cannot be mapped or its directory does not exist.
+// Any thread; touches the file system.
+std::string ResolvedNativePath(const std::string& runtimePath);
+
 // fopen of a runtime path. Returns null with errno ENOENT when the path cannot be mapped.
 std::FILE* OpenFile(const std::string& runtimePath, const char* mode);
 

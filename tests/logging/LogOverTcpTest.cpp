@@ -1,6 +1,8 @@
 // Logs written by live sessions against the simulated hardware, read back from the test's drive.
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <functional>
 #include <iomanip>
 #include <map>
 #include <regex>
@@ -11,9 +13,11 @@
 #include "driver/Sessions.h"
 #include "driver/tarvix.h"
 #include "logging/BinaryLogFormat.h"
+#include "logging/MeasurementLibrary.h"
 #include "logging/TextLogFormat.h"
 #include "tarvix/TarvixControl.h"
 #include "tests/logging/LogRunFixture.h"
+#include "tests/voralog/VoraSupport.h"
 
 namespace kvtest {
 namespace {
@@ -37,6 +41,11 @@ std::string AfterTime(const std::string& line) {
 
 class LogOverTcpTest : public LogRunTest {
  protected:
+  void TearDown() override {
+    LogRunTest::TearDown();
+    UnloadMeasurementLibrary();  // after the service stopped every session
+  }
+
   // Sends one classic frame on `sender` through an output session of the test's own and waits
   // until it went out.
   void SendOneFrame(const char* sender, uint32_t identifier) {
@@ -268,6 +277,103 @@ TEST_F(LogOverTcpTest, BadFilesAndNamesAreReported) {
   EXPECT_FALSE(std::filesystem::exists(drive_.Native("QV-RT\\outside.txt")));
   EXPECT_FALSE(std::filesystem::exists(drive_.Native("outside.txt")));
   EXPECT_EQ(Lines(LogFile("KelvaneLog.txt")).at(0), std::string(kCanTextLogHeader) + "\n");
+}
+
+// The bus a whole log holds ("CAN" or "LIN"), or what tears it. A binary record says its bus by its
+// type (CAN below 0x40, LIN 0x40 to 0x42); a text line by its identifier and cells.
+std::string RecordsBus(const uint8_t* bytes, size_t size) {
+  size_t remaining = 0;
+  std::map<bool, int> lin;
+  for (const driver::RawFrameView& record :
+       ReadRecords(bytes, size, BinaryRecordLayout::kFixed24, &remaining)) {
+    ++lin[record.header.type >= 0x40 && record.header.type <= 0x42];
+  }
+  if (remaining != 0) return "torn: a cut record";
+  if (lin.empty()) return "empty";
+  if (lin.size() != 1) return "torn: records of both buses";
+  return lin.begin()->first ? "LIN" : "CAN";
+}
+
+std::string TextBus(const std::string& file) {
+  const std::vector<std::string> lines = Lines(file);
+  const std::regex can(R"(^(100|1a0|321|18fef100|0)\t((?:[0-9a-f]{2}  )*)\t\d+\t(S|E|S/R)\n$)");
+  const std::regex lin(R"(^1[0-3]\t(?:[0-9a-f]{2}  ){8}\t\d\t(S|NR)\n$)");
+  const bool isCan = !lines.empty() && lines[0] == std::string(kCanTextLogHeader) + "\n";
+  if (!isCan && (lines.empty() || lines[0] != std::string(kLinTextLogHeader) + "\n"))
+    return "torn: no header";
+  for (size_t i = 1; i < lines.size(); ++i) {
+    if (!std::regex_match(AfterTime(lines[i]), isCan ? can : lin)) return "torn: " + lines[i];
+  }
+  return file.ends_with('\n') ? (isCan ? "CAN" : "LIN") : "torn: a cut line";
+}
+
+struct SharedNameCase {
+  const char* type;
+  const char* file;
+  std::function<std::string(const std::string& file)> bus;  // the bus of the whole log
+  // Whether the second session's frames reached the file while the first still writes it (the
+  // first one's are mostly in its buffer then); none for a file no reader may open meanwhile.
+  std::function<bool(const std::string& file)> holdsLinWhileOpen;
+};
+
+// CAN1 logs under a name; LIN1 asking for the same file while that log is open gets the open
+// failure and CAN1's log stays whole; once CAN1's session ended, LIN1 logs under the name.
+TEST_F(LogOverTcpTest, SecondSessionOnAnOpenLogFileGetsTheOpenFailureAndLeavesItWhole) {
+  const std::vector<SharedNameCase> cases = {
+      {"0", "shared.txt", [&](const std::string& file) { return TextBus(LogFile(file)); },
+       [&](const std::string& file) {
+         return LogFile(file).find(std::string(kLinTextLogHeader) + "\n") != std::string::npos;
+       }},
+      {"1", "shared.zfl",
+       [&](const std::string& name) {
+         const std::string file = LogFile(name);
+         if (!HasBinaryLogMagic(reinterpret_cast<const uint8_t*>(file.data()), file.size()))
+           return std::string("torn: no header");
+         return RecordsBus(reinterpret_cast<const uint8_t*>(file.data()) + 12, file.size() - 12);
+       },
+       [&](const std::string& name) {
+         const std::string file = LogFile(name);
+         const std::vector<driver::RawFrameView> records =
+             ReadRecords(file, BinaryRecordLayout::kFixed24);
+         return std::any_of(records.begin(), records.end(),
+                            [](const auto& r) { return r.header.type >= 0x40; });
+       }},
+      {"2", "shared.vora",
+       [&](const std::string& file) {
+         const std::optional<ChannelContents> contents = OnlyChannel(LogPath(file));
+         if (!contents) return std::string("torn: unreadable");
+         const std::string bus = RecordsBus(contents->bytes.data(), contents->bytes.size());
+         const int64_t protocol = bus == "LIN" ? 2 : 0;
+         return contents->channel.IntegerProperty("QV_network_protocol") == protocol
+                    ? bus
+                    : "torn: protocol of the other bus";
+       }},
+  };
+  InstallLibrary(drive_);
+  LocateMeasurementLibrary();
+  const auto port = [](const std::string& name, const char* type) {
+    std::vector<std::string> properties = {
+        "SET_PROP_SESSION_PORTNAME=" + name, "SET_PROP_LOGFILE_NAME=shared",
+        std::string("SET_PROP_LOGFILE_TYPE=") + type, "SET_PROP_LOGFILE=1"};
+    if (name == "LIN1") properties.push_back("SET_PROP_SESSION_BAUDRATE=19200");
+    return properties;
+  };
+  for (const SharedNameCase& c : cases) {
+    SCOPED_TRACE(c.file);
+    std::vector<std::string> errors;
+    kvhost::HostClient first = Configured(port("CAN1", c.type), errors);
+    WaitForRecords(first, kvhost::kCanRecords, errors, 1);
+    EXPECT_EQ(Run(port("LIN1", c.type), kvhost::kLinRecords, 1),
+              std::vector<std::string>{"<ERROR:LOG FILE: -20> \n"});
+    if (c.holdsLinWhileOpen) EXPECT_FALSE(c.holdsLinWhileOpen(c.file));
+    WaitForRecords(first, kvhost::kCanRecords, errors, 1);
+    Terminate(first);
+    EXPECT_TRUE(errors.empty());
+    EXPECT_EQ(c.bus(c.file), "CAN");
+
+    EXPECT_TRUE(Run(port("LIN1", c.type), kvhost::kLinRecords, 1).empty());
+    EXPECT_EQ(c.bus(c.file), "LIN");
+  }
 }
 
 }  // namespace
