@@ -80,7 +80,9 @@ class TransmitTest : public BusSessionTest {
     kvhost::HostClient host = ConnectHost();
     auto reply = Command(host, "SET_PROP_SESSION_PORTNAME=" + port);
     EXPECT_TRUE(reply.has_value());
-    if (reply) EXPECT_EQ(reply->text(), "<ACK: SET_PROP_SESSION_PORTNAME " + port + ">");
+    if (reply) {
+      EXPECT_EQ(reply->text(), "<ACK: SET_PROP_SESSION_PORTNAME " + port + ">");
+    }
     return host;
   }
 
@@ -330,8 +332,9 @@ TEST_F(TransmitTest, LinAndFlexRaySessionsOnlyAcknowledgeTransmitCommands) {
     tarvix::ResetToDefaults();
     StartService();
     kvhost::HostClient host = HostOnPort(port);
-    if (std::string(port) == "LIN1")
+    if (std::string(port) == "LIN1") {
       ASSERT_TRUE(Command(host, "SET_PROP_SESSION_BAUDRATE=19200").has_value());
+    }
     Expect(host, "CMD_SESSION_START");
     tarvix::StartRecording();
     Expect(host, "CMD_TX_START");
