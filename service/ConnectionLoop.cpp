@@ -96,6 +96,7 @@ int32_t AcceptHost(ServiceContext& context) {
   setup.heartbeatLimitMs = context.options.heartbeatLimitMs;
   slot->socket = socket;
   slot->connection = std::make_unique<HostConnection>(socket, std::move(setup));
+  slot->published.store(slot->connection.get());
   context.stats.connectionsAccepted++;
   context.stats.connectionsOpen++;
   SendText(*slot->connection, kGreetingText, nullptr, kMessageText);
@@ -147,6 +148,7 @@ void FreeSlot(ServiceContext& context, ConnectionSlot& slot) {
   if (!slot.connection) return;
   EndSession(*slot.connection);
   CloseConnection(*slot.connection);
+  slot.published.store(nullptr);
   slot.connection.reset();
   slot.socket = net::kInvalidSocket;
   context.stats.connectionsEnded++;

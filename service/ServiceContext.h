@@ -37,9 +37,14 @@ struct ServiceOptions {
 };
 
 // One slot of the connection table: free (invalid socket, no connection) or occupied.
+// socket and connection are the service thread's.
 struct ConnectionSlot {
   platform::net::SocketHandle socket = platform::net::kInvalidSocket;
   std::unique_ptr<HostConnection> connection;
+  // The connection as other threads (tests, diagnostics) may see it: published once it is built,
+  // withdrawn before it is destroyed. Any thread; a reader keeps using it only while it knows by
+  // other means that the host is still connected.
+  std::atomic<HostConnection*> published{nullptr};
 };
 
 // Construction starts the service thread. After construction every field below is the service

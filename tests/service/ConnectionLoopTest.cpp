@@ -172,8 +172,8 @@ TEST_F(PartlySentReplyTest, RestOfAPartlySentMessageFollowsWhenTheHostReadsOrLea
     StartService();
     kvhost::HostClient host;
     ASSERT_TRUE(host.ConnectWithReceiveBuffer("127.0.0.1", port(), kSmallBuffer)) << host.error();
-    ASSERT_TRUE(WaitUntil([&] { return service().connections[0].connection != nullptr; }));
-    const nKV_DLL300::HostConnection& connection = *service().connections[0].connection;
+    ASSERT_TRUE(WaitUntil([&] { return service().connections[0].published.load() != nullptr; }));
+    const nKV_DLL300::HostConnection& connection = *service().connections[0].published.load();
     SendAndWaitDispatched(host, "CMD_GET_HARDWARE_INFO");
     ASSERT_TRUE(connection.hasPendingOutput()) << "the reply was taken whole";
     if (leaves) host.StopSending();
