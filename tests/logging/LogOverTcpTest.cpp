@@ -347,7 +347,8 @@ TEST_F(LogOverTcpTest, SecondSessionOnAnOpenLogFileGetsTheOpenFailureAndLeavesIt
          return contents->channel.IntegerProperty("QV_network_protocol") == protocol
                     ? bus
                     : "torn: protocol of the other bus";
-       }},
+       },
+       nullptr},
   };
   InstallLibrary(drive_);
   LocateMeasurementLibrary();
@@ -365,7 +366,9 @@ TEST_F(LogOverTcpTest, SecondSessionOnAnOpenLogFileGetsTheOpenFailureAndLeavesIt
     WaitForRecords(first, kvhost::kCanRecords, errors, 1);
     EXPECT_EQ(Run(port("LIN1", c.type), kvhost::kLinRecords, 1),
               std::vector<std::string>{"<ERROR:LOG FILE: -20> \n"});
-    if (c.holdsLinWhileOpen) EXPECT_FALSE(c.holdsLinWhileOpen(c.file));
+    if (c.holdsLinWhileOpen) {
+      EXPECT_FALSE(c.holdsLinWhileOpen(c.file));
+    }
     WaitForRecords(first, kvhost::kCanRecords, errors, 1);
     Terminate(first);
     EXPECT_TRUE(errors.empty());
