@@ -15,8 +15,10 @@ struct BitLength {
 };
 
 // A CAN frame (classic, remote, FD, FD with bit-rate switching) or a bus-error frame. Stuff bits
-// are counted on the frame's real bit stream (classic: with its CRC-15).
+// are counted on the frame's real bit stream (classic: with its CRC-15), a byte at a time.
 BitLength CanBitLength(const SimFrame& f);
+// The same count taken one bit at a time: the reference that CanBitLength is tested against.
+BitLength CanBitLengthBitByBit(const SimFrame& f);
 
 // Time in ns that `bits` take at `bitRate` bit/s, rounded to the nearest ns.
 int64_t BitsToNs(uint64_t bits, uint64_t bitRate);

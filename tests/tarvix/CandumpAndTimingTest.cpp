@@ -123,6 +123,30 @@ TEST(FrameTimingTest, ClassicFramesStayWithinTheStuffBitBounds) {
   }
 }
 
+// The byte-wise count (stuff-bit and CRC tables) agrees with the bit-by-bit count on every kind of
+// CAN frame; payloads lean towards long runs of equal bits, where stuff bits pile up.
+TEST(FrameTimingTest, ByteWiseCountMatchesTheBitByBitCount) {
+  constexpr uint8_t kTypes[] = {driver::kFrameCanData, driver::kFrameCanRemote,
+                                driver::kFrameCanFdData, driver::kFrameCanFdBrsData};
+  std::mt19937 random(11);
+  for (int round = 0; round < 20000; ++round) {
+    SimFrame f;
+    f.type = kTypes[round % 4];
+    const bool extended = (round / 4) % 2;
+    f.identifier = extended ? (random() & driver::kExtendedIdMask) | driver::kExtendedIdFlag
+                            : random() & 0x7FF;
+    f.length = static_cast<uint8_t>(random() % (f.type >= driver::kFrameCanFdData ? 65 : 9));
+    for (auto& b : f.payload) {
+      const uint32_t pick = random() % 4;
+      b = static_cast<uint8_t>(pick == 0 ? 0x00 : pick == 1 ? 0xFF : random());
+    }
+    const BitLength bytes = CanBitLength(f);
+    const BitLength bits = CanBitLengthBitByBit(f);
+    ASSERT_EQ(bytes.nominalBits, bits.nominalBits) << "round " << round;
+    ASSERT_EQ(bytes.dataBits, bits.dataBits) << "round " << round;
+  }
+}
+
 TEST(FrameTimingTest, FdFramesSwitchRateOnlyWithBitRateSwitching) {
   SimFrame f;
   f.identifier = 0x200;
