@@ -3,12 +3,13 @@
 
 #include "driver/tarvix.h"
 #include "qvapal/StatusBlock.h"
-#include "timing/Time.h"
 
 namespace nKV_DLL300 {
 
 namespace {
 constexpr uint64_t kPollPeriodMs = 10;
+// A stopped loop never runs again; its thread only waits to be ended (and looks once a second).
+constexpr uint64_t kStoppedWaitMs = 1000;
 }  // namespace
 
 CBusSystem::CBusSystem(HostConnection* owner, driver::BusKind kind) : LinkedSession(owner, kind) {
@@ -17,10 +18,21 @@ CBusSystem::CBusSystem(HostConnection* owner, driver::BusKind kind) : LinkedSess
 
 CBusSystem::~CBusSystem() { endForDestruction(); }
 
-void CBusSystem::endForDestruction() {
-  if (!endPollThread() || driverSession == 0) return;
-  (void)kxClear(driverSession);
+void CBusSystem::endForDestruction() { (void)endPollThreadAndClear(); }
+
+int32_t CBusSystem::endPollThreadAndClear() {
+  pollActive.store(false);
+  if (!threadRunning.load()) return 0;
+  // The clear comes first: it ends a read the thread may be waiting in. The thread only reads
+  // driverSession, which is set to 0 once it has ended.
+  const int32_t status = driverSession == 0 ? 0 : kxClear(driverSession);
+  (void)endPollThread();
+  if (status != 0) {
+    recordStatus(status);
+    return status;
+  }
   driverSession = 0;
+  return 0;
 }
 
 int32_t CBusSystem::pollOnce() {
@@ -31,9 +43,23 @@ int32_t CBusSystem::pollOnce() {
 void CBusSystem::run() {
   while (threadRunning.load()) {
     const int32_t status = pollOnce();
-    SleepFor(kPollPeriodMs);
+    pausePollThread(pollActive.load() ? kPollPeriodMs : kStoppedWaitMs);
     recordStatus(status);
   }
+}
+
+void CBusSystem::wakePollThread() {
+  {
+    std::lock_guard lock(wakeMutex);
+    wakeRequested = true;
+  }
+  wakeSignal.notify_all();
+}
+
+void CBusSystem::pausePollThread(uint64_t milliseconds) {
+  std::unique_lock lock(wakeMutex);
+  wakeSignal.wait_for(lock, std::chrono::milliseconds(milliseconds), [&] { return wakeRequested; });
+  wakeRequested = false;
 }
 
 void CBusSystem::startPollThreadWith(std::unique_ptr<nQVAPAL000::iThread> body) {
@@ -48,6 +74,7 @@ void CBusSystem::startPollThreadWith(std::unique_ptr<nQVAPAL000::iThread> body) 
 bool CBusSystem::endPollThread() {
   pollActive.store(false);
   if (!threadRunning.exchange(false)) return false;
+  wakePollThread();
   if (pollThreadController) pollThreadController->join();
   pollThreadController.reset();
   pollThread.reset();
@@ -66,9 +93,7 @@ int32_t CBusSystem::clearDriverSession() {
 }
 
 int32_t CBusSystem::stop() {
-  pollActive.store(false);
-  int32_t status = 0;
-  if (endPollThread()) status = clearDriverSession();
+  const int32_t status = endPollThreadAndClear();
   closeLogFile();
   return status;
 }

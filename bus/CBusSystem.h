@@ -2,9 +2,11 @@
 #pragma once
 
 #include <atomic>
+#include <condition_variable>
 #include <cstdint>
 #include <memory>
 #include <memory_resource>
+#include <mutex>
 
 #include "hostlink/LinkedSession.h"
 #include "logging/LogFile.h"
@@ -23,8 +25,10 @@ inline constexpr int32_t kStatusTableNotAllocated = -22;
 
 // Life cycle: constructed by CMD_SESSION_START (service thread) with pollActive and threadRunning
 // true; the bus's open operation creates the driver session; startPollThread starts the poll
-// thread, which calls pollOnce every 10 ms until threadRunning is cleared. stop() (service thread)
-// joins the thread before the driver session is cleared, so no read is in flight then.
+// thread, which calls pollOnce every 10 ms until threadRunning is cleared (after a stopped loop it
+// only waits for its end). stop() (service thread) clears the driver session's reference in the
+// driver while the thread may still wait in a read, which ends that read at once, then joins the
+// thread; only then is driverSession set to 0.
 //
 // Two threads share a session: the poll thread (run, pollLoop, reportBusState) and the service
 // thread (commands, watchdog, stop, destructor). The flags, idCount and lastStatus are atomics;
@@ -60,6 +64,10 @@ class CBusSystem : public LinkedSession {
   // lastStatus.
   void run();
 
+  // Ends a pause of the poll thread at once (pausePollThread): CMD_SESSION_STOP, stop(), a setting
+  // the loop's timing depends on. Any thread.
+  void wakePollThread();
+
   // Stores a non-zero status as lastStatus. Any thread.
   void recordStatus(int32_t status) {
     if (status != 0) lastStatus.store(status);
@@ -83,10 +91,18 @@ class CBusSystem : public LinkedSession {
   void startPollThreadWith(std::unique_ptr<nQVAPAL000::iThread> body);
   // If the poll thread still runs: clears both flags, waits for it, deletes it. True if it ran.
   bool endPollThread();
+  // If the poll thread still runs: clears the driver session (which ends a read the thread waits
+  // in), ends the thread, and then forgets the reference; a failed clear keeps it and is recorded.
+  // Returns the clear's status, 0 when the thread had already ended (nothing is cleared then).
+  int32_t endPollThreadAndClear();
   // What a destructor does: a thread that stop() did not end is ended and its driver session
   // cleared (result ignored). Every class that adds state the poll thread uses calls this first
   // in its own destructor, so the thread never runs on a half-destroyed object.
   void endForDestruction();
+
+  // Poll thread: pauses up to `milliseconds`, or less when wakePollThread is called (a wake that
+  // came while the thread was busy ends its next pause at once).
+  void pausePollThread(uint64_t milliseconds);
 
   // Closes the log file of the session, if one is open.
   void closeLogFile() { CloseLogFile(sessionLog); }
@@ -104,6 +120,9 @@ class CBusSystem : public LinkedSession {
   SessionLog sessionLog{*this};
 
  private:
+  std::mutex wakeMutex;
+  std::condition_variable wakeSignal;
+  bool wakeRequested = false;                                           // guarded by wakeMutex
   std::unique_ptr<nQVAPAL000::tThreadController> pollThreadController;  // service thread
   std::unique_ptr<nQVAPAL000::iThread> pollThread;                      // service thread
 };

@@ -14,16 +14,17 @@
 #include "hostlink/MessageHeader.h"
 #include "hostlink/SendReply.h"
 #include "logging/LogWriters.h"
-#include "timing/Time.h"
+#include "timing/Stopwatch.h"
 
 namespace nKV_DLL300 {
 
-// How a poll loop paces its reads.
+// How a poll loop paces its reads while frames flow. Either way a read that finds nothing is
+// followed by one that waits in the driver for the next frame or the loop's next duty.
 enum class ReadPacing {
-  // After at most ten nearly full reads in a row (>= 99 000 bytes), and after every other read,
-  // the thread sleeps 1 ms (CAN, FlexRay).
+  // A nearly full read (>= 99 % of the buffer) is followed by the next read at once, up to ten in
+  // a row; after every other read the thread pauses (CAN, FlexRay).
   kNearlyFullRule,
-  // The thread sleeps 1 ms after every read (LIN).
+  // The thread pauses after every read (LIN).
   kAlwaysSleep,
 };
 
@@ -39,10 +40,13 @@ class CTableSession : public CBusSystem {
   ~CTableSession() override { endForDestruction(); }
 
   // Slot 5: the poll loop. Allocates the table (none: -22 in lastStatus, and the loop does not
-  // run; the next pollOnce tries again, with the capacity then set), reads without blocking while
-  // pollActive, and sends the records and statistics at their periods. Returns the last read's
-  // status (0 if none was made, and 0 for "nothing to read yet", which is no failure: a paused
-  // session must not report it as its last error).
+  // run; the next pollOnce tries again, with the capacity then set), reads while pollActive, and
+  // sends the records and statistics at their periods. While frames flow it reads a batch, then
+  // pauses (kBusyPauseMs, or less up to the next duty); once a read finds nothing, the next one
+  // waits in the driver until a frame comes or the next duty is due (at most kQuietWaitMs). A
+  // stop ends both waits at once. Returns the last read's status (0 if none was made, when a stop
+  // ended the read, and for "nothing to read yet", which is no failure: a paused session must not
+  // report it as its last error).
   int32_t pollLoop() override {
     if (!beginLoop()) {
       recordStatus(kStatusTableNotAllocated);
@@ -110,6 +114,14 @@ class CTableSession : public CBusSystem {
  private:
   static constexpr uint32_t kNearlyFullBytes = kReadBufferSize - kReadBufferSize / 100;
   static constexpr uint32_t kMaxBurst = 9;
+  // The pause between reads while frames flow. The driver's receive queue holds 16384 frames by
+  // default, 0.75 s of a saturated 1 Mbit/s bus, and a nearly full read is followed by the next
+  // at once, so no queue overflows for it.
+  static constexpr uint64_t kBusyPauseMs = 20;
+  // The longest wait of a read on a quiet bus, so that a changed period takes effect soon and a
+  // CMD_SESSION_STOP ends the loop soon (stop() ends the wait at once).
+  static constexpr uint64_t kQuietWaitMs = 250;
+  static constexpr uint64_t kOwedRetryMs = 10;
 
   bool beginLoop() {
     table = Table::create(connection->settings.dataLogIdsMax.load(), tableResource);
@@ -124,6 +136,7 @@ class CTableSession : public CBusSystem {
     windowWatch = createdWatch;
     burst_ = 0;
     recordsOwed_ = false;
+    quiet_ = false;
     if (connection->settings.logFileEnabled.load() != 0) OpenLogFile(sessionLog, logHeaderLine());
     prepareLoop();
     return true;
@@ -132,9 +145,10 @@ class CTableSession : public CBusSystem {
   // One read and what follows it; returns the read's status.
   int32_t pollPass() {
     uint32_t bytes = 0;
-    const int32_t status = kxReadFrame(driverSession, readBuffer, kReadBufferSize, 0.0, &bytes);
+    const double timeout = quiet_ ? static_cast<double>(quietWaitMs()) / 1000.0 : 0.0;
+    const int32_t status = kxReadFrame(driverSession, readBuffer, kReadBufferSize, timeout, &bytes);
+    if (!pollActive.load()) return 0;  // a stop ended the wait (a cleared session reads nothing)
     bytes = std::min(bytes, kReadBufferSize);  // never trust a count beyond the buffer
-    pace(bytes);
     if (status != 0 && status != kReadNothingYet) recordStatus(status);
     if (bytes > 0 && status >= 0) takeBatch(bytes);
     sessionLog.flushIfDue();
@@ -149,17 +163,38 @@ class CTableSession : public CBusSystem {
       const uint64_t elapsed = stateWatch.ElapsedMilliseconds();
       if (elapsed > statisticPeriod) reportBusState(elapsed);
     }
+    pace(bytes);
     return status;
   }
 
+  // Milliseconds until the next identifier-record or statistics message is due (0: now); records
+  // owed to a slow host are tried again every kOwedRetryMs.
+  uint64_t msUntilNextDuty() const {
+    const SessionSettings& settings = connection->settings;
+    uint64_t next = MsUntil(dataWatch, settings.txTimeData.load());
+    if (recordsOwed_) next = std::min(next, kOwedRetryMs);
+    const uint32_t statisticPeriod = settings.txTimeStatistic.load();
+    if (statisticPeriod > 0) next = std::min(next, MsUntil(stateWatch, statisticPeriod));
+    return next;
+  }
+  // A message of `period` is due once more than `period` ms have passed on `watch`.
+  static uint64_t MsUntil(const Stopwatch& watch, uint64_t period) {
+    const uint64_t elapsed = watch.ElapsedMilliseconds();
+    return elapsed > period ? 0 : period + 1 - elapsed;
+  }
+  uint64_t quietWaitMs() const { return std::min(msUntilNextDuty(), kQuietWaitMs); }
+
+  // After a read of `bytes`: a nearly full one is followed by the next read at once (the burst
+  // rule), one that found frames by a pause, and one that found nothing by a waiting read.
   void pace(uint32_t bytes) {
+    quiet_ = bytes == 0;
     if (pacing_ == ReadPacing::kNearlyFullRule && bytes >= kNearlyFullBytes &&
         burst_ <= kMaxBurst) {
       ++burst_;
       return;
     }
     if (burst_ > kMaxBurst) burst_ = 0;
-    SleepFor(1);
+    if (!quiet_) pausePollThread(std::min(msUntilNextDuty(), kBusyPauseMs));
   }
 
   void takeBatch(uint32_t bytes) {
@@ -221,6 +256,7 @@ class CTableSession : public CBusSystem {
   const ReadPacing pacing_;
   uint32_t burst_ = 0;        // nearly full reads in a row
   bool recordsOwed_ = false;  // the last identifier report was skipped for want of room
+  bool quiet_ = false;        // the last read found nothing: the next one waits
 };
 
 }  // namespace nKV_DLL300

@@ -126,6 +126,7 @@ int32_t StopSession(HostConnection& connection) {
   if (!connection.session) return 0;
   SendText(connection, kStopAck, connection.session.get(), kMessageText);
   connection.session->pollActive.store(false);
+  connection.session->wakePollThread();  // a loop pausing between reads ends now
   return 0;
 }
 

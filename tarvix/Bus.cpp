@@ -3,6 +3,8 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
+#include <cstdint>
 #include <cstring>
 
 #include "tarvix/CandumpLog.h"
@@ -25,6 +27,15 @@ bool Bus::openCapture(std::string& error) {
     return false;
   }
   return true;
+}
+
+void Bus::waitForChange(std::unique_lock<std::mutex>& lock, int64_t untilNs) {
+  const auto until = std::chrono::steady_clock::time_point(std::chrono::nanoseconds(untilNs));
+  if (untilNs == INT64_MAX) {
+    changed_.wait(lock);
+  } else {
+    changed_.wait_until(lock, until);
+  }
 }
 
 void Bus::attach(Session* session) { sessions_.push_back(session); }

@@ -1,6 +1,7 @@
 // A simulated bus: carries frames in virtual time to the sessions of its interfaces.
 #pragma once
 
+#include <condition_variable>
 #include <cstdint>
 #include <cstdio>
 #include <memory>
@@ -40,6 +41,12 @@ class Bus {
   // Earliest monotonic time at which the bus may carry its next frame (for waiting callers).
   virtual int64_t nextEventNs() const = 0;
 
+  // Waiting reads sleep here (with `lock` on mutex()) until `untilNs`, or until an operation
+  // changed what the bus will carry or who listens (changed(): writes, starts, stops, settings,
+  // sessions created and closed).
+  void waitForChange(std::unique_lock<std::mutex>& lock, int64_t untilNs);
+  void changed() { changed_.notify_all(); }
+
  protected:
   // Computes and carries every frame that ends at or before `nowNs`.
   virtual void simulate(int64_t nowNs) = 0;
@@ -57,6 +64,7 @@ class Bus {
   const BusConfig config_;
   const int64_t epochNs_;
   std::mutex mutex_;
+  std::condition_variable changed_;
   std::FILE* captureFile_ = nullptr;  // guarded by mutex_
 };
 

@@ -20,7 +20,7 @@ namespace tarvix {
 namespace {
 
 constexpr uint32_t kErrorCounterMax = 255;
-constexpr int64_t kMaxNapNs = 1'000'000;  // waiting callers look at the bus at least every 1 ms
+constexpr int64_t kMaxNapNs = 1'000'000;  // waiting writers look at the bus at least every 1 ms
 constexpr int64_t kMinNapNs = 50'000;
 constexpr int kFlexRayIntegrationCycles = 2;
 
@@ -44,6 +44,7 @@ Session::Session(SessionSetup setup, std::shared_ptr<Bus> bus)
     static_cast<CanBus&>(*bus_).addSource(output_.get());
   }
   bus_->attach(this);
+  bus_->changed();
   // A subordinate session watches an interface the controller's application runs: it receives
   // from the moment it exists. Other sessions start with kxStart or their first read or write.
   if (setup_.subordinate) startLocked(NowNs());
@@ -56,6 +57,7 @@ void Session::close() {
   if (closed_) return;
   closed_ = true;
   bus_->detach(this);
+  bus_->changed();  // a read waiting in this session ends
   if (output_) static_cast<CanBus&>(*bus_).removeSource(output_.get());
   if (setup_.cluster.protocol == driver::kProtocolCan) static_cast<CanBus&>(*bus_).release(this);
 }
@@ -176,6 +178,7 @@ int32_t Session::start(uint32_t scope) {
   const int64_t now = NowNs();
   bus_->advance(now);
   startLocked(now);
+  bus_->changed();
   return driver::kSuccess;
 }
 
@@ -188,6 +191,7 @@ int32_t Session::stop(uint32_t scope) {
     output_->halt();
     updateOutputBlock();
   }
+  bus_->changed();
   return driver::kSuccess;
 }
 
@@ -204,23 +208,22 @@ int32_t Session::readLocked(uint8_t* buffer, uint32_t size, uint32_t& bytes) {
   return driver::kWarnReceiveQueueOverflow;
 }
 
+// A read that waits sleeps until the bus may carry its next frame, the time-out, or a change on
+// the bus (another session's write, this session's close), without looking at the bus in between.
 int32_t Session::read(void* buffer, uint32_t size, double timeoutS, uint32_t* bytesRead) {
   if (bytesRead == nullptr || (buffer == nullptr && size > 0)) return driver::kBufferMissing;
   *bytesRead = 0;
   if (isOutput()) return driver::kWrongSessionMode;
   const int64_t deadline = DeadlineOf(timeoutS, NowNs());
+  std::unique_lock lock(bus_->mutex());
   for (;;) {
-    int64_t next = 0;
-    {
-      std::lock_guard lock(bus_->mutex());
-      const int64_t now = NowNs();
-      bus_->advance(now);
-      startLocked(now);
-      const int32_t status = readLocked(static_cast<uint8_t*>(buffer), size, *bytesRead);
-      if (status != driver::kReadTimeout || timeoutS == 0.0 || now >= deadline) return status;
-      next = bus_->nextEventNs();
-    }
-    Nap(deadline, next);
+    if (closed_) return driver::kInvalidReference;
+    const int64_t now = NowNs();
+    bus_->advance(now);
+    startLocked(now);
+    const int32_t status = readLocked(static_cast<uint8_t*>(buffer), size, *bytesRead);
+    if (status != driver::kReadTimeout || timeoutS == 0.0 || now >= deadline) return status;
+    bus_->waitForChange(lock, std::min(deadline, std::max(bus_->nextEventNs(), now + kMinNapNs)));
   }
 }
 
@@ -244,6 +247,7 @@ int32_t Session::write(const void* frames, uint32_t size, double timeoutS) {
       for (; done < records.size() && !output_->full(); ++done) {
         output_->write(records[done].first, *records[done].second, now);
       }
+      bus_->changed();
       if (done == records.size()) return driver::kSuccess;
       if (now >= deadline) return driver::kWriteTimeout;
       next = bus_->nextEventNs();

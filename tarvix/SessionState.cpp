@@ -153,6 +153,7 @@ int32_t Session::setProperty(uint32_t id, uint32_t size, const void* value) {
   if (status != driver::kSuccess) return status;
   if (id == driver::kPropJ1939NodeAddress) claimAddress(now);
   updateOutputBlock();
+  bus_->changed();
   return driver::kSuccess;
 }
 
