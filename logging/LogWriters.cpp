@@ -1,6 +1,8 @@
 // The per-bus writers: frame selection over a batch, then text lines or binary records.
 #include "logging/LogWriters.h"
 
+#include <cstring>
+
 #include "driver/RawFrame.h"
 #include "hostlink/HostConnection.h"
 #include "hostlink/LinkedSession.h"
@@ -42,11 +44,11 @@ size_t FormatLine(driver::BusKind bus, char* out, const driver::RawFrameView& fr
                   uint8_t logChecksum) {
   switch (bus) {
     case driver::BusKind::kCan:
-      return FormatCanTextLine(out, SessionLog::kLineBufferSize, frame);
+      return FormatCanTextLine(out, SessionLog::kBatchLineRoom, frame);
     case driver::BusKind::kLin:
-      return FormatLinTextLine(out, SessionLog::kLineBufferSize, frame, logChecksum);
+      return FormatLinTextLine(out, SessionLog::kBatchLineRoom, frame, logChecksum);
     case driver::BusKind::kFlexRay:
-      return FormatFlexRayTextLine(out, SessionLog::kLineBufferSize, frame);
+      return FormatFlexRayTextLine(out, SessionLog::kBatchLineRoom, frame);
     case driver::BusKind::kNone:
       break;
   }
@@ -56,12 +58,12 @@ size_t FormatLine(driver::BusKind bus, char* out, const driver::RawFrameView& fr
 void WriteTextLines(SessionLog& log, driver::BusKind bus, const uint8_t* batch, uint32_t bytes,
                     uint32_t frames) {
   const BatchSettings settings = ReadBatchSettings(log);
-  char* line = log.lineBuffer();
   ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames,
                      [&](const driver::RawFrameView& frame) {
-                       const size_t length = FormatLine(bus, line, frame, settings.logChecksum);
-                       if (!log.write(line, length)) log.fail(kLogWriteIncomplete);
+                       char* line = log.batchSpace(SessionLog::kBatchLineRoom);
+                       log.batchAppended(FormatLine(bus, line, frame, settings.logChecksum));
                      });
+  log.endBatch();
 }
 
 BinaryRecordLayout RecordLayout(const SessionLog& log, driver::BusKind bus) {
@@ -79,7 +81,7 @@ BinaryRecordLayout RecordLayout(const SessionLog& log, driver::BusKind bus) {
 }
 
 // A record is the frame's first bytes in the read buffer, never more than the frame occupies
-// there, so it is written straight from the batch.
+// there, so it is copied straight from the batch.
 void WriteRecords(SessionLog& log, driver::BusKind bus, const uint8_t* batch, uint32_t bytes,
                   uint32_t frames) {
   const BatchSettings settings = ReadBatchSettings(log);
@@ -87,9 +89,11 @@ void WriteRecords(SessionLog& log, driver::BusKind bus, const uint8_t* batch, ui
   ForEachLoggedFrame(batch, bytes, frames, settings.logTransmittedFrames,
                      [&](const driver::RawFrameView& frame) {
                        const uint8_t* record = frame.payload - driver::kRawFrameHeaderSize;
-                       if (!log.write(record, BinaryRecordSize(layout, frame.header)))
-                         log.fail(kLogWriteIncomplete);
+                       const size_t size = BinaryRecordSize(layout, frame.header);
+                       std::memcpy(log.batchSpace(size), record, size);
+                       log.batchAppended(size);
                      });
+  log.endBatch();
 }
 
 void WriteBatch(SessionLog& log, driver::BusKind bus, const uint8_t* batch, uint32_t bytes,

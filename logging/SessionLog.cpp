@@ -48,7 +48,8 @@ bool SessionLog::openStream(const std::string& runtimePath, const char* mode) {
   if (logFile_ != nullptr) (void)closeStream();
   logFile_ = platform::OpenFile(runtimePath, mode);
   if (logFile_ == nullptr) return false;
-  std::setvbuf(logFile_, streamBuffer_, _IOFBF, kStreamBufferSize);
+  std::setvbuf(logFile_, nullptr, _IONBF, 0);  // the batch buffer is the only one
+  batchUsed_ = 0;
   unflushed_ = false;
   flushWatch_.Restart();
   return true;
@@ -69,10 +70,24 @@ void SessionLog::flushIfDue() {
 
 bool SessionLog::closeStream() {
   if (logFile_ == nullptr) return true;
+  const bool whole = batchUsed_ == 0 || write(batch_, batchUsed_);
+  batchUsed_ = 0;
   const bool flushed = std::fflush(logFile_) == 0;
   std::fclose(logFile_);
   logFile_ = nullptr;
-  return flushed;
+  return whole && flushed;
+}
+
+char* SessionLog::batchSpace(size_t size) {
+  if (size > kBatchBufferSize - batchUsed_) endBatch();
+  return batch_ + batchUsed_;
+}
+
+void SessionLog::endBatch() {
+  if (batchUsed_ == 0) return;
+  const bool whole = logFile_ != nullptr && write(batch_, batchUsed_);
+  batchUsed_ = 0;
+  if (!whole) fail(kLogWriteIncomplete);
 }
 
 void SessionLog::fail(int32_t code) {

@@ -1,5 +1,5 @@
 // The log state of one bus session: its open text or binary stream, the measurement-data handles,
-// the writers' line buffer, and how a logging failure reaches the host.
+// the writers' batch buffer, and how a logging failure reaches the host.
 #pragma once
 
 #include <cstddef>
@@ -52,16 +52,19 @@ class SessionLog {
   uint8_t linChecksum() const { return linChecksum_; }
   void setLinChecksum(uint8_t logChecksum) { linChecksum_ = logChecksum; }
 
-  // The text or binary stream (logFile): open while a run logs to one.
+  // The text or binary stream (logFile): open while a run logs to one. It is unbuffered: every
+  // write below is one hand-over to the file.
   bool isOpen() const { return logFile_ != nullptr; }
   // Opens `runtimePath` (creating or truncating it) in `mode`; false when it cannot be opened.
   // A stream still open is closed first.
   bool openStream(const std::string& runtimePath, const char* mode);
   // Hands `size` bytes to the stream in one call; false when it took fewer.
   bool write(const void* bytes, size_t size);
-  // Writes the buffered rest and closes the stream; false when the rest could not be written.
+  // Hands over what the batch still holds, then closes the stream; false when either failed.
   bool closeStream();
-  // Hands what the stream buffers to the file when something was written since the last flush and
+  // The stream is unbuffered (the batches are handed over whole), so this finds nothing left; it
+  // stays as the guard of the rule. Hands what the stream buffers to the file when something was
+  // written since the last flush and
   // that flush is kFlushPeriodMs old, so that a frame reaches the file within about a second
   // while the session runs (a host may follow the log). A failed flush stores -21 and reports it.
   // Called by the poll loop after every pass; costs a flag test when nothing was written.
@@ -79,9 +82,16 @@ class SessionLog {
   // take it now (SendTextWithoutWaiting).
   void fail(int32_t code);
 
-  // The writers format each text line here, then write it whole.
-  char* lineBuffer() { return line_; }
-  static constexpr size_t kLineBufferSize = kTextLineCapacity;
+  // The writers collect the lines or records of a batch here and hand them to the file in one
+  // write. batchSpace returns room for `size` bytes (at most kBatchLineRoom), handing over what
+  // the buffer holds first when it lacks that room; batchAppended adds the `size` bytes written
+  // there; endBatch hands over the rest. A hand-over that the file does not take whole reports
+  // -21 once and is dropped; the next one is tried as usual.
+  char* batchSpace(size_t size);
+  void batchAppended(size_t size) { batchUsed_ += size; }
+  void endBatch();
+  // Room for the longest text line and the largest binary record.
+  static constexpr size_t kBatchLineRoom = kTextLineCapacity;
 
   // Handles of the measurement-data branch (voraFile, voraChannel); -1 when none is open.
   int32_t voraFile = -1;
@@ -96,11 +106,12 @@ class SessionLog {
   std::string claimedFile_;  // the resolved path claimed in the registry; "" when none
   BinaryRecordLayout canLayout_ = BinaryRecordLayout::kFixed24;
   uint8_t linChecksum_ = 0;
-  char line_[kLineBufferSize];
-  // The stream's buffer: larger than the default page, so that a saturated bus costs a few
-  // writes per millisecond. Outlives the stream (closed in closeStream or the destructor).
-  static constexpr size_t kStreamBufferSize = 64 * 1024;
-  char streamBuffer_[kStreamBufferSize];
+  // What a batch collects before it is handed over (usually a whole batch: about 20 ms of a
+  // saturated bus take a quarter of it).
+  static constexpr size_t kBatchBufferSize = 64 * 1024;
+  static_assert(kBatchBufferSize > 2 * kBatchLineRoom);
+  size_t batchUsed_ = 0;
+  char batch_[kBatchBufferSize];
 };
 
 // Sends the session's lastStatus as "<ERROR:LOG FILE: %d> \n" (message type 5), with the session
