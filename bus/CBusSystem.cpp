@@ -1,6 +1,8 @@
 // The shared life cycle of a bus session: poll thread, pollOnce, stop and the driver session.
 #include "bus/CBusSystem.h"
 
+#include <chrono>
+
 #include "driver/tarvix.h"
 #include "qvapal/StatusBlock.h"
 

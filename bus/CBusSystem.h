@@ -64,8 +64,8 @@ class CBusSystem : public LinkedSession {
   // lastStatus.
   void run();
 
-  // Ends a pause of the poll thread at once (pausePollThread): CMD_SESSION_STOP, stop(), a setting
-  // the loop's timing depends on. Any thread.
+  // Ends a pause of the poll thread at once (pausePollThread): CMD_SESSION_STOP and stop(). Any
+  // thread.
   void wakePollThread();
 
   // Stores a non-zero status as lastStatus. Any thread.
