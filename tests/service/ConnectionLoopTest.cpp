@@ -175,7 +175,9 @@ TEST_F(PartlySentReplyTest, RestOfAPartlySentMessageFollowsWhenTheHostReadsOrLea
     ASSERT_TRUE(WaitUntil([&] { return service().connections[0].published.load() != nullptr; }));
     const nKV_DLL300::HostConnection& connection = *service().connections[0].published.load();
     SendAndWaitDispatched(host, "CMD_GET_HARDWARE_INFO");
-    ASSERT_TRUE(connection.hasPendingOutput()) << "the reply was taken whole";
+    // The message is counted before its reply is sent, and the reply first waits its send wait.
+    ASSERT_TRUE(WaitUntil([&] { return connection.hasPendingOutput(); }))
+        << "the reply was taken whole";
     if (leaves) host.StopSending();
     // Well within the pass wait of 10 s, every message has arrived whole.
     EXPECT_TRUE(WaitUntil(
