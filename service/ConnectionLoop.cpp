@@ -148,7 +148,7 @@ void FreeSlot(ServiceContext& context, ConnectionSlot& slot) {
   if (!slot.connection) return;
   EndSession(*slot.connection);
   CloseConnection(*slot.connection);
-  slot.published.store(nullptr);
+  (void)slot.published.exchange(nullptr);  // acquires what other readers handed over
   slot.connection.reset();
   slot.socket = net::kInvalidSocket;
   context.stats.connectionsEnded++;

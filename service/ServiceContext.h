@@ -42,8 +42,9 @@ struct ConnectionSlot {
   platform::net::SocketHandle socket = platform::net::kInvalidSocket;
   std::unique_ptr<HostConnection> connection;
   // The connection as other threads (tests, diagnostics) may see it: published once it is built,
-  // withdrawn before it is destroyed. Any thread; a reader keeps using it only while it knows by
-  // other means that the host is still connected.
+  // withdrawn (exchanged for null) before it is destroyed. Any thread; a reader keeps using it only
+  // while it knows by other means that the host is still connected, and hands its reads over
+  // before the host leaves by a read-modify-write of this pointer, which the withdrawal acquires.
   std::atomic<HostConnection*> published{nullptr};
 };
 

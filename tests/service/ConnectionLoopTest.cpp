@@ -137,6 +137,8 @@ TEST_F(SlowReaderTest, HostThatNeverReadsStaysConnectedAndIsStillServed) {
 
 // A hardware table larger than the socket's send buffer: a reply the system can take only in
 // part, however the buffers stand.
+using HostConnectionPointer = nKV_DLL300::HostConnection*;
+
 class PartlySentReplyTest : public SlowReaderTest {
  protected:
   void SetUp() override {
@@ -173,11 +175,17 @@ TEST_F(PartlySentReplyTest, RestOfAPartlySentMessageFollowsWhenTheHostReadsOrLea
     kvhost::HostClient host;
     ASSERT_TRUE(host.ConnectWithReceiveBuffer("127.0.0.1", port(), kSmallBuffer)) << host.error();
     ASSERT_TRUE(WaitUntil([&] { return service().connections[0].published.load() != nullptr; }));
-    const nKV_DLL300::HostConnection& connection = *service().connections[0].published.load();
+    HostConnectionPointer published = service().connections[0].published.load();
+    const nKV_DLL300::HostConnection& connection = *published;
     SendAndWaitDispatched(host, "CMD_GET_HARDWARE_INFO");
     // The message is counted before its reply is sent, and the reply first waits its send wait.
     ASSERT_TRUE(WaitUntil([&] { return connection.hasPendingOutput(); }))
         << "the reply was taken whole";
+    // The service frees the connection once the host leaves; this orders the reads before it.
+    auto handOver = [&] {
+      service().connections[0].published.compare_exchange_strong(published, published);
+    };
+    handOver();
     if (leaves) host.StopSending();
     // Well within the pass wait of 10 s, every message has arrived whole.
     EXPECT_TRUE(WaitUntil(
@@ -188,6 +196,7 @@ TEST_F(PartlySentReplyTest, RestOfAPartlySentMessageFollowsWhenTheHostReadsOrLea
           return sent && host.partialBytes() == 0;
         },
         kWellWithinThePassWait));
+    handOver();
   }
 }
 
