@@ -68,4 +68,8 @@ class HostClient {
   std::string error_;
 };
 
+// A loopback port that was free a moment ago (the system's choice for a socket bound to port 0),
+// for a program that starts a controller of its own.
+uint16_t FreeLoopbackPort();
+
 }  // namespace kvhost

@@ -71,18 +71,6 @@ std::string Interface(const std::string& name, const std::string& bus, int port,
          (fd ? ",\"canFd\":true}" : "}");
 }
 
-uint16_t FreePort() {
-  const int probe = socket(AF_INET, SOCK_STREAM, 0);
-  sockaddr_in address{};
-  address.sin_family = AF_INET;
-  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-  bind(probe, reinterpret_cast<sockaddr*>(&address), sizeof address);
-  socklen_t length = sizeof address;
-  getsockname(probe, reinterpret_cast<sockaddr*>(&address), &length);
-  close(probe);
-  return ntohs(address.sin_port);
-}
-
 std::string Upper(std::string text) {
   for (char& c : text) c = static_cast<char>(std::toupper(static_cast<unsigned char>(c)));
   return text;
@@ -204,7 +192,8 @@ std::string Workspace::serviceFile(const std::string& name) const {
   return path_ + "/drive/QV-RT/tarvix/kelvane/" + name;
 }
 
-Controller::Controller(const Workspace& workspace, const Hardware& hardware) : port_(FreePort()) {
+Controller::Controller(const Workspace& workspace, const Hardware& hardware)
+    : port_(kvhost::FreeLoopbackPort()) {
   std::ofstream(workspace.serviceFile("kelvanert.ini")) << "PORT=" << port_ << "\n";
   const std::string config = workspace.path() + "/hardware.json";
   std::ofstream(config) << HardwareJson(hardware);

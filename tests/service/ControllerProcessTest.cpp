@@ -9,6 +9,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include "host/HostClient.h"
 #include "host/HostMessage.h"
 #include "tests/support/ServiceFixture.h"
 
@@ -19,19 +20,6 @@ namespace {
 
 constexpr std::chrono::milliseconds kStartDeadline = 60s;  // the module waits 10 s first
 
-// A port that was free a moment ago (the system's choice for a socket bound to port 0).
-uint16_t FreePort() {
-  int probe = socket(AF_INET, SOCK_STREAM, 0);
-  sockaddr_in address{};
-  address.sin_family = AF_INET;
-  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-  bind(probe, reinterpret_cast<sockaddr*>(&address), sizeof address);
-  socklen_t length = sizeof address;
-  getsockname(probe, reinterpret_cast<sockaddr*>(&address), &length);
-  close(probe);
-  return ntohs(address.sin_port);
-}
-
 bool ExitedWith(pid_t child, int expectedStatus, std::chrono::milliseconds timeout) {
   int status = 0;
   bool ended = WaitUntil([&] { return waitpid(child, &status, WNOHANG) == child; }, timeout);
@@ -40,7 +28,7 @@ bool ExitedWith(pid_t child, int expectedStatus, std::chrono::milliseconds timeo
 
 TEST(ControllerProcessTest, ControllerServesAHostAndStopsInOrderOnSigterm) {
   TemporaryDrive drive;
-  uint16_t port = FreePort();
+  uint16_t port = kvhost::FreeLoopbackPort();
   drive.WriteFile("QV-RT\\tarvix\\kelvane\\kelvanert.ini", "PORT=" + std::to_string(port) + "\n");
 
   pid_t child = 0;
